@@ -1,0 +1,17 @@
+# What every target of the project is compiled with: language, warnings, floating point.
+add_library(dravik_flags INTERFACE)
+target_compile_features(dravik_flags INTERFACE c_std_11 cxx_std_17)
+target_include_directories(dravik_flags INTERFACE ${PROJECT_SOURCE_DIR}/include)
+target_compile_options(dravik_flags INTERFACE
+    -Wall -Wextra -Wpedantic
+    # The same bits on every machine: no fused multiply-add, never fast-math.
+    -ffp-contract=off)
+
+# Sanitizers as one list, for example address;undefined.
+set(DRAVIK_SANITIZE "" CACHE STRING "Sanitizers to build everything with")
+if(DRAVIK_SANITIZE)
+    list(JOIN DRAVIK_SANITIZE "," sanitizers)
+    target_compile_options(dravik_flags INTERFACE
+        -fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+    target_link_options(dravik_flags INTERFACE -fsanitize=${sanitizers})
+endif()

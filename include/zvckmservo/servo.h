@@ -1,0 +1,159 @@
+/* The clock servo plug-in as a host sees it: one table of clock operations and nine functions.
+ *
+ * A host loads libdravik.so.1 with dlopen, binds the nine functions under their plain names, and
+ * for each clock fills a zvckmservo_HostTable (words 13 to 18), calls zvckmservo_initialize, then
+ * the other functions as often as it likes, and at last zvckmservo_finalize.
+ *
+ * The plug-in starts no thread and no timer, and reads no file but its default configuration.
+ * It acts only inside these calls, on the caller's thread. No exception leaves any of them.
+ *
+ * Signs: the clock is ahead when its time is greater than the reference's; a positive frequency
+ * offset makes the clock run faster; a positive step moves it forward. */
+#ifndef ZVCKMSERVO_SERVO_H
+#define ZVCKMSERVO_SERVO_H
+
+#include "zverr/status.h"
+
+#ifdef __cplusplus
+#define ZVCKMSERVO_NOTHROW noexcept
+extern "C" {
+#else
+#define ZVCKMSERVO_NOTHROW
+#endif
+
+#define ZVCKMSERVO_API __attribute__((visibility("default")))
+
+/* One clock of the host. The host owns the record; the plug-in keeps the pointer, makes no copy,
+ * and never moves or frees it. It must stay where it is, with all six operations callable, from
+ * the start of zvckmservo_initialize to the return of zvckmservo_finalize.
+ *
+ * The operations take no context argument: a host with several clocks keeps the one in question
+ * per thread while it is inside a call of the plug-in.
+ *
+ * Every operation is called with the servo's lock held, on the thread of the call that led to it.
+ * It may call the plug-in again on that thread. Its status is a fresh, empty one of the plug-in's,
+ * never the one given to the exported function:
+ *   - a negative code reports failure and arrives, payload included, in the status of the exported
+ *     function; a zero or positive code is success, and the code is dropped;
+ *   - a payload is written through the status's own reallocJson and released by the plug-in.
+ * What an operation wrote through its pointer counts only if it succeeded. */
+typedef struct zvckmservo_HostTable {
+    /* word 0: the servo; opaque to the host. Written by zvckmservo_initialize, set to null by
+     * zvckmservo_finalize. Null before the first initialisation, so that finalize is harmless. */
+    void* servoHandle;
+
+    /* words 1 to 12: the host's own; neither read nor written by the plug-in. */
+    void* hostWords[12];
+
+    /* word 13: store the clock's present time, unsigned nanoseconds, in *timeNs, which the plug-in
+     * has set to 0. Asked for by zvckmservo_getTime only. */
+    void (*getTime)(uint64_t* timeNs, zverr_Status* status);
+
+    /* word 14: move the clock by deltaNs, signed nanoseconds, positive forward; a difference, never
+     * an absolute time. On success the clock has moved by exactly that; it is not read back.
+     * Called at most once for each pair. */
+    void (*stepTime)(int64_t deltaNs, zverr_Status* status);
+
+    /* word 15: store the offset of the clock's rate from nominal that is really in force, signed
+     * parts per billion, in *offsetPpb, which the plug-in has set to 0. Each correction starts
+     * from this value. */
+    void (*getFrequency)(int32_t* offsetPpb, zverr_Status* status);
+
+    /* word 16: set the offset of the clock's rate from nominal, signed parts per billion. Within
+     * the limits below, except that a measurement which is not a number goes out as 0. */
+    void (*setFrequency)(int32_t offsetPpb, zverr_Status* status);
+
+    /* words 17 and 18: the highest and the lowest offset that setFrequency may be given, signed
+     * parts per billion (the lowest is negative if the clock can be slowed). Each is called once,
+     * during zvckmservo_initialize, the maximum first. They are not compared with each other. */
+    int32_t (*getMaxFrequencyOffset)(zverr_Status* status);
+    int32_t (*getMinFrequencyOffset)(zverr_Status* status);
+} zvckmservo_HostTable;
+
+#define ZVCKMSERVO_WORD(member, n)                                                                 \
+    static_assert(offsetof(zvckmservo_HostTable, member) == (n) * sizeof(void*), "word " #n)
+ZVCKMSERVO_WORD(servoHandle, 0);
+ZVCKMSERVO_WORD(hostWords, 1);
+ZVCKMSERVO_WORD(getTime, 13);
+ZVCKMSERVO_WORD(stepTime, 14);
+ZVCKMSERVO_WORD(getFrequency, 15);
+ZVCKMSERVO_WORD(setFrequency, 16);
+ZVCKMSERVO_WORD(getMaxFrequencyOffset, 17);
+ZVCKMSERVO_WORD(getMinFrequencyOffset, 18);
+#undef ZVCKMSERVO_WORD
+static_assert(sizeof(zvckmservo_HostTable) == 19 * sizeof(void*), "nineteen words");
+
+/* Common to all functions below:
+ *   host    the table of the clock; not null; its servoHandle valid, so only between a successful
+ *           zvckmservo_initialize and zvckmservo_finalize, which excepts these two and isSeeded
+ *   status  in/out, owned by the caller, not null, all four fields set. A negative code on entry
+ *           makes the call do nothing at all; a positive one stops nothing and is still there
+ *           after a call that went well. A failure of a call is in it afterwards:
+ *             the code and payload of a failed host operation;
+ *             zvplaterr_memoryFull if memory ran out;
+ *             zvplaterr_softwareFaultPLATInternalUseOnly for whatever else was thrown, a host
+ *             operation's own exception among it;
+ *           and what is named at the function.
+ * Threads:  any, also at the same time: one lock per servo serialises the calls on a table, and is
+ *           held across its host operations. Servos of different tables share nothing. No call may
+ *           overlap zvckmservo_initialize or zvckmservo_finalize of the same table. */
+
+/* Makes a servo for the clock, with default parameters, ready for the first pair. Calls
+ * getMaxFrequencyOffset and getMinFrequencyOffset; the clock is not touched.
+ * servoHandle is written last: after a failure it is what it was and no servo exists. A handle that
+ * is already there is overwritten, and its servo lost. */
+ZVCKMSERVO_API void zvckmservo_initialize(zvckmservo_HostTable* host, zverr_Status* status);
+
+/* Sets servoHandle to null and ends the servo that was in it, if any; calling it twice is harmless.
+ * No host operation is called: the clock keeps its frequency. Cannot fail. */
+ZVCKMSERVO_API void zvckmservo_finalize(zvckmservo_HostTable* host) ZVCKMSERVO_NOTHROW;
+
+/* Returns 0, always: this servo never reports itself as seeded. Reads nothing, not even the table,
+ * and may be called at any time. */
+ZVCKMSERVO_API int32_t zvckmservo_isSeeded(zvckmservo_HostTable* host);
+
+/* Starts the discipline of the clock over: the next pair is the first of a new measurement of its
+ * frequency. Parameters, clock and the clock's frequency are left alone. */
+ZVCKMSERVO_API void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_Status* status);
+
+/* Delivers one measurement.
+ *   referenceTime, clockTime  the time of the reference and of the clock at one moment, unsigned
+ *                             nanoseconds on one timescale, less than 2^63 ns apart from each other
+ *                             and from the pairs before (beyond that, differences wrap)
+ * May call getFrequency and then setFrequency, or stepTime, or none of them. After the failure of a
+ * host operation nothing is rolled back; the servo goes on with the next pair. */
+ZVCKMSERVO_API void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime,
+                                          uint64_t clockTime, zverr_Status* status);
+
+/* Reads the disciplined clock through the host's getTime.
+ *   time  out: unsigned nanoseconds; not null; written on success only */
+ZVCKMSERVO_API void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* time,
+                                       zverr_Status* status);
+
+/* Sets parameters from a JSON document.
+ *   configJson  the document, zero-terminated; borrowed for the call
+ * Returns: 0 on success, 1 on failure or if the status was negative on entry.
+ * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
+ZVCKMSERVO_API int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host,
+                                                   const char* configJson, zverr_Status* status);
+
+/* Gives the parameters in force as a JSON document.
+ *   buffer      out: the first bufferSize characters of the document, without a terminating zero;
+ *               null only if bufferSize is 0; untouched on failure
+ *   bufferSize  bytes in buffer; a longer document is cut without an error
+ * Returns: 0 on success, 1 on failure or if the status was negative on entry.
+ * Not given yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and writes nothing. */
+ZVCKMSERVO_API int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, char* buffer,
+                                                  size_t bufferSize, zverr_Status* status);
+
+/* Takes metadata of the selected time reference.
+ *   metaDataJson  the metadata, zero-terminated; borrowed for the call
+ * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
+ZVCKMSERVO_API void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
+                                             zverr_Status* status);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif
