@@ -1,0 +1,287 @@
+// The status record, the exceptions, the guard and the bridge.
+
+#include "support/allocator.h"
+#include "support/tHostStatus.h"
+#include "zverr/Exception.h"
+#include "zverr/errStatus.h"
+#include "zverr/tStatusGuard.h"
+#include "zverr/tools/exception_errStatus.h"
+
+#include <cstring>
+#include <functional>
+#include <gtest/gtest.h>
+#include <new>
+#include <stdexcept>
+#include <string>
+
+namespace {
+
+// A record with the standard reallocJson that ends as its owner must end it.
+struct tOwnStatus {
+    ~tOwnStatus()
+    {
+        expectBufferForm(record);
+        record.reallocJson(&record, 0);
+    }
+    std::string text() const { return record.json != nullptr ? record.json : "(none)"; }
+
+    zverr_Status record = zverr_emptyStatus();
+};
+
+zverr::Exception failureWith(int32_t code, const char* text)
+{
+    zverr::Exception failure;
+    zverr_setCode(&failure.status, code);
+    if (text != nullptr) zverr_setJson(&failure.status, text);
+    return failure;
+}
+
+void bridge(const std::function<void()>& thrower, zverr_Status* status)
+{
+    try {
+        thrower();
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}
+
+TEST(Status, FirstFailureWinsAndAFailureReplacesAWarning)
+{
+    struct Row {
+        int32_t before, set;
+        bool taken;
+    };
+    const Row rows[] = {{0, 0, false},  {0, -5, true},
+                        {0, 3, true},   {3, -5, true},
+                        {3, 4, false},  {3, 0, false},
+                        {-5, 0, false}, {-5, -6, false},
+                        {-5, 3, false}, {INT32_MAX, INT32_MIN, true}};
+    for (const Row& row : rows) {
+        SCOPED_TRACE(testing::Message() << row.before << " <- " << row.set);
+        tOwnStatus status;
+        zverr_setJson(&status.record, R"({"a":1})");
+        char* const buffer = status.record.json;
+        status.record.code = row.before;
+        EXPECT_EQ(row.taken, zverr_setCode(&status.record, row.set));
+        EXPECT_EQ(row.taken ? row.set : row.before, status.record.code);
+        EXPECT_EQ(row.taken ? "{}" : R"({"a":1})", status.text());
+        EXPECT_EQ(buffer, status.record.json);
+        EXPECT_EQ(512U, status.record.capacity);
+        expectBufferForm(status.record);
+    }
+    const long before = allocator::allocations();
+    tOwnStatus bare;
+    EXPECT_TRUE(zverr_setCode(&bare.record, -1));
+    EXPECT_EQ(before, allocator::allocations()) << "a code alone costs no memory";
+    EXPECT_EQ(nullptr, bare.record.json);
+}
+
+TEST(Status, StandardReallocationSizes)
+{
+    struct Row {
+        uint32_t request, capacity;
+    };
+    for (const Row row :
+         {Row{1, 512}, Row{512, 512}, Row{513, 1024}, Row{1024, 1024}, Row{1025, 2048}}) {
+        tOwnStatus status;
+        EXPECT_TRUE(zverr_defaultReallocJson(&status.record, row.request));
+        EXPECT_EQ(row.capacity, status.record.capacity) << row.request;
+        EXPECT_EQ("{}", status.text());
+        expectBufferForm(status.record);
+        EXPECT_TRUE(zverr_defaultReallocJson(&status.record, 1)) << "never made smaller";
+        EXPECT_EQ(row.capacity, status.record.capacity);
+        EXPECT_FALSE(zverr_defaultReallocJson(&status.record, 0x80000000U));
+        EXPECT_EQ(row.capacity, status.record.capacity);
+    }
+    tOwnStatus empty;
+    EXPECT_TRUE(zverr_defaultReallocJson(&empty.record, 0));
+}
+
+TEST(Status, TextsGrowTheBufferAtItsEdge)
+{
+    tOwnStatus status;
+    for (const size_t length : {510U, 511U, 3U}) {
+        const std::string text(length, 'x');
+        EXPECT_TRUE(zverr_setJson(&status.record, text.c_str()));
+        EXPECT_EQ(text, status.text());
+        EXPECT_EQ(length == 510 ? 512U : 1024U, status.record.capacity);
+        expectBufferForm(status.record);
+    }
+    const std::string tooLong(2000, 'y');
+    const allocator::tFailNth failing(1);
+    EXPECT_FALSE(zverr_setJson(&status.record, tooLong.c_str()));
+    EXPECT_EQ("xxx", status.text());
+}
+
+TEST(Status, TakingMovesBetweenEqualsAndCopiesOtherwise)
+{
+    tOwnStatus source;
+    source.record.code = -7;
+    zverr_setJson(&source.record, R"({"a":1})");
+    char* const buffer = source.record.json;
+
+    tHostStatus foreign;
+    EXPECT_TRUE(zverr_copyStatus(&foreign.record, &source.record));
+    EXPECT_EQ(R"({"a":1})", foreign.text());
+    EXPECT_EQ(buffer, source.record.json);
+
+    tOwnStatus target;
+    zverr_setJson(&target.record, "{\"warning\":1}");
+    target.record.code = 1;
+    EXPECT_TRUE(zverr_takeStatus(&target.record, &source.record));
+    EXPECT_EQ(buffer, target.record.json);
+    EXPECT_EQ(512U, target.record.capacity);
+    EXPECT_EQ(nullptr, source.record.json);
+    EXPECT_EQ(0U, source.record.capacity);
+    EXPECT_EQ(-7, source.record.code);
+    EXPECT_FALSE(zverr_takeStatus(&source.record, &target.record)) << "a failure is not replaced";
+    EXPECT_EQ(buffer, target.record.json);
+
+    tHostStatus taker;
+    tHostStatus copier;
+    EXPECT_TRUE(zverr_takeStatus(&taker.record, &source.record));
+    EXPECT_TRUE(zverr_copyStatus(&copier.record, &source.record));
+    EXPECT_EQ("{}", taker.text());
+    EXPECT_EQ("(none)", copier.text());
+}
+
+TEST(Exception, CarriesItsPayloadAlongAndShowsItAsWhat)
+{
+    EXPECT_STREQ("", zverr::Exception().what());
+    const zverr::Exception original = failureWith(-9, R"({"a":1})");
+    EXPECT_STREQ(R"({"a":1})", static_cast<const std::exception&>(original).what());
+    const char* const buffer = static_cast<const zverr::ExceptionBase&>(original).what();
+    const zverr::Exception copy(original);
+    EXPECT_EQ(buffer, copy.what());
+    EXPECT_STREQ("", original.what());
+    EXPECT_EQ(-9, original.status.code);
+    EXPECT_EQ(-9, copy.status.code);
+}
+
+TEST(StatusGuard, RaisesFailuresOnlyAndOnlyOutsideAnUnwinding)
+{
+    const long before = allocator::liveBlocks();
+    const char* buffer = nullptr;
+    try {
+        zverr::tStatusGuard guard;
+        zverr_setCode(&guard, -1);
+        zverr_setJson(&guard, R"({"a":1})");
+        buffer = guard.json;
+    } catch (const zverr::Exception& failure) {
+        EXPECT_EQ(buffer, failure.what()) << "the very buffer moves, no text is copied";
+        EXPECT_EQ(-1, failure.status.code);
+        buffer = nullptr;
+    }
+    EXPECT_EQ(nullptr, buffer) << "it did throw";
+
+    EXPECT_NO_THROW({
+        zverr::tStatusGuard guard;
+        zverr_setCode(&guard, 1);
+        zverr_setJson(&guard, R"({"a":1})");
+    });
+    try {
+        zverr::tStatusGuard guard;
+        zverr_setCode(&guard, -1);
+        zverr_setJson(&guard, R"({"a":1})");
+        throw 42;
+    } catch (int thrown) {
+        EXPECT_EQ(42, thrown);
+    }
+    EXPECT_EQ(before, allocator::liveBlocks());
+}
+
+TEST(StatusGuard, ReleasesABufferThatTheHostPutIn)
+{
+    static bool throws;
+    const zverr_ReallocJsonFn release = [](zverr_Status* status, uint32_t /*size*/) {
+        delete[] status->json;
+        status->json = nullptr;
+        status->capacity = 0;
+        if (throws) throw std::runtime_error("release");
+        return true;
+    };
+    for (const int32_t code : {-3, 0}) {
+        for (const bool throwing : {false, true}) {
+            throws = throwing;
+            const long before = allocator::liveBlocks();
+            int32_t raised = 0;
+            std::string text;
+            try {
+                zverr::tStatusGuard guard;
+                guard.code = code;
+                guard.reallocJson = release;
+                guard.capacity = 4;
+                guard.json = new char[4]{'{', '}', 0, 'J'};
+            } catch (const zverr::Exception& failure) {
+                raised = failure.status.code;
+                text = failure.what();
+            }
+            EXPECT_EQ(code, raised);
+            EXPECT_EQ(code < 0 ? "{}" : "", text);
+            text = std::string();
+            EXPECT_EQ(before, allocator::liveBlocks());
+        }
+    }
+}
+
+TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
+{
+    const auto own = [] { throw failureWith(-8, R"({"a":1})"); };
+    const auto bare = [] { throw failureWith(-8, nullptr); };
+    const auto memory = [] { throw std::bad_alloc(); };
+    const auto standard = [] { throw std::runtime_error("x"); };
+    const auto number = [] { throw 42; };
+    struct Row {
+        const char* name;
+        std::function<void()> thrower;
+        int32_t before;
+        const char* textBefore;
+        int32_t code;
+        const char* text;
+        std::vector<uint32_t> requests; // made to the host's reallocJson
+        tHostStatus::tMode mode;
+    };
+    const char* const warning = R"({"a long warning":"that leaves room"})";
+    const Row rows[] = {
+        {"own failure", own, 0, nullptr, -8, R"({"a":1})", {9}, tHostStatus::kGive},
+        {"without payload", bare, 0, nullptr, -8, "{}", {4}, tHostStatus::kGive},
+        {"fits over a warning", own, 2, warning, -8, R"({"a":1})", {}, tHostStatus::kGive},
+        {"refused, no buffer", own, 0, nullptr, -8, "(none)", {9}, tHostStatus::kRefuse},
+        {"refused, a buffer", own, 2, "{}", -8, "{}", {9}, tHostStatus::kRefuse},
+        {"reallocJson throws", own, 0, nullptr, -8, "(none)", {9}, tHostStatus::kThrow},
+        {"older failure stays", own, -1, R"({"b":2})", -1, R"({"b":2})", {}, tHostStatus::kGive},
+        {"no memory", memory, 0, nullptr, -52000, "(none)", {}, tHostStatus::kGive},
+        {"standard exception", standard, 0, nullptr, -52003, "(none)", {}, tHostStatus::kGive},
+        {"anything else", number, 0, nullptr, -52003, "(none)", {}, tHostStatus::kGive},
+        {"over a warning", number, 2, warning, -52003, "{}", {}, tHostStatus::kGive},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        tHostStatus host(row.before, row.textBefore);
+        host.mode = row.mode;
+        bridge(row.thrower, &host.record);
+        EXPECT_EQ(row.code, host.code());
+        EXPECT_EQ(row.text, host.text());
+        EXPECT_EQ(row.requests, host.requests);
+    }
+}
+
+TEST(Bridge, HandsTheBufferOverToARecordOfTheSameKind)
+{
+    tOwnStatus status;
+    const char* buffer = nullptr;
+    bridge(
+        [&buffer] {
+            const zverr::Exception failure = failureWith(-8, R"({"a":1})");
+            buffer = failure.what();
+            throw failure;
+        },
+        &status.record);
+    EXPECT_EQ(buffer, status.record.json);
+    tOwnStatus bare;
+    bridge([] { throw failureWith(-8, nullptr); }, &bare.record);
+    EXPECT_EQ(-8, bare.record.code);
+    EXPECT_EQ("(none)", bare.text());
+}
+
+} // namespace
