@@ -1,0 +1,20 @@
+#include "zvplat/quarks/synchronization.h"
+
+tMutex::tMutex() : created(false)
+{
+    pthread_mutexattr_t attributes;
+    if (pthread_mutexattr_init(&attributes) != 0) return;
+    if (pthread_mutexattr_settype(&attributes, PTHREAD_MUTEX_RECURSIVE) == 0) {
+        // Without priority inheritance the mutex still does its work.
+        (void)pthread_mutexattr_setprotocol(&attributes, PTHREAD_PRIO_INHERIT);
+        created = pthread_mutex_init(&mutex, &attributes) == 0;
+    }
+    pthread_mutexattr_destroy(&attributes);
+}
+
+tMutex::~tMutex()
+{
+    if (!created) return;
+    pthread_mutex_destroy(&mutex);
+    created = false;
+}

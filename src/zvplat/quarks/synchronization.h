@@ -1,0 +1,39 @@
+#pragma once
+
+#include <pthread.h>
+
+// A recursive, priority-inheriting mutex. Recursive because a servo's states call back into the
+// servo under its lock; priority-inheriting because hosts feed clocks from real-time threads.
+class tMutex
+{
+public:
+    tMutex();
+    ~tMutex();
+    tMutex(const tMutex&) = delete;
+    tMutex& operator=(const tMutex&) = delete;
+
+    // False if the system refused the mutex. It must not be locked then.
+    bool isCreated() const { return created; }
+
+    void lock() { pthread_mutex_lock(&mutex); }
+    void unlock() { pthread_mutex_unlock(&mutex); }
+
+private:
+    friend class tMutexGuard;
+
+    pthread_mutex_t mutex;
+    bool created;
+};
+
+// Holds a mutex for a scope. Its owner must outlive it.
+class tMutexGuard
+{
+public:
+    explicit tMutexGuard(tMutex& owner) : mutex(&owner.mutex) { pthread_mutex_lock(mutex); }
+    ~tMutexGuard() { pthread_mutex_unlock(mutex); }
+    tMutexGuard(const tMutexGuard&) = delete;
+    tMutexGuard& operator=(const tMutexGuard&) = delete;
+
+private:
+    pthread_mutex_t* mutex;
+};
