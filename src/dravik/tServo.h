@@ -1,0 +1,105 @@
+#pragma once
+
+#include "dravik/iServoConfig.h"
+#include "dravik/iServoSMController.h"
+#include "dravik/iTimekeeper.h"
+#include "dravik/tServoStateFrequencyLock.h"
+#include "dravik/tServoStateIdle.h"
+#include "dravik/tServoStatePhaseLock.h"
+#include "dravik/tServoStateSnapTime.h"
+#include "zvckmservo/servo.h"
+#include "zvplat/quarks/synchronization.h"
+
+#include <cstdint>
+#include <string>
+
+namespace zvckmDravik {
+
+// The servo of one clock: the states, the parameters, and the one lock. It stands between the
+// states, which see it through the three interfaces only, and the host's table of integers.
+//
+// Every public operation takes the lock and holds it across the host's operations; it is recursive
+// because the states call back in. Construction and destruction run without it.
+class tServo : protected iServoConfig, protected iServoSMController, protected iTimekeeper
+{
+public:
+    // Asks the host for its limits and starts in frequency lock. `host` is borrowed. Raises what
+    // the host reports, and zvplaterr_softwareFaultPLATInternalUseOnly if there is no mutex.
+    explicit tServo(zvckmservo_HostTable* host);
+    ~tServo() override = default;
+
+    void clearHistory();
+    void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock);
+    tTimeSpan getTime();
+
+    std::string readServoConfigJson() override;
+    void writeServoConfigJson(const std::string& json) override;
+    void applyMetaData(const std::string& metaDataJson);
+
+protected:
+    double getFrequencyLockGain() const override;
+    double getPhaseLockGain() const override;
+    double getPhaseLockCoefficientA() const override;
+    double getPhaseLockCoefficientB() const override;
+    double getPhaseLockCoefficientC() const override;
+    double getSnapTimeThreshold() const override;
+    double getMaxFrequencyOffset() const override;
+    double getMinFrequencyOffset() const override;
+    bool getSpikeFilterEnabled() const override;
+    uint32_t getSpikeFilterHistorySize() const override;
+    double getSpikeFilterMaxThreshold() const override;
+    double getSpikeFilterMinThreshold() const override;
+    double getSpikeFilterGrowthFactor() const override;
+
+    void setFrequencyLockGain(double value) override;
+    void setPhaseLockGain(double value) override;
+    void setPhaseLockCoefficientA(double value) override;
+    void setPhaseLockCoefficientB(double value) override;
+    void setPhaseLockCoefficientC(double value) override;
+    void setSnapTimeThreshold(double value) override;
+    void setSpikeFilterEnabled(bool value) override;
+    void setSpikeFilterHistorySize(uint32_t value) override;
+    void setSpikeFilterMaxThreshold(double value) override;
+    void setSpikeFilterMinThreshold(double value) override;
+    void setSpikeFilterGrowthFactor(double value) override;
+
+    void setState(tServoStateId id) override;
+
+    void stepTime(const tTimeSpan& delta) override;
+    double getFrequency() override;
+    void setFrequency(double ratio) override;
+
+private:
+    iServoState& stateOf(tServoStateId id);
+
+    // One member under the lock; nothing can throw in between.
+    template <class T> T read(const T& member) const;
+    template <class T> void write(T& member, T value);
+
+    mutable tMutex mutex;
+    zvckmservo_HostTable* host; // the host's; never freed
+
+    tServoStateIdle idleState;
+    tServoStateFrequencyLock frequencyLockState;
+    tServoStatePhaseLock phaseLockState;
+    tServoStateSnapTime snapTimeState;
+    iServoState* currentState; // one of the four above, never null
+
+    double frequencyLockGain = 1.0;
+    double phaseLockGain = 0.55;
+    double phaseLockCoefficientA = 2.0;
+    double phaseLockCoefficientB = 1.0;
+    double phaseLockCoefficientC = 1.0;
+    double snapTimeThreshold = 1e-6;
+    double maxFrequencyOffset = 0.0; // from the host, at construction
+    double minFrequencyOffset = 0.0;
+    bool spikeFilterEnabled = false;
+    uint32_t spikeFilterHistorySize = 5;
+    double spikeFilterMaxThreshold = 1.0;
+    double spikeFilterMinThreshold = 2.5e-8;
+    double spikeFilterGrowthFactor = 3.0;
+
+    std::string timeReferenceType; // of the last metadata applied; empty at first
+};
+
+} // namespace zvckmDravik

@@ -1,0 +1,18 @@
+#pragma once
+
+#include "dravik/iServoState.h"
+
+namespace zvckmDravik {
+
+// Steps the clock onto the reference, once.
+class tServoStateSnapTime final : public iServoState
+{
+public:
+    using iServoState::iServoState;
+
+    void enter() override;
+    void exit() override;
+    void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock) override;
+};
+
+} // namespace zvckmDravik

@@ -1,0 +1,105 @@
+#include "zvckmservo/servo.h"
+
+#include "dravik/tServo.h"
+#include "zverr/tools/exception_errStatus.h"
+
+// The boundary. Each function checks the status that came in, calls one operation of the servo and
+// turns whatever is thrown into the status; nothing else happens here.
+
+using zvckmDravik::tServo;
+using zvckmDravik::tTimeSpan;
+
+namespace {
+
+tServo& servoOf(const zvckmservo_HostTable* host)
+{
+    return *static_cast<tServo*>(host->servoHandle);
+}
+
+} // namespace
+
+void zvckmservo_initialize(zvckmservo_HostTable* host, zverr_Status* status)
+{
+    if (status->code < 0) return;
+    try {
+        tServo* const servo = new tServo(host);
+        host->servoHandle = servo; // only once there is one
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}
+
+void zvckmservo_finalize(zvckmservo_HostTable* host) noexcept
+{
+    const tServo* const servo = static_cast<tServo*>(host->servoHandle);
+    host->servoHandle = nullptr;
+    delete servo;
+}
+
+int32_t zvckmservo_isSeeded(zvckmservo_HostTable* /*host*/) { return 0; }
+
+void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_Status* status)
+{
+    if (status->code < 0) return;
+    try {
+        servoOf(host).clearHistory();
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}
+
+void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime, uint64_t clockTime,
+                           zverr_Status* status)
+{
+    if (status->code < 0) return;
+    try {
+        servoOf(host).adjustTime(tTimeSpan(referenceTime), tTimeSpan(clockTime));
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}
+
+void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* time, zverr_Status* status)
+{
+    if (status->code < 0) return;
+    try {
+        *time = servoOf(host).getTime().getMagnitude();
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}
+
+int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host, const char* configJson,
+                                    zverr_Status* status)
+{
+    if (status->code < 0) return 1;
+    try {
+        servoOf(host).writeServoConfigJson(configJson);
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+    return status->code < 0 ? 1 : 0;
+}
+
+int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, char* buffer, size_t bufferSize,
+                                   zverr_Status* status)
+{
+    if (status->code < 0) return 1;
+    try {
+        servoOf(host).readServoConfigJson().copy(buffer, bufferSize);
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+    return status->code < 0 ? 1 : 0;
+}
+
+void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
+                              zverr_Status* status)
+{
+    if (status->code < 0) return;
+    try {
+        servoOf(host).applyMetaData(metaDataJson);
+    } catch (...) {
+        zverr_exceptionToStatus(status);
+    }
+}

@@ -1,0 +1,216 @@
+// The nine exported functions: the frame that every call goes through.
+
+#include "support/allocator.h"
+#include "support/tFakeHost.h"
+
+#include <cerrno>
+#include <gtest/gtest.h>
+#include <pthread.h>
+#include <stdexcept>
+#include <thread>
+
+namespace {
+
+bool mutexCreationFails = false;
+
+constexpr uint64_t kSecond = 1000000000U;
+using tCalls = std::vector<std::string>;
+
+// Another thread gets through: the lock is free. A lock left behind would hang the test.
+void expectLockFree(tFakeHost& host)
+{
+    std::thread([&host] {
+        uint64_t time = 0;
+        zverr_Status status{0, 0, foreignReallocJson, nullptr};
+        zvckmservo_getTime(&host.table, &time, &status);
+        EXPECT_EQ(0, status.code);
+    }).join();
+}
+
+} // namespace
+
+// Stands in for the system's function (--wrap), which cannot be made to fail.
+extern "C" int __real_pthread_mutex_init(pthread_mutex_t* mutex,
+                                         const pthread_mutexattr_t* attributes);
+extern "C" int __wrap_pthread_mutex_init(pthread_mutex_t* mutex,
+                                         const pthread_mutexattr_t* attributes)
+{
+    return mutexCreationFails ? ENOMEM : __real_pthread_mutex_init(mutex, attributes);
+}
+
+namespace {
+
+TEST(Initialize, AsksForTheLimitsOnlyAndOverwritesTheHandle)
+{
+    tFakeHost host;
+    host.initialize();
+    EXPECT_EQ(0, host.code());
+    EXPECT_EQ((tCalls{"getMaxFrequencyOffset", "getMinFrequencyOffset"}), host.takeCalls());
+    EXPECT_NE(nullptr, host.table.servoHandle);
+    zvckmservo_finalize(&host.table);
+    EXPECT_EQ(nullptr, host.table.servoHandle);
+    zvckmservo_finalize(&host.table);
+    EXPECT_EQ(tCalls{}, host.takeCalls()) << "the end of a servo leaves the clock alone";
+    EXPECT_EQ(0, zvckmservo_isSeeded(nullptr));
+}
+
+TEST(Initialize, LeavesTheHandleAloneWhenItFails)
+{
+    int somethingElse = 0;
+    for (const std::string failing : {"getMaxFrequencyOffset", "getMinFrequencyOffset", "mutex"}) {
+        SCOPED_TRACE(failing);
+        const long before = allocator::liveBlocks();
+        {
+            tFakeHost host;
+            host.table.servoHandle = &somethingElse;
+            host.failIn(failing);
+            mutexCreationFails = failing == "mutex";
+            host.initialize();
+            EXPECT_EQ(mutexCreationFails ? -52003 : -77, host.code());
+            EXPECT_EQ(mutexCreationFails ? "{}" : R"({"clock":"broken"})", host.status.text());
+            EXPECT_EQ(&somethingElse, host.table.servoHandle);
+            mutexCreationFails = false;
+            host.table.servoHandle = nullptr;
+        }
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
+}
+
+TEST(Initialize, SurvivesTheFailureOfEachAllocation)
+{
+    long n = 1;
+    for (bool fired = true; fired; ++n) {
+        tFakeHost host;
+        host.initialize(); // whatever the test itself keeps is allocated by now
+        zvckmservo_finalize(&host.table);
+        host.takeCalls();
+        const long before = allocator::liveBlocks();
+        {
+            const allocator::tFailNth failing(n);
+            zvckmservo_initialize(&host.table, &host.status.record);
+            fired = failing.fired();
+        }
+        EXPECT_EQ(fired ? -52000 : 0, host.code()) << "allocation " << n;
+        EXPECT_EQ(fired, host.table.servoHandle == nullptr);
+        host.takeCalls();
+        zvckmservo_finalize(&host.table);
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
+    EXPECT_GT(n, 2) << "the sweep did reach the servo";
+}
+
+TEST(Boundary, ANegativeStatusStopsEveryCall)
+{
+    tFakeHost host;
+    host.initialize();
+    host.lock();
+    for (const int32_t code : {-1, INT32_MIN}) {
+        tHostStatus failed(code, R"({"first":"failure"})");
+        uint64_t time = 7;
+        char buffer[4] = "abc";
+        void* const handle = host.table.servoHandle;
+        zvckmservo_initialize(&host.table, &failed.record);
+        zvckmservo_clearHistory(&host.table, &failed.record);
+        zvckmservo_adjustTime(&host.table, 4 * kSecond, 4 * kSecond, &failed.record);
+        zvckmservo_getTime(&host.table, &time, &failed.record);
+        EXPECT_EQ(1, zvckmservo_writeServoConfigJson(&host.table, "{}", &failed.record));
+        EXPECT_EQ(1, zvckmservo_readServoConfigJson(&host.table, buffer, 3, &failed.record));
+        zvckmservo_applyMetaData(&host.table, "{}", &failed.record);
+        EXPECT_EQ(handle, host.table.servoHandle);
+        EXPECT_EQ(7U, time);
+        EXPECT_STREQ("abc", buffer);
+        EXPECT_EQ(code, failed.code());
+        EXPECT_EQ(R"({"first":"failure"})", failed.text());
+        EXPECT_EQ(tCalls{}, host.takeCalls());
+    }
+    host.pair(4 * kSecond, 4 * kSecond);
+    EXPECT_EQ((tCalls{"getFrequency", "setFrequency 0"}), host.takeCalls())
+        << "still in phase lock";
+}
+
+TEST(Boundary, AWarningStopsNothingAndStays)
+{
+    tFakeHost host;
+    tHostStatus warned(3, R"({"warning":1})");
+    host.inOperation = [](const std::string&, zverr_Status* status) { status->code = 9; };
+    host.timeNs = UINT64_MAX;
+    uint64_t time = 0;
+    zvckmservo_initialize(&host.table, &warned.record);
+    zvckmservo_adjustTime(&host.table, 1, 1, &warned.record);
+    zvckmservo_clearHistory(&host.table, &warned.record);
+    zvckmservo_getTime(&host.table, &time, &warned.record);
+    EXPECT_EQ(UINT64_MAX, time);
+    EXPECT_EQ(3, warned.code());
+    EXPECT_EQ(R"({"warning":1})", warned.text());
+}
+
+TEST(Boundary, TextOperationsReportThatTheyAreNotThereYet)
+{
+    tFakeHost host;
+    host.initialize();
+    char buffer[4] = "abc";
+    EXPECT_EQ(1, zvckmservo_writeServoConfigJson(&host.table, "{}", &host.status.record));
+    EXPECT_EQ(-52003, host.code());
+    host.status.reset();
+    EXPECT_EQ(1, zvckmservo_readServoConfigJson(&host.table, buffer, 3, &host.status.record));
+    EXPECT_EQ(-52003, host.code());
+    EXPECT_STREQ("abc", buffer);
+    host.status.reset();
+    zvckmservo_applyMetaData(&host.table, "{}", &host.status.record);
+    EXPECT_EQ(-52003, host.code());
+}
+
+TEST(Boundary, AFailingOperationArrivesWholeAndFreesTheLock)
+{
+    struct Row {
+        const char* operation;
+        int thrown; // 0: a code; 1: a standard exception; 2: something else
+        int32_t code;
+        const char* text;
+    };
+    const char* const broken = R"({"clock":"broken"})";
+    const Row rows[] = {
+        {"getTime", 0, -77, broken},       {"getFrequency", 0, -77, broken},
+        {"setFrequency", 0, -77, broken},  {"stepTime", 0, -77, broken},
+        {"getTime", 1, -52003, "(none)"},  {"getFrequency", 2, -52003, "(none)"},
+        {"stepTime", 1, -52003, "(none)"},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(testing::Message() << row.operation << " " << row.thrown);
+        const long before = allocator::liveBlocks();
+        {
+            tFakeHost host;
+            host.initialize();
+            const bool stepping = row.operation == std::string("stepTime");
+            if (stepping) {
+                host.pair(1 * kSecond, 1 * kSecond);
+                host.pair(2 * kSecond, 2 * kSecond);
+            } else {
+                host.lock();
+            }
+            host.failIn(row.operation);
+            if (row.thrown != 0) {
+                host.inOperation = [&row](const std::string&, zverr_Status* status) {
+                    status->code = -5; // dropped: the exception is on its way
+                    if (row.thrown == 1) throw std::runtime_error("broken");
+                    throw 42;
+                };
+            }
+            uint64_t time = 7;
+            host.status.reset();
+            if (row.operation == std::string("getTime")) {
+                zvckmservo_getTime(&host.table, &time, &host.status.record);
+            } else {
+                host.pair(4 * kSecond, 4 * kSecond + (stepping ? kSecond : 0));
+            }
+            EXPECT_EQ(row.code, host.code());
+            EXPECT_EQ(row.text, host.status.text());
+            EXPECT_EQ(7U, time);
+            host.inOperation = nullptr;
+            expectLockFree(host);
+        }
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
+}
+
+} // namespace

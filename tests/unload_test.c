@@ -1,0 +1,103 @@
+/* A host in C: loads the library, uses it, closes it, and finds it gone from the process. */
+
+#include "zvckmservo/servo.h"
+
+#include <dlfcn.h>
+#include <stdio.h>
+#include <stdlib.h>
+#include <string.h>
+
+static int32_t offsetPpb = 0;
+static int32_t failure = 0;
+
+static void readClock(uint64_t* timeNs, zverr_Status* status)
+{
+    (void)status;
+    *timeNs = 4000000000U;
+}
+
+static void stepTime(int64_t deltaNs, zverr_Status* status)
+{
+    (void)deltaNs;
+    (void)status;
+}
+
+static void getFrequency(int32_t* ppb, zverr_Status* status)
+{
+    status->code =
+        failure; /* makes the plug-in throw and catch: unwinding must not pin it either */
+    *ppb = offsetPpb;
+}
+
+static void setFrequency(int32_t ppb, zverr_Status* status)
+{
+    (void)status;
+    offsetPpb = ppb;
+}
+
+static int32_t getLimit(zverr_Status* status)
+{
+    (void)status;
+    return 500000;
+}
+
+static bool noBuffer(zverr_Status* status, uint32_t size)
+{
+    (void)status;
+    return size == 0;
+}
+
+static void check(int good, const char* what)
+{
+    if (good) return;
+    fprintf(stderr, "unload_test: %s\n", what);
+    exit(1);
+}
+
+#define BIND(name)                                                                                 \
+    __typeof__(&zvckmservo_##name) name = (__typeof__(name))dlsym(library, "zvckmservo_" #name)
+
+static void useAndClose(const char* path)
+{
+    void* const library = dlopen(path, RTLD_NOW | RTLD_LOCAL);
+    check(library != NULL, "dlopen failed");
+    __extension__ BIND(initialize);
+    __extension__ BIND(adjustTime);
+    __extension__ BIND(getTime);
+    __extension__ BIND(finalize);
+
+    zvckmservo_HostTable host;
+    memset(&host, 0, sizeof host);
+    host.getTime = readClock;
+    host.stepTime = stepTime;
+    host.getFrequency = getFrequency;
+    host.setFrequency = setFrequency;
+    host.getMaxFrequencyOffset = getLimit;
+    host.getMinFrequencyOffset = getLimit;
+    zverr_Status status = {0, 0, noBuffer, NULL};
+    uint64_t now = 0;
+
+    initialize(&host, &status);
+    adjustTime(&host, 1000000000U, 1000000000U, &status);
+    failure = -5;
+    adjustTime(&host, 2000000000U, 2000012000U, &status);
+    check(status.code == -5, "the clock's failure did not arrive");
+    failure = 0;
+    status.code = 0;
+    getTime(&host, &now, &status);
+    check(status.code == 0 && now == 4000000000U, "the clock's time did not arrive");
+    finalize(&host);
+    check(host.servoHandle == NULL, "the servo is still there");
+
+    check(dlclose(library) == 0, "dlclose failed");
+    check(dlopen(path, RTLD_NOW | RTLD_NOLOAD) == NULL, "still loaded after dlclose");
+}
+
+int main(int argc, char** argv)
+{
+    check(argc == 2, "usage: unload_test LIBRARY");
+    for (int round = 0; round < 3; ++round) {
+        useAndClose(argv[1]);
+    }
+    return 0;
+}
