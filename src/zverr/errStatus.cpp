@@ -29,8 +29,6 @@ bool codeReplaces(int32_t newCode, int32_t code)
 
 } // namespace
 
-zverr_Status zverr_emptyStatus() { return {0, 0, zverr_defaultReallocJson, nullptr}; }
-
 bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size)
 {
     if (size == 0) {

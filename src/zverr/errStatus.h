@@ -5,12 +5,15 @@
 // The operations on a status record. None of them throws by itself; a reallocJson that comes from
 // a host could, and the record then has its code and the text written until then.
 
-// An empty record as the plug-in makes it for itself: no code, no buffer, the standard reallocJson.
-zverr_Status zverr_emptyStatus();
-
 // The standard reallocJson: malloc, at least 512 bytes, sizes in powers of two. Its address goes to
 // hosts in the records that their operations are given.
 extern "C" bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size);
+
+// An empty record as the plug-in makes it for itself: no code, no buffer, the standard reallocJson.
+inline zverr_Status zverr_emptyStatus()
+{
+    return {0, 0, zverr_defaultReallocJson, nullptr};
+}
 
 // Puts `text` into the buffer in place of what was there; null stands for "{}". `text` lies outside
 // the buffer. False if there is no room to be had for it; the old text then stays.

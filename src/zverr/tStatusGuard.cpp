@@ -1,14 +1,10 @@
 #include "zverr/tStatusGuard.h"
 
 #include "zverr/Exception.h"
-#include "zverr/errStatus.h"
 
 namespace zverr {
 
-tStatusGuard::tStatusGuard() noexcept : zverr_Status(zverr_emptyStatus()) {}
-
-// NOLINTNEXTLINE(bugprone-exception-escape)
-tStatusGuard::~tStatusGuard() noexcept(false)
+void tStatusGuard::endScope()
 {
     if (code >= 0 || std::uncaught_exceptions() > 0) {
         zverr_releaseJson(this);

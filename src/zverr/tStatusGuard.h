@@ -1,6 +1,6 @@
 #pragma once
 
-#include "zverr/status.h"
+#include "zverr/errStatus.h"
 
 namespace zverr {
 
@@ -14,10 +14,18 @@ namespace zverr {
 //
 // While another exception is propagating the guard raises nothing: its own failure is dropped.
 struct tStatusGuard : zverr_Status {
-    tStatusGuard() noexcept;
+    tStatusGuard() noexcept : zverr_Status(zverr_emptyStatus()) {}
     tStatusGuard(const tStatusGuard&) = delete;
     tStatusGuard& operator=(const tStatusGuard&) = delete;
-    ~tStatusGuard() noexcept(false); // NOLINT(bugprone-exception-escape): it is what it is for
+
+    // NOLINTNEXTLINE(bugprone-exception-escape): it is what the guard is for
+    ~tStatusGuard() noexcept(false)
+    {
+        if (code != 0 || json != nullptr) endScope();
+    }
+
+private:
+    void endScope();
 };
 
 static_assert(sizeof(tStatusGuard) == sizeof(zverr_Status), "no further fields");
