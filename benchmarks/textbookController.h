@@ -1,0 +1,19 @@
+#pragma once
+
+#include "zvckmservo/servo.h"
+
+// The yardstick: a proportional-integral controller as a textbook has it, behind the same call.
+// No lock, no states, no status of its own, no limits but the clamp.
+class tTextbookController
+{
+public:
+    // One pair, and the offset set through the host's table.
+    void adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime, uint64_t clockTime,
+                    zverr_Status* status);
+
+    // The arithmetic alone: the new frequency offset in parts per billion.
+    int32_t nextOffsetPpb(uint64_t referenceTime, uint64_t clockTime);
+
+private:
+    double integral = 0.0; // parts per billion
+};
