@@ -1,4 +1,5 @@
 # What every target of the project is compiled with: language, warnings, floating point.
+set(CMAKE_CXX_EXTENSIONS OFF)
 add_library(dravik_flags INTERFACE)
 target_compile_features(dravik_flags INTERFACE c_std_11 cxx_std_17)
 target_include_directories(dravik_flags INTERFACE ${PROJECT_SOURCE_DIR}/include)

@@ -10,10 +10,7 @@
 extern "C" bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size);
 
 // An empty record as the plug-in makes it for itself: no code, no buffer, the standard reallocJson.
-inline zverr_Status zverr_emptyStatus()
-{
-    return {0, 0, zverr_defaultReallocJson, nullptr};
-}
+inline zverr_Status zverr_emptyStatus() { return {0, 0, zverr_defaultReallocJson, nullptr}; }
 
 // Puts `text` into the buffer in place of what was there; null stands for "{}". `text` lies outside
 // the buffer. False if there is no room to be had for it; the old text then stays.
