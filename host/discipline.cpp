@@ -1,0 +1,49 @@
+#include "discipline.h"
+
+#include "tLockObserver.h"
+#include "tReport.h"
+#include "tServoHost.h"
+#include "tSummary.h"
+#include "tTrace.h"
+
+namespace {
+
+// Hands over one pair. What the clock was asked is noted also if the plug-in then failed.
+void adjust(tServoHost& host, const tPair& pair, tTrace& trace)
+{
+    trace.addPair(pair);
+    try {
+        host.adjustTime(pair.referenceNs, pair.clockNs);
+    } catch (...) {
+        trace.addCalls(pair.elapsedNs, host.calls());
+        trace.flush();
+        throw;
+    }
+    trace.addCalls(pair.elapsedNs, host.calls());
+}
+
+} // namespace
+
+void discipline(const tServoLibrary& library, iClock& clock, iPairSource& source,
+                const std::string& scenario, const std::string& csvPath)
+{
+    tTrace trace(csvPath);
+    tReport report(csvPath == "-");
+    tSummary summary;
+    tServoHost host(library, clock);
+    tLockObserver observer(clock.minOffsetPpb(), clock.maxOffsetPpb());
+
+    report.print(scenario + "\n");
+    trace.addCalls(0, host.calls());
+    summary.addCalls(host.calls());
+    while (const auto pair = source.next()) {
+        adjust(host, *pair, trace);
+        const tLockEvent event = observer.observe(host.calls());
+        summary.addCalls(host.calls());
+        summary.addPair(*pair, event, observer.locked());
+        report.event(*pair, event, host.calls());
+        report.progress(*pair, observer.locked());
+    }
+    report.print(summary.text());
+    trace.flush();
+}

@@ -1,0 +1,20 @@
+#pragma once
+
+#include <cstdint>
+
+// A clock that can be disciplined. Any operation may throw; the failure reaches the plug-in as a
+// negative status code. Positive offsets make it run faster, positive steps move it forward.
+class iClock
+{
+public:
+    virtual ~iClock() = default;
+
+    virtual uint64_t timeNs() = 0;
+    virtual void step(int64_t deltaNs) = 0;
+
+    // Offset of the rate from nominal that is in force, and what it may be set to.
+    virtual int32_t offsetPpb() = 0;
+    virtual void setOffsetPpb(int32_t offsetPpb) = 0;
+    virtual int32_t maxOffsetPpb() = 0;
+    virtual int32_t minOffsetPpb() = 0;
+};

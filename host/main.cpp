@@ -1,0 +1,52 @@
+// dravik-host: loads the clock servo plug-in as any other host would, and lets it discipline a
+// clock. A verb chooses a clock and a source of pairs; the loop is the same for all.
+
+#include "simulate.h"
+
+#include <cstdio>
+#include <exception>
+
+namespace {
+
+enum tExitStatus { kGood = 0, kFailure = 1, kUsage = 2 };
+
+constexpr const char* kFooter =
+    "Values have units: ns us ms s min h, ppb ppm, %.\n"
+    "Exit status: 0 good; 1 a failure of the plug-in or of a file; 2 wrong usage.";
+
+std::string errorLine(const CLI::App* /*app*/, const CLI::Error& error)
+{
+    return std::string("dravik-host: ") + error.what() + "\n";
+}
+
+int hostMain(int argc, char** argv)
+{
+    CLI::App app("Reference host of the clock servo plug-in", "dravik-host");
+    app.get_formatter()->column_width(40);
+    app.set_version_flag("--version", "dravik-host " DRAVIK_VERSION, "Print the version and exit");
+    app.require_subcommand(0, 1);
+    app.failure_message(errorLine);
+    app.footer(kFooter);
+    const tVerb verbs[] = {addSimulate(app)};
+    try {
+        app.parse(argc, argv);
+        if (app.get_subcommands().empty()) throw CLI::RequiredError("A verb, simulate,");
+    } catch (const CLI::ParseError& outcome) { // help and version come this way too
+        return app.exit(outcome) == 0 ? kGood : kUsage;
+    }
+    for (const tVerb& verb : verbs)
+        if (verb.app->parsed()) verb.run();
+    return kGood;
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    try {
+        return hostMain(argc, argv);
+    } catch (const std::exception& failure) {
+        (void)std::fprintf(stderr, "dravik-host: %s\n", failure.what());
+        return kFailure;
+    }
+}

@@ -1,0 +1,29 @@
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+
+// A kind of quantity: its units as the command line takes them, and their size in the base unit.
+struct tUnit {
+    const char* name;
+    double size; // 0 ends the list
+};
+struct tQuantityKind {
+    const char* placeholder; // in the help
+    tUnit units[7];
+};
+
+extern const tQuantityKind kDuration;  // base unit: ns
+extern const tQuantityKind kFrequency; // base unit: ppb
+extern const tQuantityKind kRatio;     // base unit: 1
+
+// Reads a number with its unit, as in "125ms", "-12ppm", "1%", whatever the locale; only 0 may
+// stand alone. Throws std::invalid_argument that tells what is wrong.
+double parseQuantity(std::string_view text, const tQuantityKind& kind);
+
+// For people: "1.012 ms", "+11.980 ppm", "2.125" (seconds).
+std::string durationText(double ns);
+std::string signedDurationText(double ns);
+std::string offsetText(double offsetPpb);
+std::string secondsText(int64_t ns, int digits);

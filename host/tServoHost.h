@@ -1,0 +1,33 @@
+#pragma once
+
+#include "iClock.h"
+#include "tHostCall.h"
+#include "tServoLibrary.h"
+
+// One clock under the plug-in's discipline: initialised with the scope, finalised at its end.
+class tServoHost
+{
+public:
+    // Library and clock are borrowed. Throws std::runtime_error with the plug-in's code.
+    tServoHost(const tServoLibrary& plugIn, iClock& clock);
+    tServoHost(const tServoHost&) = delete; // the plug-in keeps the address of the table
+    tServoHost& operator=(const tServoHost&) = delete;
+    ~tServoHost();
+
+    // Throws std::runtime_error with code and payload; the calls made until then are kept.
+    void adjustTime(uint64_t referenceNs, uint64_t clockNs);
+
+    // What the plug-in asked of the clock during the last call, or during initialisation.
+    const tHostCalls& calls() const { return subject.calls; }
+
+    // What the operations work on, as they are told nothing about it.
+    struct tSubject {
+        iClock& clock;
+        tHostCalls calls;
+    };
+
+private:
+    const tServoLibrary& library;
+    tSubject subject;
+    zvckmservo_HostTable table;
+};
