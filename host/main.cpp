@@ -1,6 +1,7 @@
 // dravik-host: loads the clock servo plug-in as any other host would, and lets it discipline a
 // clock. A verb chooses a clock and a source of pairs; the loop is the same for all.
 
+#include "run.h"
 #include "simulate.h"
 
 #include <cstdio>
@@ -27,10 +28,10 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app)};
+    const tVerb verbs[] = {addSimulate(app), addRun(app)};
     try {
         app.parse(argc, argv);
-        if (app.get_subcommands().empty()) throw CLI::RequiredError("A verb, simulate,");
+        if (app.get_subcommands().empty()) throw CLI::RequiredError("A verb, simulate or run,");
     } catch (const CLI::ParseError& outcome) { // help and version come this way too
         return app.exit(outcome) == 0 ? kGood : kUsage;
     }

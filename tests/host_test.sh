@@ -1,0 +1,144 @@
+#!/usr/bin/env bash
+# The reference host from outside: what it prints, what it writes, how it ends.
+# Usage: host_test.sh FOLDER, with dravik-host and libdravik.so.1 in it
+set -uo pipefail
+host=$1/dravik-host
+include=$(cd "$(dirname "$0")/../include" && pwd)
+scratch=$(mktemp -d)
+trap 'rm -rf "$scratch"' EXIT
+unset DRAVIK_LIBRARY
+checks=0 failures=0
+
+expect() { # NAME EXPECTED FOUND
+    checks=$((checks + 1))
+    [ "$2" == "$3" ] && return
+    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
+    failures=$((failures + 1))
+}
+
+# A failure has one line on stderr, anything else none; and the pattern is found in the output.
+check() { # NAME STATUS PATTERN ARGUMENTS...
+    local name=$1 status=$2 pattern=$3 found=0
+    shift 3
+    "$host" "$@" > "$scratch/out" 2> "$scratch/err" || found=$?
+    expect "$name: exit status" "$status" "$found"
+    expect "$name: lines on stderr" $((status > 0)) "$(wc -l < "$scratch/err")"
+    cat "$scratch/out" "$scratch/err" > "$scratch/both"
+    expect "$name: output with $pattern" 0 "$(grep -qE -- "$pattern" "$scratch/both"; echo $?)"
+}
+
+table() { # rows of NAME|STATUS|PATTERN|ARGUMENTS on stdin
+    local name status pattern arguments
+    while IFS='|' read -r name status pattern arguments; do
+        # shellcheck disable=SC2086  # split on purpose
+        check "$name" "$status" "$pattern" $arguments
+    done
+}
+
+bad="simulate --outlier-rate 1% --outlier-size 5us"
+table << END
+frequency measured  |0|^ +1\.000 s  frequency measured: \+12\.0.. ppm off|simulate
+clock stepped       |0|^ +2\.000 s  stepped by -1\.012 ms$|simulate
+locked on pair four |0|^ +3\.000 s  locked, error [+-][0-9]+ ns$|simulate
+lock kept           |0|^lock        after 3\.000 s, lost 0 times; 297 pairs locked$|simulate
+small error         |0|^error       RMS [1-4][0-9](\.[0-9]+)? ns, peak|simulate
+behind and slow     |0|^error       RMS [1-4][0-9](\.[0-9]+)? ns|simulate --initial-offset -3ms --frequency-error -12ppm
+no step below 1 us  |0|^ +2\.000 s  no step needed|simulate --initial-offset 0 --frequency-error 0
+outlier loses lock  |0|^ +162\.000 s  lock lost, error -5\.[0-9]+ us$|$bad
+lock regained       |0|^ +170\.000 s  locked|$bad
+losses counted      |0|lost 2 times|$bad
+out of reach        |0|^ +3\.000 s  frequency at its limit, -500\.000 ppm$|simulate --frequency-error 600ppm
+real time           |0|^pairs       [1-8] in 0\.[0-9]+ s$|run --duration 1s
+version             |0|^dravik-host [0-9]+\.[0-9]+\.[0-9]+$|--version
+help                |0|^Exit status: 0 good; 1 .*; 2 wrong usage|simulate --help
+END
+check "never locked" 0 "^lock        never$" simulate --frequency-error 600ppm
+expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
+
+table << END
+no verb             |2|^dravik-host: A verb, simulate or run, is required|
+unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
+no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
+unit of another kind|2|--noise: '1ppm' has an unknown unit 'ppm'|simulate --noise 1ppm
+not a number        |2|--frequency-error: 'nanppm' does not|simulate --frequency-error nanppm
+beyond any number   |2|--duration: '1e999s' is out of range|simulate --duration 1e999s
+interval of 0       |2|--interval: '0' is not within|simulate --interval 0
+rate above 100 %    |2|--outlier-rate: '101%' is not within|simulate --outlier-rate 101%
+trailing text       |2|--interval: '1s1' has an unknown unit|run --interval 1s1
+negative seed       |2|--seed: '-1'|simulate --seed -1
+no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
+another library     |1|libm.* has no zvckmservo_initialize|run --library $(ldd "$host" | awk '/libm\.so/ {print $3}')
+full disk           |1|^dravik-host: cannot write /dev/full: No space|simulate --csv /dev/full --duration 2s
+no such folder      |1|^dravik-host: cannot write $scratch/no/file|simulate --csv $scratch/no/file
+END
+expect "report to a full disk" 1 "$("$host" simulate > /dev/full 2> /dev/null; echo $?)"
+export DRAVIK_LIBRARY=$scratch/named
+check "library of the environment" 1 "$scratch/named" simulate
+check "the option goes first" 0 "lost 0 times" simulate --library "$1/libdravik.so.1"
+unset DRAVIK_LIBRARY
+
+# The CSV file: every pair, every call, exact figures, the same bytes for the same seed.
+n=0
+for seed in 1 2 1; do
+    "$host" simulate --seed $seed --csv "$scratch/$((++n)).csv" > "$scratch/$n"
+done
+expect "same seed, same bytes" "" "$(cmp "$scratch/1.csv" "$scratch/3.csv"; cmp "$scratch/1" "$scratch/3")"
+expect "another seed, other bytes" 1 "$(cmp -s "$scratch/1.csv" "$scratch/2.csv"; echo $?)"
+expect "rows of pairs" 300 "$(grep -c '^pair,' "$scratch/1.csv")"
+for call in stepTime getFrequency setFrequency getMaxFrequencyOffset getMinFrequencyOffset; do
+    expect "rows of $call" "$(grep -o "$call [0-9]*" "$scratch/1")" \
+        "$call $(grep -cE "^call,[0-9.]+,,,,,$call,-?[0-9]+$" "$scratch/1.csv")"
+done
+rows() { "$host" simulate --duration 3s --csv - "$@" 2> /dev/null; }
+quiet=(--noise 0 --frequency-noise 0 --frequency-wander 0)
+expect "noise to the last digit" "pair,1.000000000,1700000000999999967,1700000001001012008,1012041,1012008.727,," \
+    "$(rows --seed 7 --frequency-noise 10ppb | grep '^pair,1')"
+expect "fifty years to the nanosecond" "call,2.000000000,,,,,stepTime,-1577880000000000000" \
+    "$(rows "${quiet[@]}" --frequency-error 0 --initial-offset 438300h | grep stepTime)"
+expect "coarse timestamps" "pair,1.000000000,1700000001000000000,1700000001006000000,6000000,6012000.000,," \
+    "$(rows "${quiet[@]}" --granularity 1ms --initial-offset 6ms | grep '^pair,1')"
+
+# SIGINT and SIGTERM end a run as its duration would.
+for signal in INT TERM; do
+    "$host" run > "$scratch/$signal" & pid=$!
+    for ((wait = 0; wait < 100; ++wait)); do [ -s "$scratch/$signal" ] && break; sleep 0.1; done
+    kill -$signal $pid
+    wait $pid
+    expect "SIG$signal: exit status" 0 $?
+    expect "SIG$signal: summary" 1 "$(grep -c '^host calls' "$scratch/$signal")"
+done
+
+# A plug-in that exceeds the clock's limits: the clock refuses, and code and payload arrive. It also
+# inspects the buffer of the host's status: new, filled, grown, and asked to shrink.
+cat > "$scratch/bad.c" << 'END'
+#include "zvckmservo/servo.h"
+#include <string.h>
+static int wellFormed(const zverr_Status* s)
+{
+    size_t i = strlen(s->json);
+    while (i + 1 < s->capacity && s->json[i] == 0) ++i;
+    return i + 1 == s->capacity && s->json[i] == 'J';
+}
+void zvckmservo_adjustTime(zvckmservo_HostTable* h, uint64_t r, uint64_t c, zverr_Status* s)
+{
+    (void)r, (void)c;
+    if (!s->reallocJson(s, 1) || strcmp(s->json, "{}") || !wellFormed(s)) s->code = -2;
+    h->setFrequency(2000000000, s);
+    const uint32_t size = s->capacity + 100;
+    if (!wellFormed(s) || !s->reallocJson(s, size) || s->capacity != size) s->code = -3;
+    if (!s->reallocJson(s, 9) || s->capacity != size || !wellFormed(s)) s->code = -4;
+}
+void zvckmservo_initialize(zvckmservo_HostTable* h, zverr_Status* s) { (void)h, (void)s; }
+void zvckmservo_finalize(zvckmservo_HostTable* h) { (void)h; }
+END
+for name in isSeeded clearHistory getTime writeServoConfigJson readServoConfigJson applyMetaData; do
+    echo "int zvckmservo_$name;"
+done > "$scratch/rest.c"
+if cc -shared -fPIC -I "$include" -o "$scratch/bad.so" "$scratch/bad.c" "$scratch/rest.c" 2> /dev/null; then
+    check "refused by the clock" 1 \
+        'adjustTime failed with -1: \{"message":"an offset of 2000000000 ppb is beyond the clock.s 500000 ppb"\}$' \
+        simulate --library "$scratch/bad.so"
+fi
+
+echo "$checks checks, $failures failures"
+exit $((failures > 0))
