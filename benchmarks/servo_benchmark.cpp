@@ -2,7 +2,7 @@
 // operations, and the arithmetic of a textbook controller, all measured in the same run.
 
 #include "support/tOpenServo.h"
-#include "tRatioReporter.h"
+#include "tMedianReporter.h"
 #include "textbookController.h"
 #include "zverr/errStatus.h"
 #include "zvplat/quarks/synchronization.h"
@@ -12,6 +12,8 @@
 #include <functional>
 #include <iterator>
 #include <pthread.h>
+#include <string>
+#include <vector>
 
 // Counts the lock operations of a pair; the same for all that is measured.
 static long lockCount = 0;
@@ -224,7 +226,7 @@ const tEntry kEntries[] = {
     {"writeServoConfigJson, refused", exportedRefusedDocument},
 };
 
-void printRatios(const tRatioReporter& results)
+void printRatios(const tMedianReporter& results)
 {
     const auto row = [&results](const char* name, double ns) {
         std::printf("%-34s %8.1f ns %7.2f x first lock %7.2f x textbook pair\n", name, ns,
@@ -266,9 +268,19 @@ int main(int argc, char** argv)
     for (const tEntry& entry : kEntries) {
         benchmark::RegisterBenchmark(entry.name, entry.run);
     }
-    benchmark::Initialize(&argc, argv);
-    if (benchmark::ReportUnrecognizedArguments(argc, argv)) return 1;
-    tRatioReporter reporter;
+    // Repeated in random order, so that what else the machine does falls on all alike.
+    std::vector<std::string> arguments = {argv[0], "--benchmark_repetitions=9",
+                                          "--benchmark_min_time=0.05",
+                                          "--benchmark_enable_random_interleaving=true"};
+    arguments.insert(arguments.end(), argv + 1, argv + argc);
+    std::vector<char*> pointers;
+    for (std::string& argument : arguments) {
+        pointers.push_back(argument.data());
+    }
+    int count = static_cast<int>(pointers.size());
+    benchmark::Initialize(&count, pointers.data());
+    if (benchmark::ReportUnrecognizedArguments(count, pointers.data())) return 1;
+    tMedianReporter reporter;
     benchmark::RunSpecifiedBenchmarks(&reporter);
     if (reporter.size() == std::size(kEntries)) printRatios(reporter); // not after a filter
     return 0;
