@@ -7,6 +7,7 @@
 #include "zverr/errStatus.h"
 #include "zvplat/quarks/synchronization.h"
 
+#include <algorithm>
 #include <benchmark/benchmark.h>
 #include <cstdio>
 #include <functional>
@@ -273,10 +274,9 @@ int main(int argc, char** argv)
                                           "--benchmark_min_time=0.05",
                                           "--benchmark_enable_random_interleaving=true"};
     arguments.insert(arguments.end(), argv + 1, argv + argc);
-    std::vector<char*> pointers;
-    for (std::string& argument : arguments) {
-        pointers.push_back(argument.data());
-    }
+    std::vector<char*> pointers(arguments.size());
+    std::transform(arguments.begin(), arguments.end(), pointers.begin(),
+                   [](std::string& argument) { return argument.data(); });
     int count = static_cast<int>(pointers.size());
     benchmark::Initialize(&count, pointers.data());
     if (benchmark::ReportUnrecognizedArguments(count, pointers.data())) return 1;

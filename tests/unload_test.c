@@ -50,21 +50,27 @@ static bool noBuffer(zverr_Status* status, uint32_t size)
 static void check(int good, const char* what)
 {
     if (good) return;
-    fprintf(stderr, "unload_test: %s\n", what);
+    (void)fprintf(stderr, "unload_test: %s\n", what);
     exit(1);
 }
 
-#define BIND(name)                                                                                 \
-    __typeof__(&zvckmservo_##name) name = (__typeof__(name))dlsym(library, "zvckmservo_" #name)
+static void* bind(void* library, const char* name)
+{
+    void* const function = dlsym(library, name);
+    check(function != NULL, name);
+    return function;
+}
 
 static void useAndClose(const char* path)
 {
     void* const library = dlopen(path, RTLD_NOW | RTLD_LOCAL);
     check(library != NULL, "dlopen failed");
-    __extension__ BIND(initialize);
-    __extension__ BIND(adjustTime);
-    __extension__ BIND(getTime);
-    __extension__ BIND(finalize);
+    __extension__ __typeof__(&zvckmservo_initialize) initialize =
+        bind(library, "zvckmservo_initialize");
+    __extension__ __typeof__(&zvckmservo_adjustTime) adjustTime =
+        bind(library, "zvckmservo_adjustTime");
+    __extension__ __typeof__(&zvckmservo_getTime) getTime = bind(library, "zvckmservo_getTime");
+    __extension__ __typeof__(&zvckmservo_finalize) finalize = bind(library, "zvckmservo_finalize");
 
     zvckmservo_HostTable host;
     memset(&host, 0, sizeof host);
