@@ -1,6 +1,6 @@
 #include "dravik/tServoStateFrequencyLock.h"
 
-#include "dravik/clampFrequencyOffset.h"
+#include "dravik/clamp.h"
 
 // Frequency lock keeps the first pair and compares the second one with it:
 //
@@ -34,7 +34,8 @@ void tServoStateFrequencyLock::adjustTime(const tTimeSpan& reference, const tTim
         timekeeper.setFrequency(newRatio);
         controller.setState(kStateSnapTime);
     } else {
-        const double clamped = clampFrequencyOffset(offset, config);
+        const double clamped = clampMaximumFirst(offset, config.getMaxFrequencyOffset(),
+                                                 config.getMinFrequencyOffset());
         hasFirstPair = false;
         timekeeper.setFrequency(clamped + 1.0);
     }

@@ -1,6 +1,6 @@
 #include "dravik/tServoStatePhaseLock.h"
 
-#include "dravik/clampFrequencyOffset.h"
+#include "dravik/clamp.h"
 
 #include <cmath>
 
@@ -40,7 +40,8 @@ void tServoStatePhaseLock::adjustTime(const tTimeSpan& reference, const tTimeSpa
     const double elapsed = elapsedSinceLastPair(reference);
     const double error = -spikeFilter.filter(phaseError, elapsed);
     const double current = timekeeper.getFrequency();
-    const double offset = clampFrequencyOffset(controlLaw(error, current), config);
+    const double offset = clampMaximumFirst(
+        controlLaw(error, current), config.getMaxFrequencyOffset(), config.getMinFrequencyOffset());
     timekeeper.setFrequency(offset + 1.0);
     lastError = error; // only now: a pair that the clock refused is not part of the law's past
 }

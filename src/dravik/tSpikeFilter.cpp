@@ -1,5 +1,7 @@
 #include "dravik/tSpikeFilter.h"
 
+#include "dravik/clamp.h"
+
 #include <cmath>
 
 namespace zvckmDravik {
@@ -60,12 +62,8 @@ double tSpikeFilter::nextThreshold() const
 {
     const double mean = historySum / static_cast<double>(history.size());
     const double candidate = config.getSpikeFilterGrowthFactor() * mean;
-    // The maximum is tested first, which tells if the two limits cross.
-    const double max = config.getSpikeFilterMaxThreshold();
-    if (candidate > max) return max;
-    const double min = config.getSpikeFilterMinThreshold();
-    if (candidate < min) return min;
-    return candidate;
+    return clampMaximumFirst(candidate, config.getSpikeFilterMaxThreshold(),
+                             config.getSpikeFilterMinThreshold());
 }
 
 } // namespace zvckmDravik
