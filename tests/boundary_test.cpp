@@ -14,7 +14,14 @@ namespace {
 bool mutexCreationFails = false;
 
 constexpr uint64_t kSecond = 1000000000U;
-using tCalls = std::vector<std::string>;
+
+void lockIn(tFakeHost& host)
+{
+    host.pair(1 * kSecond, 1 * kSecond);
+    host.pair(2 * kSecond, 2 * kSecond);
+    host.pair(3 * kSecond, 3 * kSecond);
+    host.takeCalls();
+}
 
 // Another thread gets through: the lock is free. A lock left behind would hang the test.
 void expectLockFree(tFakeHost& host)
@@ -45,12 +52,12 @@ TEST(Initialize, AsksForTheLimitsOnlyAndOverwritesTheHandle)
     tFakeHost host;
     host.initialize();
     EXPECT_EQ(0, host.code());
-    EXPECT_EQ((tCalls{"getMaxFrequencyOffset", "getMinFrequencyOffset"}), host.takeCalls());
+    EXPECT_EQ("max min", host.takeCalls());
     EXPECT_NE(nullptr, host.table.servoHandle);
     zvckmservo_finalize(&host.table);
     EXPECT_EQ(nullptr, host.table.servoHandle);
     zvckmservo_finalize(&host.table);
-    EXPECT_EQ(tCalls{}, host.takeCalls()) << "the end of a servo leaves the clock alone";
+    EXPECT_EQ("", host.takeCalls()) << "the end of a servo leaves the clock alone";
     EXPECT_EQ(0, zvckmservo_isSeeded(nullptr));
 }
 
@@ -103,7 +110,7 @@ TEST(Boundary, ANegativeStatusStopsEveryCall)
 {
     tFakeHost host;
     host.initialize();
-    host.lock();
+    lockIn(host);
     for (const int32_t code : {-1, INT32_MIN}) {
         tHostStatus failed(code, R"({"first":"failure"})");
         uint64_t time = 7;
@@ -121,11 +128,10 @@ TEST(Boundary, ANegativeStatusStopsEveryCall)
         EXPECT_STREQ("abc", buffer);
         EXPECT_EQ(code, failed.code());
         EXPECT_EQ(R"({"first":"failure"})", failed.text());
-        EXPECT_EQ(tCalls{}, host.takeCalls());
+        EXPECT_EQ("", host.takeCalls());
     }
     host.pair(4 * kSecond, 4 * kSecond);
-    EXPECT_EQ((tCalls{"getFrequency", "setFrequency 0"}), host.takeCalls())
-        << "still in phase lock";
+    EXPECT_EQ("get set 0", host.takeCalls()) << "still in phase lock";
 }
 
 TEST(Boundary, AWarningStopsNothingAndStays)
@@ -186,7 +192,7 @@ TEST(Boundary, AFailingOperationArrivesWholeAndFreesTheLock)
                 host.pair(1 * kSecond, 1 * kSecond);
                 host.pair(2 * kSecond, 2 * kSecond);
             } else {
-                host.lock();
+                lockIn(host);
             }
             host.failIn(row.operation);
             if (row.thrown != 0) {

@@ -29,26 +29,22 @@ TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
         void (iServoConfig::*set)(double);
         double initial, lowest, highest;
     };
+#define PARAMETER(name, initial, lowest, highest)                                                  \
+    {                                                                                              \
+#name, &iServoConfig::get##name, &iServoConfig::set##name, initial, lowest, highest        \
+    }
     const Row rows[] = {
-        {"frequencyLockGain", &iServoConfig::getFrequencyLockGain,
-         &iServoConfig::setFrequencyLockGain, 1.0, 1e-9, 10.0},
-        {"phaseLockGain", &iServoConfig::getPhaseLockGain, &iServoConfig::setPhaseLockGain, 0.55,
-         1e-9, 10.0},
-        {"coefficientA", &iServoConfig::getPhaseLockCoefficientA,
-         &iServoConfig::setPhaseLockCoefficientA, 2.0, -10.0, 10.0},
-        {"coefficientB", &iServoConfig::getPhaseLockCoefficientB,
-         &iServoConfig::setPhaseLockCoefficientB, 1.0, -10.0, 10.0},
-        {"coefficientC", &iServoConfig::getPhaseLockCoefficientC,
-         &iServoConfig::setPhaseLockCoefficientC, 1.0, -10.0, 10.0},
-        {"snapTimeThreshold", &iServoConfig::getSnapTimeThreshold,
-         &iServoConfig::setSnapTimeThreshold, 1e-6, 1e-8, 10.0},
-        {"spikeFilterMaxThreshold", &iServoConfig::getSpikeFilterMaxThreshold,
-         &iServoConfig::setSpikeFilterMaxThreshold, 1.0, 1e-9, 10.0},
-        {"spikeFilterMinThreshold", &iServoConfig::getSpikeFilterMinThreshold,
-         &iServoConfig::setSpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0},
-        {"spikeFilterGrowthFactor", &iServoConfig::getSpikeFilterGrowthFactor,
-         &iServoConfig::setSpikeFilterGrowthFactor, 3.0, 1.001, 100.0},
+        PARAMETER(FrequencyLockGain, 1.0, 1e-9, 10.0),
+        PARAMETER(PhaseLockGain, 0.55, 1e-9, 10.0),
+        PARAMETER(PhaseLockCoefficientA, 2.0, -10.0, 10.0),
+        PARAMETER(PhaseLockCoefficientB, 1.0, -10.0, 10.0),
+        PARAMETER(PhaseLockCoefficientC, 1.0, -10.0, 10.0),
+        PARAMETER(SnapTimeThreshold, 1e-6, 1e-8, 10.0),
+        PARAMETER(SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0),
+        PARAMETER(SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0),
+        PARAMETER(SpikeFilterGrowthFactor, 3.0, 1.001, 100.0),
     };
+#undef PARAMETER
     const double infinity = std::numeric_limits<double>::infinity();
     tFakeHost host;
     iServoConfig& config = host.open().config();

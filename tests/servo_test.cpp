@@ -17,8 +17,6 @@ constexpr uint64_t kSecond = 1000000000U;
 constexpr double kNaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
-using tCalls = std::vector<std::string>;
-
 TEST(TimeSpan, FromAndToSeconds)
 {
     struct Row {
@@ -218,242 +216,215 @@ TEST(Timekeeper, SendsWholePartsPerBillionAndExactSteps)
     zvckmDravik::iTimekeeper& timekeeper = host.open().timekeeper();
     for (const Row& row : rows) {
         timekeeper.setFrequency(row.ratio);
-        EXPECT_EQ(tCalls{std::string("setFrequency ") + row.sent}, host.takeCalls()) << row.ratio;
+        EXPECT_EQ(std::string("set ") + row.sent, host.takeCalls()) << row.ratio;
     }
     host.offsetPpb = -1000;
     EXPECT_EQ(1.0 + -1000.0 * 1e-9, timekeeper.getFrequency());
     host.takeCalls();
     timekeeper.stepTime(tTimeSpan(5U, -1));
     timekeeper.stepTime(tTimeSpan(INT64_MIN));
-    EXPECT_EQ((tCalls{"stepTime -5", "stepTime -9223372036854775808"}), host.takeCalls());
+    EXPECT_EQ("step -5 step -9223372036854775808", host.takeCalls());
 }
 
-// A pair as reference and clock in nanoseconds, and the calls that it must lead to.
+// A pair, as reference time and how far the clock is ahead of it, and the calls it must lead to.
 struct tStep {
-    uint64_t reference, clock;
-    tCalls calls;
+    uint64_t referenceNs;
+    int64_t aheadNs;
+    const char* calls;
 };
+using tSteps = std::vector<tStep>;
 
-struct tScenario {
-    const char* name;
-    std::function<void(tFakeHost&)> prepare;
-    std::vector<tStep> steps;
-};
+constexpr uint64_t s = kSecond;
+constexpr uint64_t kClearHistory = 1; // in place of a reference time
+const tSteps kLockIn = {{1 * s, 0, ""}, {2 * s, 0, "get set 0"}, {3 * s, 0, ""}};
+
+void play(tFakeHost& host, const tSteps& steps, int32_t code = 0)
+{
+    for (const tStep& step : steps) {
+        if (step.referenceNs == kClearHistory) {
+            host.clearHistory();
+        } else {
+            host.pair(step.referenceNs, step.referenceNs + static_cast<uint64_t>(step.aheadNs));
+        }
+        EXPECT_EQ(code, host.code());
+        EXPECT_EQ(step.calls, host.takeCalls()) << "pair at " << step.referenceNs;
+    }
+}
 
 TEST(StateMachine, LeadsPairsThroughTheStates)
 {
-    const auto nothing = [](tFakeHost&) {};
-    const auto locked = [](tFakeHost& host) { host.lock(); };
-    const uint64_t s = kSecond;
-    const tCalls none;
-    const tCalls keep{"getFrequency", "setFrequency 0"};
-    const tScenario scenarios[] = {
-        {"12 ppm off to locked",
-         nothing,
-         {{1 * s, 1 * s + 1000000, none},
-          {2 * s, 2 * s + 1012000, {"getFrequency", "setFrequency -12000"}},
-          {3 * s, 3 * s + 1012000, {"stepTime -1012000"}},
-          {4 * s, 4 * s + 100, {"getFrequency", "setFrequency -12110"}},
-          {5 * s, 5 * s, {"getFrequency", "setFrequency -12055"}}}},
-        {"100010 ppb from ten seconds",
-         nothing,
-         {{0, 0, none},
-          {10 * s, 9999000000, {"getFrequency", "setFrequency 100010"}},
-          {11 * s, 11 * s, none},
-          {12 * s, 12 * s, {"getFrequency", "setFrequency 100010"}}}},
-        {"identical pairs are no measurement",
-         nothing,
-         {{s, s, none}, {s, s, {"getFrequency", "setFrequency 0"}}, {s, s, none}}},
-        {"a clock that stands",
-         nothing,
-         {{s, s, none},
-          {2 * s, s, {"getFrequency", "setFrequency 500000"}},
-          {3 * s, 3 * s, none},
-          {4 * s, 4 * s, {"getFrequency", "setFrequency 500000"}},
-          {5 * s, 5 * s, none}}},
-        {"a clock that went backwards",
-         nothing,
-         {{2 * s, 2 * s, none},
-          {3 * s, 1 * s, {"getFrequency", "setFrequency -500000"}},
-          {3 * s, 3 * s, none}}},
-        {"both went backwards: a valid rate",
-         nothing,
-         {{9 * s, 9 * s, none}, {8 * s, 8 * s, keep}, {7 * s, 7 * s, none}, {6 * s, 6 * s, keep}}},
-        {"an offset at the limit is within",
-         [](tFakeHost& host) { host.offsetPpb = 500000; },
-         {{s, s, none},
-          {2 * s, 2 * s, {"getFrequency", "setFrequency 500000"}},
-          {3 * s, 4 * s, {"stepTime -1000000000"}}}},
-        {"differences across the wrap",
-         nothing,
-         {{UINT64_MAX - s + 1, UINT64_MAX - s + 1, none},
-          {0, 0, keep},
-          {s, UINT64_MAX, {"stepTime 1000000001"}}}},
-        {"a step at the threshold",
-         nothing,
-         {{s, s, none}, {2 * s, 2 * s, keep}, {3 * s, 3 * s - 1000, {"stepTime 1000"}}}},
-        {"no step below it",
-         nothing,
-         {{s, s, none},
-          {2 * s, 2 * s, keep},
-          {3 * s, 3 * s - 999, none},
-          {4 * s, 4 * s - 999, {"getFrequency", "setFrequency 1099"}}}},
-        {"a lock is lost at the threshold, held below",
-         locked,
-         {{4 * s, 4 * s + 999, {"getFrequency", "setFrequency -1099"}},
-          {5 * s, 5 * s + 1000, none},
-          {6 * s, 6 * s, none},
-          {7 * s, 7 * s, {"getFrequency", "setFrequency -1099"}}}},
-        {"the second lock starts without the first one's error",
-         locked,
-         {{4 * s, 4 * s + 500, {"getFrequency", "setFrequency -550"}},
-          {5 * s, 5 * s + 1000, none},
-          {6 * s, 6 * s, none},
-          {7 * s, 7 * s, {"getFrequency", "setFrequency -550"}},
-          {8 * s, 8 * s, none},
-          {9 * s, 9 * s, {"getFrequency", "setFrequency -550"}}}},
-        {"the law is clamped",
-         [](tFakeHost& host) {
-             host.maxPpb = 100;
-             host.minPpb = -100;
-             zvckmservo_finalize(&host.table);
-             host.initialize();
-             host.lock();
-         },
-         {{4 * s, 4 * s + 900, {"getFrequency", "setFrequency -100"}},
-          {5 * s, 5 * s - 900, {"getFrequency", "setFrequency 100"}}}},
-        {"limits that cross keep it measuring",
-         [](tFakeHost& host) {
-             host.maxPpb = -7;
-             host.minPpb = 7;
-             zvckmservo_finalize(&host.table);
-             host.initialize();
-             host.takeCalls();
-         },
-         {{s, s, none},
-          {2 * s, 2 * s, {"getFrequency", "setFrequency -7"}},
-          {3 * s, 3 * s, none},
-          {4 * s, 3 * s, {"getFrequency", "setFrequency -7"}}}},
-        {"clearHistory forgets a first pair",
-         [](tFakeHost& host) {
-             host.pair(kSecond, kSecond);
-             host.clearHistory();
-         },
-         {{2 * s, 2 * s, none}, {3 * s, 3 * s, keep}}},
-        {"clearHistory leaves snap time",
-         [](tFakeHost& host) {
-             host.pair(kSecond, kSecond);
-             host.pair(2 * kSecond, 2 * kSecond);
-             host.takeCalls();
-             host.clearHistory();
-         },
-         {{3 * s, 4 * s, none}, {4 * s, 5 * s, keep}}},
-        {"clearHistory leaves phase lock",
-         [](tFakeHost& host) {
-             host.lock();
-             host.clearHistory();
-         },
-         {{4 * s, 5 * s, none}, {5 * s, 6 * s, keep}, {6 * s, 7 * s, {"stepTime -1000000000"}}}},
+    struct Row {
+        const char* name;
+        tSteps before, steps;
+        int32_t minPpb = -500000, maxPpb = 500000, offsetPpb = 0;
     };
-    for (const tScenario& scenario : scenarios) {
-        SCOPED_TRACE(scenario.name);
+    const int64_t second = kSecond;
+    const tSteps measured = {{s, 0, ""}, {2 * s, 0, "get set 0"}};
+    const Row rows[] = {
+        {"12 ppm off to locked",
+         {},
+         {{1 * s, 1000000, ""},
+          {2 * s, 1012000, "get set -12000"},
+          {3 * s, 1012000, "step -1012000"},
+          {4 * s, 100, "get set -12110"},
+          {5 * s, 0, "get set -12055"}}},
+        {"100010 ppb from ten seconds",
+         {},
+         {{0, 0, ""},
+          {10 * s, -1000000, "get set 100010"},
+          {11 * s, 0, ""},
+          {12 * s, 0, "get set 100010"}}},
+        {"identical pairs are no measurement", {}, {{s, 0, ""}, {s, 0, "get set 0"}, {s, 0, ""}}},
+        {"a clock that stands",
+         {},
+         {{s, 0, ""},
+          {2 * s, -second, "get set 500000"},
+          {3 * s, 0, ""},
+          {4 * s, 0, "get set 500000"},
+          {5 * s, 0, ""}}},
+        {"a clock that went backwards",
+         {},
+         {{2 * s, 0, ""}, {3 * s, -2 * second, "get set -500000"}, {3 * s, 0, ""}}},
+        {"both went backwards, a valid rate",
+         {},
+         {{9 * s, 0, ""}, {8 * s, 0, "get set 0"}, {7 * s, 0, ""}, {6 * s, 0, "get set 0"}}},
+        {"an offset at the maximum is within",
+         {},
+         {{s, 0, ""}, {2 * s, 0, "get set 500000"}, {3 * s, second, "step -1000000000"}},
+         -500000,
+         500000,
+         500000},
+        {"an offset at the minimum is within",
+         {},
+         {{s, 0, ""}, {2 * s, 0, "get set -500000"}, {3 * s, second, "step -1000000000"}},
+         -500000,
+         500000,
+         -500000},
+        {"differences across the wrap",
+         {},
+         {{UINT64_MAX - s + 1, 0, ""}, {0, 0, "get set 0"}, {s, -second - 1, "step 1000000001"}}},
+        {"a step at the threshold", measured, {{3 * s, -1000, "step 1000"}}},
+        {"no step below it", measured, {{3 * s, -999, ""}, {4 * s, -999, "get set 1099"}}},
+        {"a lock holds below the threshold and is lost at it",
+         kLockIn,
+         {{4 * s, 999, "get set -1099"},
+          {5 * s, 1000, ""},
+          {6 * s, 0, ""},
+          {7 * s, 0, "get set -1099"}}},
+        {"a second lock starts without the first one's error",
+         kLockIn,
+         {{4 * s, 500, "get set -550"},
+          {5 * s, 1000, ""},
+          {6 * s, 0, ""},
+          {7 * s, 0, "get set -550"},
+          {8 * s, 0, ""},
+          {9 * s, 0, "get set -550"}}},
+        {"the law is clamped",
+         kLockIn,
+         {{4 * s, 900, "get set -100"}, {5 * s, -900, "get set 100"}},
+         -100,
+         100},
+        {"limits that cross keep it measuring",
+         {},
+         {{s, 0, ""}, {2 * s, 0, "get set -7"}, {3 * s, 0, ""}, {4 * s, -second, "get set -7"}},
+         7,
+         -7},
+        {"clearHistory forgets a first pair",
+         {{s, 0, ""}, {kClearHistory, 0, ""}},
+         {{2 * s, 0, ""}, {3 * s, 0, "get set 0"}}},
+        {"clearHistory leaves snap time",
+         measured,
+         {{kClearHistory, 0, ""}, {3 * s, second, ""}, {4 * s, second, "get set 0"}}},
+        {"clearHistory leaves phase lock",
+         kLockIn,
+         {{kClearHistory, 0, ""},
+          {4 * s, second, ""},
+          {5 * s, second, "get set 0"},
+          {6 * s, second, "step -1000000000"}}},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
         tFakeHost host;
+        host.minPpb = row.minPpb;
+        host.maxPpb = row.maxPpb;
+        host.offsetPpb = row.offsetPpb;
         host.initialize();
         host.takeCalls();
-        scenario.prepare(host);
-        for (const tStep& step : scenario.steps) {
-            host.pair(step.reference, step.clock);
-            EXPECT_EQ(0, host.code());
-            EXPECT_EQ(step.calls, host.takeCalls()) << "pair at " << step.reference;
-        }
+        play(host, row.before);
+        play(host, row.steps);
     }
 }
 
 TEST(StateMachine, ThresholdsDifferBetweenSnapTimeAndPhaseLock)
 {
     tFakeHost host;
-    host.open().config().setSnapTimeThreshold(1.5e-8);
-    host.pair(1 * kSecond, 1 * kSecond);
-    host.pair(2 * kSecond, 2 * kSecond);
-    host.takeCalls();
-    host.pair(3 * kSecond, 3 * kSecond + 14);
-    EXPECT_EQ(tCalls{"stepTime -14"}, host.takeCalls()) << "cut to 14 ns";
-    host.pair(4 * kSecond, 4 * kSecond + 14);
-    EXPECT_EQ((tCalls{"getFrequency", "setFrequency -15"}), host.takeCalls()) << "15 ns";
-    host.pair(5 * kSecond, 5 * kSecond + 15);
-    EXPECT_EQ(tCalls{}, host.takeCalls());
+    host.open().config().setSnapTimeThreshold(1.5e-8); // 14 ns when cut, 15 ns as it is
+    play(host, {{1 * s, 0, ""},
+                {2 * s, 0, "get set 0"},
+                {3 * s, 14, "step -14"},
+                {4 * s, 14, "get set -15"},
+                {5 * s, 15, ""}});
 }
 
 TEST(StateMachine, NothingIsRolledBackWhenTheClockFails)
 {
-    const uint64_t s = kSecond;
     struct Row {
         const char* name;
-        std::vector<tStep> before;
+        tSteps before;
         const char* failing;
         tStep failed;
-        std::vector<tStep> after;
+        tSteps after;
     };
-    const tCalls none;
-    const tCalls keep{"getFrequency", "setFrequency 0"};
+    const int64_t second = kSecond;
+    const tSteps first = {{s, 0, ""}};
+    const tSteps measured = {{s, 0, ""}, {2 * s, 0, "get set 0"}};
     const Row rows[] = {
         // The first pair stays, and the next pair measures from it over two seconds.
         {"frequency lock, getFrequency",
-         {{s, s, none}},
+         first,
          "getFrequency",
-         {2 * s, 2 * s, {"getFrequency"}},
-         {{3 * s, 3 * s + 2000, {"getFrequency", "setFrequency -1000"}},
-          {4 * s, 5 * s, {"stepTime -1000000000"}}}},
+         {2 * s, 0, "get"},
+         {{3 * s, 2000, "get set -1000"}, {4 * s, second, "step -1000000000"}}},
         {"frequency lock, setFrequency",
-         {{s, s, none}},
+         first,
          "setFrequency",
-         {2 * s, 2 * s, keep},
-         {{3 * s, 3 * s + 2000, {"getFrequency", "setFrequency -1000"}},
-          {4 * s, 5 * s, {"stepTime -1000000000"}}}},
+         {2 * s, 0, "get set 0"},
+         {{3 * s, 2000, "get set -1000"}, {4 * s, second, "step -1000000000"}}},
         // The first pair was forgotten before the call.
         {"frequency lock, clamped",
-         {{s, s, none}},
+         first,
          "setFrequency",
-         {2 * s, s, {"getFrequency", "setFrequency 500000"}},
-         {{3 * s, 3 * s, none}}},
+         {2 * s, -second, "get set 500000"},
+         {{3 * s, 0, ""}}},
         {"snap time",
-         {{s, s, none}, {2 * s, 2 * s, keep}},
+         measured,
          "stepTime",
-         {3 * s, 4 * s, {"stepTime -1000000000"}},
-         {{4 * s, 6 * s, {"stepTime -2000000000"}}, {5 * s, 5 * s, keep}}},
+         {3 * s, second, "step -1000000000"},
+         {{4 * s, 2 * second, "step -2000000000"}, {5 * s, 0, "get set 0"}}},
         // The failed pair's error of 100 ns never becomes the previous error.
         {"phase lock, getFrequency",
-         {{s, s, none}, {2 * s, 2 * s, keep}, {3 * s, 3 * s, none}},
+         kLockIn,
          "getFrequency",
-         {4 * s, 4 * s + 100, {"getFrequency"}},
-         {{5 * s, 5 * s, keep}}},
+         {4 * s, 100, "get"},
+         {{5 * s, 0, "get set 0"}}},
         {"phase lock, setFrequency",
-         {{s, s, none}, {2 * s, 2 * s, keep}, {3 * s, 3 * s, none}},
+         kLockIn,
          "setFrequency",
-         {4 * s, 4 * s + 100, {"getFrequency", "setFrequency -110"}},
-         {{5 * s, 5 * s, keep}}},
+         {4 * s, 100, "get set -110"},
+         {{5 * s, 0, "get set 0"}}},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
         tFakeHost host;
         host.initialize();
         host.takeCalls();
-        const auto play = [&host](const tStep& step, int32_t code) {
-            host.pair(step.reference, step.clock);
-            EXPECT_EQ(code, host.code());
-            EXPECT_EQ(step.calls, host.takeCalls()) << "pair at " << step.reference;
-        };
-        for (const tStep& step : row.before) {
-            play(step, 0);
-        }
+        play(host, row.before);
         const int32_t offsetPpb = host.offsetPpb;
         host.failIn(row.failing);
-        play(row.failed, -77);
+        play(host, {row.failed}, -77);
         host.inOperation = nullptr;
         host.offsetPpb = offsetPpb; // the clock did not take it
-        for (const tStep& step : row.after) {
-            play(step, 0);
-        }
+        play(host, row.after);
     }
 }
 
@@ -463,65 +434,54 @@ TEST(StateMachine, TheFilterStartsOpenAndIsResetWhenALockEnds)
     zvckmDravik::iServoConfig& config = host.open().config();
     config.setSpikeFilterEnabled(true);
     config.setSpikeFilterMaxThreshold(1e-7);
-    host.lock();
-    const auto expectPair = [&host](uint64_t seconds, uint64_t error, const tCalls& calls) {
-        host.pair(seconds * kSecond, seconds * kSecond + error);
-        EXPECT_EQ(calls, host.takeCalls()) << seconds << " s";
-    };
-    expectPair(4, 0, {"getFrequency", "setFrequency 0"});
-    expectPair(5, 900, {"getFrequency", "setFrequency -990"}); // open: 1.0, not the maximum
-    expectPair(6, 900, {"getFrequency", "setFrequency -1485"});
-    expectPair(7, 0, {"getFrequency", "setFrequency -1870"}); // now limited to 100 ns in a second
-    host.clearHistory();
+    play(host, kLockIn);
+    play(host, {{4 * s, 0, "get set 0"},
+                {5 * s, 900, "get set -990"}, // open: 1.0, not the maximum
+                {6 * s, 900, "get set -1485"},
+                {7 * s, 0, "get set -1870"}, // now limited to 100 ns in a second
+                {kClearHistory, 0, ""}});
     host.offsetPpb = 0;
-    for (const uint64_t seconds : {8U, 9U, 10U}) {
-        host.pair(seconds * kSecond, seconds * kSecond);
-    }
-    host.takeCalls();
-    expectPair(11, 0, {"getFrequency", "setFrequency 0"});
-    expectPair(12, 900, {"getFrequency", "setFrequency -110"}); // reset: the configured maximum
+    play(host, {{8 * s, 0, ""},
+                {9 * s, 0, "get set 0"},
+                {10 * s, 0, ""},
+                {11 * s, 0, "get set 0"},
+                {12 * s, 900, "get set -110"}}); // the configured maximum from the start
 }
 
 TEST(StateMachine, AnExhaustedAllocatorLeavesAPairHalfTaken)
 {
     tFakeHost host;
     host.open().config().setSpikeFilterEnabled(true);
-    host.lock();
-    host.pair(4 * kSecond, 4 * kSecond);
-    host.takeCalls();
+    play(host, kLockIn);
+    play(host, {{4 * s, 0, "get set 0"}});
     {
         const allocator::tFailNth failing(1); // the first entry of the history
         host.status.reset();
-        zvckmservo_adjustTime(&host.table, 5 * kSecond, 5 * kSecond + 100, &host.status.record);
+        zvckmservo_adjustTime(&host.table, 5 * s, 5 * s + 100, &host.status.record);
         EXPECT_TRUE(failing.fired());
     }
     EXPECT_EQ(-52000, host.code());
-    EXPECT_EQ(tCalls{}, host.takeCalls());
+    EXPECT_EQ("", host.takeCalls());
     // The filter's last offset is the failed pair's 100 ns, the law's previous error is still 0:
     // a rate of 100 ns/s and nothing else makes the mean that limits the pair behind the next.
-    host.pair(6 * kSecond, 6 * kSecond + 200);
-    EXPECT_EQ((tCalls{"getFrequency", "setFrequency -220"}), host.takeCalls());
-    host.pair(7 * kSecond, 7 * kSecond + 900); // limited to 200 + 3 * 100
-    EXPECT_EQ((tCalls{"getFrequency", "setFrequency -660"}), host.takeCalls());
+    play(host, {{6 * s, 200, "get set -220"}, {7 * s, 900, "get set -660"}}); // 200 + 3 * 100
 }
 
 TEST(StateMachine, AHostMayCallBackFromItsOwnOperation)
 {
     tFakeHost host;
     host.initialize();
-    host.lock();
+    host.takeCalls();
+    play(host, kLockIn);
     host.inOperation = [&host](const std::string& operation, zverr_Status*) {
         if (operation != "setFrequency") return;
         zverr_Status inner{0, 0, foreignReallocJson, nullptr};
         zvckmservo_clearHistory(&host.table, &inner);
         EXPECT_EQ(0, inner.code);
     };
-    host.pair(4 * kSecond, 4 * kSecond + 100);
-    EXPECT_EQ(0, host.code());
+    play(host, {{4 * s, 100, "get set -110"}});
     host.inOperation = nullptr;
-    host.takeCalls();
-    host.pair(5 * kSecond, 5 * kSecond);
-    EXPECT_EQ(tCalls{}, host.takeCalls()) << "a first pair";
+    play(host, {{5 * s, 0, ""}}); // a first pair
 }
 
 TEST(PhaseLock, ALockedPairAllocatesNothingOnceTheHistoryIsFull)
@@ -531,7 +491,7 @@ TEST(PhaseLock, ALockedPairAllocatesNothingOnceTheHistoryIsFull)
         zvckmDravik::iServoConfig& config = host.open().config();
         config.setSpikeFilterEnabled(true);
         config.setSpikeFilterHistorySize(historySize);
-        host.lock();
+        play(host, kLockIn);
         host.table.getFrequency = [](int32_t* offsetPpb, zverr_Status*) { *offsetPpb = 0; };
         host.table.setFrequency = [](int32_t, zverr_Status*) {};
         uint64_t seconds = 4;

@@ -1,6 +1,7 @@
 #include "support/tFakeHost.h"
 
 #include <gtest/gtest.h>
+#include <utility>
 
 namespace {
 
@@ -13,31 +14,31 @@ struct tFakeOperations {
     {
         EXPECT_EQ(0U, *timeNs);
         *timeNs = current->timeNs;
-        current->answer("getTime", "", status);
+        current->answer("getTime", "time", status);
     }
     static void stepTime(int64_t deltaNs, zverr_Status* status)
     {
-        current->answer("stepTime", std::to_string(deltaNs), status);
+        current->answer("stepTime", "step " + std::to_string(deltaNs), status);
     }
     static void getFrequency(int32_t* offsetPpb, zverr_Status* status)
     {
         EXPECT_EQ(0, *offsetPpb);
         *offsetPpb = current->offsetPpb;
-        current->answer("getFrequency", "", status);
+        current->answer("getFrequency", "get", status);
     }
     static void setFrequency(int32_t offsetPpb, zverr_Status* status)
     {
         current->offsetPpb = offsetPpb;
-        current->answer("setFrequency", std::to_string(offsetPpb), status);
+        current->answer("setFrequency", "set " + std::to_string(offsetPpb), status);
     }
     static int32_t getMaxFrequencyOffset(zverr_Status* status)
     {
-        current->answer("getMaxFrequencyOffset", "", status);
+        current->answer("getMaxFrequencyOffset", "max", status);
         return current->maxPpb;
     }
     static int32_t getMinFrequencyOffset(zverr_Status* status)
     {
-        current->answer("getMinFrequencyOffset", "", status);
+        current->answer("getMinFrequencyOffset", "min", status);
         return current->minPpb;
     }
 };
@@ -59,12 +60,12 @@ tFakeHost::~tFakeHost()
     current = nullptr;
 }
 
-void tFakeHost::answer(const std::string& operation, const std::string& argument,
+void tFakeHost::answer(const std::string& operation, const std::string& note,
                        zverr_Status* operationStatus)
 {
     EXPECT_EQ(0, operationStatus->code) << "each operation has a fresh status";
     EXPECT_EQ(nullptr, operationStatus->json);
-    calls.push_back(argument.empty() ? operation : operation + " " + argument);
+    calls += (calls.empty() ? "" : " ") + note;
     if (inOperation) inOperation(operation, operationStatus);
 }
 
@@ -105,17 +106,4 @@ void tFakeHost::clearHistory()
     zvckmservo_clearHistory(&table, &status.record);
 }
 
-void tFakeHost::lock()
-{
-    for (const uint64_t seconds : {1U, 2U, 3U}) {
-        pair(seconds * 1000000000U, seconds * 1000000000U);
-    }
-    takeCalls();
-}
-
-std::vector<std::string> tFakeHost::takeCalls()
-{
-    std::vector<std::string> taken;
-    taken.swap(calls);
-    return taken;
-}
+std::string tFakeHost::takeCalls() { return std::exchange(calls, std::string()); }

@@ -7,10 +7,9 @@
 #include <cstdint>
 #include <functional>
 #include <string>
-#include <vector>
 
 // A host with one clock that a test scripts: what the clock answers, which of its operations fails
-// and how. Notes every operation as text, for example "setFrequency 110".
+// and how. Notes every operation as text, for example "get set -110" for a pair in phase lock.
 class tFakeHost
 {
 public:
@@ -25,13 +24,10 @@ public:
     tOpenServo& open();
     void pair(uint64_t referenceTime, uint64_t clockTime);
     void clearHistory();
-    // Drives the servo through frequency lock (at rate 1) and snap time into phase lock; the
-    // reference then stands at 3 s.
-    void lock();
 
     int32_t code() const { return status.code(); }
     // The operations noted since the last call of this.
-    std::vector<std::string> takeCalls();
+    std::string takeCalls();
 
     zvckmservo_HostTable table{};
     tHostStatus status;
@@ -46,10 +42,10 @@ public:
     void failIn(const std::string& operation);
 
 private:
-    void answer(const std::string& operation, const std::string& argument,
+    void answer(const std::string& operation, const std::string& note,
                 zverr_Status* operationStatus);
 
-    std::vector<std::string> calls;
+    std::string calls;
 
     friend struct tFakeOperations;
 };
