@@ -4,8 +4,8 @@
  * for each clock fills a zvckmservo_HostTable (words 13 to 18), calls zvckmservo_initialize, then
  * the other functions as often as it likes, and at last zvckmservo_finalize.
  *
- * The plug-in starts no thread and no timer, and reads no file but its default configuration.
- * It acts only inside these calls, on the caller's thread. No exception leaves any of them.
+ * The plug-in starts no thread and no timer, and reads no file. It acts only inside these calls, on
+ * the caller's thread. No exception leaves any of them. Needs C11 or C++11.
  *
  * Signs: the clock is ahead when its time is greater than the reference's; a positive frequency
  * offset makes the clock run faster; a positive step moves it forward. */
@@ -30,13 +30,19 @@ extern "C" {
  * The operations take no context argument: a host with several clocks keeps the one in question
  * per thread while it is inside a call of the plug-in.
  *
- * Every operation is called with the servo's lock held, on the thread of the call that led to it.
- * It may call the plug-in again on that thread. Its status is a fresh, empty one of the plug-in's,
- * never the one given to the exported function:
+ * Every operation is called on the thread of the call that led to it. Its status is a fresh, empty
+ * one of the plug-in's, never the one given to the exported function:
  *   - a negative code reports failure and arrives, payload included, in the status of the exported
- *     function; a zero or positive code is success, and the code is dropped;
+ *     function; a zero or positive code is success, and is dropped with its payload;
  *   - a payload is written through the status's own reallocJson and released by the plug-in.
- * What an operation wrote through its pointer counts only if it succeeded. */
+ * What an operation wrote through its pointer counts only if it succeeded.
+ *
+ * Words 13 to 16 are called with the servo's lock held and may call the plug-in again on the same
+ * thread, but for zvckmservo_finalize. The pair that led there then goes on where it was: what a
+ * zvckmservo_clearHistory inside it cleared, the rest of that pair may set again. Words 17 and 18
+ * are called while there is no servo yet and may not call the plug-in.
+ * An operation must return or throw; a thread that ends inside one (pthread_exit, cancellation)
+ * ends the process. */
 typedef struct zvckmservo_HostTable {
     /* word 0: the servo; opaque to the host. Written by zvckmservo_initialize, set to null by
      * zvckmservo_finalize. Null before the first initialisation, so that finalize is harmless. */
@@ -60,7 +66,8 @@ typedef struct zvckmservo_HostTable {
     void (*getFrequency)(int32_t* offsetPpb, zverr_Status* status);
 
     /* word 16: set the offset of the clock's rate from nominal, signed parts per billion. Within
-     * the limits below, except that a measurement which is not a number goes out as 0. */
+     * the limits below, except that a measurement which is not a number goes out as 0; if the
+     * limits cross, a value beyond one of them goes out as that one. */
     void (*setFrequency)(int32_t offsetPpb, zverr_Status* status);
 
     /* words 17 and 18: the highest and the lowest offset that setFrequency may be given, signed
@@ -90,10 +97,12 @@ static_assert(sizeof(zvckmservo_HostTable) == 19 * sizeof(void*), "nineteen word
  *           makes the call do nothing at all; a positive one stops nothing and is still there
  *           after a call that went well. A failure of a call is in it afterwards:
  *             the code and payload of a failed host operation;
- *             zvplaterr_memoryFull if memory ran out;
- *             zvplaterr_softwareFaultPLATInternalUseOnly for whatever else was thrown, a host
- *             operation's own exception among it;
- *           and what is named at the function.
+ *             zvplaterr_memoryFull for a std::bad_alloc, the plug-in's or a host operation's;
+ *             zvplaterr_softwareFaultPLATInternalUseOnly for whatever else was thrown;
+ *           and what is named at the function. To use the record again, set its code to 0; the
+ *           buffer may stay.
+ *           A call made while an exception is propagating on the thread (from a destructor) does
+ *           not report the failure of a host operation: make none there.
  * Threads:  any, also at the same time: one lock per servo serialises the calls on a table, and is
  *           held across its host operations. Servos of different tables share nothing. No call may
  *           overlap zvckmservo_initialize or zvckmservo_finalize of the same table. */
@@ -120,8 +129,14 @@ ZVCKMSERVO_API void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_St
  *   referenceTime, clockTime  the time of the reference and of the clock at one moment, unsigned
  *                             nanoseconds on one timescale, less than 2^63 ns apart from each other
  *                             and from the pairs before (beyond that, differences wrap)
- * May call getFrequency and then setFrequency, or stepTime, or none of them. After the failure of a
- * host operation nothing is rolled back; the servo goes on with the next pair. */
+ * The first two pairs measure and correct the clock's rate, the third steps the clock if it is at
+ * least the snap threshold (1 us by default) off, and from the fourth on each pair corrects the
+ * frequency; an error that reaches the threshold starts over. So a pair may call getFrequency and
+ * then setFrequency, or stepTime, or none of them.
+ * The control law counts pairs, not seconds. With the default parameters it is stable for less
+ * than 80/33 s (2.4 s) of reference time from pair to pair; 0.1 s to 1 s is customary.
+ * After the failure of a host operation nothing is rolled back; the servo goes on with the next
+ * pair. */
 ZVCKMSERVO_API void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime,
                                           uint64_t clockTime, zverr_Status* status);
 
@@ -131,7 +146,7 @@ ZVCKMSERVO_API void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* tim
                                        zverr_Status* status);
 
 /* Sets parameters from a JSON document.
- *   configJson  the document, zero-terminated; borrowed for the call
+ *   configJson  the document, zero-terminated; borrowed for the call; not null
  * Returns: 0 on success, 1 on failure or if the status was negative on entry.
  * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
 ZVCKMSERVO_API int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host,
@@ -147,7 +162,7 @@ ZVCKMSERVO_API int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, ch
                                                   size_t bufferSize, zverr_Status* status);
 
 /* Takes metadata of the selected time reference.
- *   metaDataJson  the metadata, zero-terminated; borrowed for the call
+ *   metaDataJson  the metadata, zero-terminated; borrowed for the call; not null
  * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
 ZVCKMSERVO_API void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
                                              zverr_Status* status);

@@ -50,7 +50,8 @@ struct zverr_Status {
     char* json;
 };
 
-/* The codes that the plug-in raises. Two failures of the same kind share a code. */
+/* The codes that the plug-in raises, now or in a later minor version. Two failures of the same kind
+ * share a code. */
 enum {
     zvplaterr_memoryFull = -52000,                       /* the allocator is exhausted */
     zvplaterr_softwareFaultPLATInternalUseOnly = -52003, /* no mutex, unforeseen exception */
