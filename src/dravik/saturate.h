@@ -1,13 +1,8 @@
 #pragma once
 
-#include <cfloat>
-#include <cstdint>
+#include "dravik/arithmetic.h"
 
-// The servo's figures are the same bits on every machine, which leans on plain IEEE arithmetic.
-#ifdef __FAST_MATH__
-#error "fast-math changes what the servo computes"
-#endif
-static_assert(FLT_EVAL_METHOD == 0, "double arithmetic in double precision, no more");
+#include <cstdint>
 
 // Conversions with a defined answer for every value: truncation toward zero; out of range the
 // nearer limit; not a number gives 0.

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "dravik/arithmetic.h"
+
 #include <cstdint>
 
 namespace zvckmDravik {

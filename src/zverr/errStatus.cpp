@@ -52,14 +52,10 @@ bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size)
 
 bool zverr_setJson(zverr_Status* status, const char* text)
 {
-    uint32_t need = 4;
-    if (text == nullptr) {
-        text = kEmptyObject;
-    } else {
-        const size_t length = std::strlen(text);
-        if (length > kLongestText) return false;
-        need = static_cast<uint32_t>(length) + kJsonzOverhead;
-    }
+    if (text == nullptr) text = kEmptyObject;
+    const size_t length = std::strlen(text);
+    if (length > kLongestText) return false;
+    const uint32_t need = static_cast<uint32_t>(length) + kJsonzOverhead;
     if (status->capacity < need && !status->reallocJson(status, need)) return false;
     jsonz_formatBuffer(status->json, status->capacity, text);
     return true;
