@@ -42,6 +42,9 @@ extern "C" int __real_pthread_mutex_init(pthread_mutex_t* mutex,
 extern "C" int __wrap_pthread_mutex_init(pthread_mutex_t* mutex,
                                          const pthread_mutexattr_t* attributes)
 {
+    int protocol = PTHREAD_PRIO_INHERIT;
+    if (attributes != nullptr) pthread_mutexattr_getprotocol(attributes, &protocol);
+    EXPECT_EQ(PTHREAD_PRIO_INHERIT, protocol);
     return mutexCreationFails ? ENOMEM : __real_pthread_mutex_init(mutex, attributes);
 }
 
@@ -142,12 +145,17 @@ TEST(Boundary, AWarningStopsNothingAndStays)
     host.timeNs = UINT64_MAX;
     uint64_t time = 0;
     zvckmservo_initialize(&host.table, &warned.record);
-    zvckmservo_adjustTime(&host.table, 1, 1, &warned.record);
-    zvckmservo_clearHistory(&host.table, &warned.record);
+    for (const uint64_t t : {1, 2, 3, 4}) {
+        if (t == 2) zvckmservo_clearHistory(&host.table, &warned.record);
+        zvckmservo_adjustTime(&host.table, t, t, &warned.record);
+    }
+    EXPECT_EQ("max min get set 0", host.takeCalls());
     zvckmservo_getTime(&host.table, &time, &warned.record);
     EXPECT_EQ(UINT64_MAX, time);
     EXPECT_EQ(3, warned.code());
     EXPECT_EQ(R"({"warning":1})", warned.text());
+    zvckmservo_applyMetaData(&host.table, "{}", &warned.record);
+    EXPECT_EQ(-52003, warned.code()) << "a failure replaces it";
 }
 
 TEST(Boundary, TextOperationsReportThatTheyAreNotThereYet)

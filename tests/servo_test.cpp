@@ -5,9 +5,13 @@
 #include "support/allocator.h"
 #include "support/tFakeHost.h"
 
+#include <atomic>
+#include <chrono>
 #include <cmath>
 #include <gtest/gtest.h>
 #include <limits>
+#include <sstream>
+#include <thread>
 
 namespace {
 
@@ -73,6 +77,7 @@ TEST(TimeSpan, DifferencesWrapAndComparisonsLookAtTheSignFirst)
         {tTimeSpan(5U, -1), tTimeSpan(3U, -1), -2, false, false},
         {tTimeSpan(uint64_t{1}), tTimeSpan(9U, -1), 10, true, true},
         {tTimeSpan(9U, -1), tTimeSpan(uint64_t{1}), -10, false, false},
+        {tTimeSpan(1U, -1), tTimeSpan(uint64_t{9}), -10, false, false},
         {tTimeSpan(uint64_t{0}), tTimeSpan(0U, -1), 0, true, true},
         {tTimeSpan(0U, -1), tTimeSpan(uint64_t{0}), 0, false, false},
         {tTimeSpan(big + 3), tTimeSpan(big - 4), 7, true, true},
@@ -111,12 +116,24 @@ TEST(SpikeFilter, LimitsAStepToWhatTheRecentPastAllows)
     EXPECT_EQ(0x1.0c6f7a0b5ed8dp-21, bench.filter.filter(1.2e-6, 1.0)); // 5e-7
     EXPECT_EQ(0x1.27476ca61b882p-20, bench.filter.filter(1.2e-6, 1.0)); // 1.1e-6
     bench.filter.reset();
+    EXPECT_EQ(1e-7, bench.filter.filter(1e-7, 0.0));
+    EXPECT_EQ(2e-7, bench.filter.filter(2e-7, 1.0));
+    EXPECT_EQ(0x1.0c6f7a0b5ed8dp-21, bench.filter.filter(1.2e-6, 1.0))
+        << "nothing of the past is left";
     bench.config.setSpikeFilterMaxThreshold(1e-6);
     bench.filter.reset();
     EXPECT_EQ(-2e-6, bench.filter.filter(-1.0, 2.0)) << "a downward spike";
     EXPECT_EQ(-1.0, bench.filter.filter(-1.0, -2.0)) << "time that went backwards passes";
     EXPECT_EQ(-1.0, bench.filter.filter(-1.0, 0.0));
     EXPECT_EQ(-1.0 + 1e-6, bench.filter.filter(1.0, 1.0)) << "and is the new base";
+    bench.config.setSpikeFilterMaxThreshold(7.13e-7);
+    bench.filter.reset();
+    bench.filter.filter(-8.7e-8, 0.0);
+    EXPECT_EQ(0x1.10840345b4defp-23, bench.filter.filter(0x1.10840345b4defp-23, 0.3))
+        << "at the threshold";
+    tFilterBench open;
+    open.filter.filter(0.0, 0.0);
+    EXPECT_EQ(1.0, open.filter.filter(1.5, 1.0)) << "a first lock";
 }
 
 TEST(SpikeFilter, KeepsARunningSumThroughChangesOfItsSize)
@@ -152,8 +169,8 @@ TEST(SpikeFilter, RestsAtItsLimitsAndStandsStillWhileOff)
     bench.config.setSpikeFilterEnabled(true);
     EXPECT_EQ(5e-8, bench.filter.filter(9.0, 1.0)) << "against the offset from before";
 
-    bench.config.setSpikeFilterMinThreshold(0.5); // above the maximum: the maximum is tested first
     bench.config.setSpikeFilterMaxThreshold(1e-9);
+    bench.config.setSpikeFilterMinThreshold(0.5); // above the maximum: the maximum is tested first
     bench.filter.filter(5e-8, 1.0);
     const double base = bench.filter.filter(5e-8, 0.0);
     EXPECT_EQ(base + 1e-9, bench.filter.filter(1.0, 1.0));
@@ -181,15 +198,15 @@ TEST(ControlLaw, KeepsItsOrderOfOperations)
     tFakeTimekeeper clock;
 
     config.setSnapTimeThreshold(10.0);
-    config.setPhaseLockGain(2.633);
-    config.setPhaseLockCoefficientA(-1.708);
-    config.setPhaseLockCoefficientB(-4.249);
-    config.setPhaseLockCoefficientC(-1.221);
+    config.setPhaseLockGain(1.8);
+    config.setPhaseLockCoefficientA(2.663);
+    config.setPhaseLockCoefficientB(3.751);
+    config.setPhaseLockCoefficientC(-1.66);
     zvckmDravik::tServoStatePhaseLock phaseLock(clock, clock, config);
-    phaseLock.adjustTime(tTimeSpan(kSecond), tTimeSpan(kSecond + 481697671U));
-    clock.current = 1.0 + -499706259.0 * 1e-9;
-    phaseLock.adjustTime(tTimeSpan(2 * kSecond), tTimeSpan(2 * kSecond + 931510365U));
-    EXPECT_EQ(0x1.a417d56e48dbep-2, clock.sent);
+    phaseLock.adjustTime(tTimeSpan(kSecond), tTimeSpan(kSecond + 504033148U));
+    clock.current = 1.0 + 338855945.0 * 1e-9;
+    phaseLock.adjustTime(tTimeSpan(2 * kSecond), tTimeSpan(2 * kSecond + 662460827U));
+    EXPECT_EQ(0x1.5493d670cc81dp-1, clock.sent);
 
     config.setFrequencyLockGain(1.0062);
     zvckmDravik::tServoStateFrequencyLock frequencyLock(clock, clock, config);
@@ -208,9 +225,16 @@ TEST(Timekeeper, SendsWholePartsPerBillionAndExactSteps)
     };
     const double half = 1.0 / 1024; // 976562.5 parts per billion, exactly
     const Row rows[] = {
-        {1.0, "0"},          {1.0 + half, "976563"},      {1.0 - half, "-976563"},
-        {4.0, "2147483647"}, {-4.0, "-2147483648"},       {kInfinity, "2147483647"},
-        {kNaN, "0"},         {-kInfinity, "-2147483648"}, {1.0 - 110e-9, "-110"},
+        {1.0, "0"},
+        {1.0 + half, "976563"},
+        {1.0 - half, "-976563"},
+        {4.0, "2147483647"},
+        {-4.0, "-2147483648"},
+        {kInfinity, "2147483647"},
+        {kNaN, "0"},
+        {-kInfinity, "-2147483648"},
+        {1.0 - 110e-9, "-110"},
+        {0x1.0000000abcc77p+0, "2"},
     };
     tFakeHost host;
     zvckmDravik::iTimekeeper& timekeeper = host.open().timekeeper();
@@ -218,129 +242,81 @@ TEST(Timekeeper, SendsWholePartsPerBillionAndExactSteps)
         timekeeper.setFrequency(row.ratio);
         EXPECT_EQ(std::string("set ") + row.sent, host.takeCalls()) << row.ratio;
     }
-    host.offsetPpb = -1000;
-    EXPECT_EQ(1.0 + -1000.0 * 1e-9, timekeeper.getFrequency());
+    host.offsetPpb = -1051970500;
+    EXPECT_EQ(-0x1.a9be09bb6aa60p-5, timekeeper.getFrequency());
     host.takeCalls();
     timekeeper.stepTime(tTimeSpan(5U, -1));
     timekeeper.stepTime(tTimeSpan(INT64_MIN));
     EXPECT_EQ("step -5 step -9223372036854775808", host.takeCalls());
 }
 
-// A pair, as reference time and how far the clock is ahead of it, and the calls it must lead to.
-struct tStep {
-    uint64_t referenceNs;
-    int64_t aheadNs;
-    const char* calls;
-};
-using tSteps = std::vector<tStep>;
-
-constexpr uint64_t s = kSecond;
-constexpr uint64_t kClearHistory = 1; // in place of a reference time
-const tSteps kLockIn = {{1 * s, 0, ""}, {2 * s, 0, "get set 0"}, {3 * s, 0, ""}};
-
-void play(tFakeHost& host, const tSteps& steps, int32_t code = 0)
+// Plays pairs, written as "reference in seconds, how far the clock is ahead in nanoseconds, and the
+// calls that the pair must lead to", with " | " in between; "clear" is a clearHistory.
+void play(tFakeHost& host, const std::string& script, int32_t code = 0)
 {
-    for (const tStep& step : steps) {
-        if (step.referenceNs == kClearHistory) {
+    std::istringstream steps(script);
+    for (std::string step; std::getline(steps >> std::ws, step, '|');) {
+        std::istringstream words(step);
+        int64_t seconds = 0;
+        int64_t aheadNs = 0;
+        std::string calls;
+        if (step.find("clear") != std::string::npos) {
             host.clearHistory();
         } else {
-            host.pair(step.referenceNs, step.referenceNs + static_cast<uint64_t>(step.aheadNs));
+            ASSERT_TRUE(words >> seconds >> aheadNs) << script;
+            std::getline(words >> std::ws, calls);
+            const uint64_t reference = static_cast<uint64_t>(seconds) * kSecond;
+            host.pair(reference, reference + static_cast<uint64_t>(aheadNs));
         }
-        EXPECT_EQ(code, host.code());
-        EXPECT_EQ(step.calls, host.takeCalls()) << "pair at " << step.referenceNs;
+        calls.erase(calls.find_last_not_of(' ') + 1);
+        EXPECT_EQ(code, host.code()) << step;
+        EXPECT_EQ(calls, host.takeCalls()) << step;
     }
 }
+
+const std::string kMeasured = "1 0 | 2 0 get set 0 | ";
+const std::string kLockIn = kMeasured + "3 0 | ";
 
 TEST(StateMachine, LeadsPairsThroughTheStates)
 {
     struct Row {
         const char* name;
-        tSteps before, steps;
+        std::string script;
         int32_t minPpb = -500000, maxPpb = 500000, offsetPpb = 0;
     };
-    const int64_t second = kSecond;
-    const tSteps measured = {{s, 0, ""}, {2 * s, 0, "get set 0"}};
     const Row rows[] = {
         {"12 ppm off to locked",
-         {},
-         {{1 * s, 1000000, ""},
-          {2 * s, 1012000, "get set -12000"},
-          {3 * s, 1012000, "step -1012000"},
-          {4 * s, 100, "get set -12110"},
-          {5 * s, 0, "get set -12055"}}},
+         "1 1000000 | 2 1012000 get set -12000 | 3 1012000 step -1012000 | 4 100 get set -12110 |"
+         "5 0 get set -12055"},
         {"100010 ppb from ten seconds",
-         {},
-         {{0, 0, ""},
-          {10 * s, -1000000, "get set 100010"},
-          {11 * s, 0, ""},
-          {12 * s, 0, "get set 100010"}}},
-        {"identical pairs are no measurement", {}, {{s, 0, ""}, {s, 0, "get set 0"}, {s, 0, ""}}},
+         "0 0 | 10 -1000000 get set 100010 | 11 0 | 12 0 get set 100010"},
+        {"identical pairs are no measurement", "1 0 | 1 0 get set 0 | 1 0"},
         {"a clock that stands",
-         {},
-         {{s, 0, ""},
-          {2 * s, -second, "get set 500000"},
-          {3 * s, 0, ""},
-          {4 * s, 0, "get set 500000"},
-          {5 * s, 0, ""}}},
-        {"a clock that went backwards",
-         {},
-         {{2 * s, 0, ""}, {3 * s, -2 * second, "get set -500000"}, {3 * s, 0, ""}}},
-        {"both went backwards, a valid rate",
-         {},
-         {{9 * s, 0, ""}, {8 * s, 0, "get set 0"}, {7 * s, 0, ""}, {6 * s, 0, "get set 0"}}},
+         "1 0 | 2 -1000000000 get set 500000 | 3 0 | 4 0 get set 500000 | 5 0"},
+        {"a clock that went backwards", "2 0 | 3 -2000000000 get set -500000 | 3 0"},
+        {"both went backwards, a valid rate", "9 0 | 8 0 get set 0 | 7 0 | 6 0 get set 0"},
         {"an offset at the maximum is within",
-         {},
-         {{s, 0, ""}, {2 * s, 0, "get set 500000"}, {3 * s, second, "step -1000000000"}},
-         -500000,
-         500000,
-         500000},
+         "1 0 | 2 0 get set 1953125 | 3 1000000000 step -1000000000", 0, 1953125, 1953125},
         {"an offset at the minimum is within",
-         {},
-         {{s, 0, ""}, {2 * s, 0, "get set -500000"}, {3 * s, second, "step -1000000000"}},
-         -500000,
-         500000,
-         -500000},
-        {"differences across the wrap",
-         {},
-         {{UINT64_MAX - s + 1, 0, ""}, {0, 0, "get set 0"}, {s, -second - 1, "step 1000000001"}}},
-        {"a step at the threshold", measured, {{3 * s, -1000, "step 1000"}}},
-        {"no step below it", measured, {{3 * s, -999, ""}, {4 * s, -999, "get set 1099"}}},
+         "1 0 | 2 0 get set -1953125 | 3 1000000000 step -1000000000", -1953125, 0, -1953125},
+        {"differences across the wrap", "-1 0 | 0 0 get set 0 | 1 -1000000001 step 1000000001"},
+        {"timestamps of this century",
+         "1700000001 0 | 1700000002 0 get set 0 | 1700000003 0 | 1700000004 100 get set -110"},
+        {"a step at the threshold", kMeasured + "3 -1000 step 1000"},
+        {"no step below it", kMeasured + "3 -999 | 4 -999 get set 1099"},
         {"a lock holds below the threshold and is lost at it",
-         kLockIn,
-         {{4 * s, 999, "get set -1099"},
-          {5 * s, 1000, ""},
-          {6 * s, 0, ""},
-          {7 * s, 0, "get set -1099"}}},
+         kLockIn + "4 999 get set -1099 | 5 1000 | 6 0 | 7 0 get set -1099"},
+        {"a lock is lost behind too", kLockIn + "4 -1000 | 5 0 | 6 0 get set 0"},
         {"a second lock starts without the first one's error",
-         kLockIn,
-         {{4 * s, 500, "get set -550"},
-          {5 * s, 1000, ""},
-          {6 * s, 0, ""},
-          {7 * s, 0, "get set -550"},
-          {8 * s, 0, ""},
-          {9 * s, 0, "get set -550"}}},
-        {"the law is clamped",
-         kLockIn,
-         {{4 * s, 900, "get set -100"}, {5 * s, -900, "get set 100"}},
-         -100,
-         100},
+         kLockIn + "4 500 get set -550 | 5 1000 | 6 0 | 7 0 get set -550 | 8 0 | 9 0 get set -550"},
+        {"the law is clamped", kLockIn + "4 900 get set -100 | 5 -900 get set 100", -100, 100},
         {"limits that cross keep it measuring",
-         {},
-         {{s, 0, ""}, {2 * s, 0, "get set -7"}, {3 * s, 0, ""}, {4 * s, -second, "get set -7"}},
-         7,
-         -7},
-        {"clearHistory forgets a first pair",
-         {{s, 0, ""}, {kClearHistory, 0, ""}},
-         {{2 * s, 0, ""}, {3 * s, 0, "get set 0"}}},
+         "1 0 | 2 0 get set -7 | 3 0 | 4 -1000000000 get set -7", 7, -7},
+        {"clearHistory forgets a first pair", "1 0 | clear | 2 0 | 3 0 get set 0"},
         {"clearHistory leaves snap time",
-         measured,
-         {{kClearHistory, 0, ""}, {3 * s, second, ""}, {4 * s, second, "get set 0"}}},
+         kMeasured + "clear | 3 1000000000 | 4 1000000000 get set 0"},
         {"clearHistory leaves phase lock",
-         kLockIn,
-         {{kClearHistory, 0, ""},
-          {4 * s, second, ""},
-          {5 * s, second, "get set 0"},
-          {6 * s, second, "step -1000000000"}}},
+         kLockIn + "clear | 4 1000000000 | 5 1000000000 get set 0 | 6 1000000000 step -1000000000"},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
@@ -350,8 +326,7 @@ TEST(StateMachine, LeadsPairsThroughTheStates)
         host.offsetPpb = row.offsetPpb;
         host.initialize();
         host.takeCalls();
-        play(host, row.before);
-        play(host, row.steps);
+        play(host, row.script);
     }
 }
 
@@ -359,59 +334,33 @@ TEST(StateMachine, ThresholdsDifferBetweenSnapTimeAndPhaseLock)
 {
     tFakeHost host;
     host.open().config().setSnapTimeThreshold(1.5e-8); // 14 ns when cut, 15 ns as it is
-    play(host, {{1 * s, 0, ""},
-                {2 * s, 0, "get set 0"},
-                {3 * s, 14, "step -14"},
-                {4 * s, 14, "get set -15"},
-                {5 * s, 15, ""}});
+    play(host, kMeasured + "3 14 step -14 | 4 14 get set -15 | 5 15");
 }
 
 TEST(StateMachine, NothingIsRolledBackWhenTheClockFails)
 {
     struct Row {
         const char* name;
-        tSteps before;
+        std::string before;
         const char* failing;
-        tStep failed;
-        tSteps after;
+        const char* failed;
+        const char* after;
     };
-    const int64_t second = kSecond;
-    const tSteps first = {{s, 0, ""}};
-    const tSteps measured = {{s, 0, ""}, {2 * s, 0, "get set 0"}};
     const Row rows[] = {
         // The first pair stays, and the next pair measures from it over two seconds.
-        {"frequency lock, getFrequency",
-         first,
-         "getFrequency",
-         {2 * s, 0, "get"},
-         {{3 * s, 2000, "get set -1000"}, {4 * s, second, "step -1000000000"}}},
-        {"frequency lock, setFrequency",
-         first,
-         "setFrequency",
-         {2 * s, 0, "get set 0"},
-         {{3 * s, 2000, "get set -1000"}, {4 * s, second, "step -1000000000"}}},
+        {"frequency lock, getFrequency", "1 0", "getFrequency", "2 0 get",
+         "3 2000 get set -1000 | 4 1000000 step -1000000"},
+        {"frequency lock, setFrequency", "1 0", "setFrequency", "2 0 get set 0",
+         "3 2000 get set -1000 | 4 1000000 step -1000000"},
         // The first pair was forgotten before the call.
-        {"frequency lock, clamped",
-         first,
-         "setFrequency",
-         {2 * s, -second, "get set 500000"},
-         {{3 * s, 0, ""}}},
-        {"snap time",
-         measured,
-         "stepTime",
-         {3 * s, second, "step -1000000000"},
-         {{4 * s, 2 * second, "step -2000000000"}, {5 * s, 0, "get set 0"}}},
+        {"frequency lock, clamped", "1 0", "setFrequency", "2 -1000000000 get set 500000", "3 0"},
+        {"snap time", "1 0 | 2 0 get set 0", "stepTime", "3 1000000 step -1000000",
+         "4 2000000 step -2000000 | 5 0 get set 0"},
         // The failed pair's error of 100 ns never becomes the previous error.
-        {"phase lock, getFrequency",
-         kLockIn,
-         "getFrequency",
-         {4 * s, 100, "get"},
-         {{5 * s, 0, "get set 0"}}},
-        {"phase lock, setFrequency",
-         kLockIn,
-         "setFrequency",
-         {4 * s, 100, "get set -110"},
-         {{5 * s, 0, "get set 0"}}},
+        {"phase lock, getFrequency", kLockIn + "4 0 get set 0", "getFrequency", "5 100 get",
+         "6 0 get set 0"},
+        {"phase lock, setFrequency", kLockIn + "4 0 get set 0", "setFrequency",
+         "5 100 get set -110", "6 0 get set 0"},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
@@ -421,7 +370,7 @@ TEST(StateMachine, NothingIsRolledBackWhenTheClockFails)
         play(host, row.before);
         const int32_t offsetPpb = host.offsetPpb;
         host.failIn(row.failing);
-        play(host, {row.failed}, -77);
+        play(host, row.failed, -77);
         host.inOperation = nullptr;
         host.offsetPpb = offsetPpb; // the clock did not take it
         play(host, row.after);
@@ -434,54 +383,97 @@ TEST(StateMachine, TheFilterStartsOpenAndIsResetWhenALockEnds)
     zvckmDravik::iServoConfig& config = host.open().config();
     config.setSpikeFilterEnabled(true);
     config.setSpikeFilterMaxThreshold(1e-7);
-    play(host, kLockIn);
-    play(host, {{4 * s, 0, "get set 0"},
-                {5 * s, 900, "get set -990"}, // open: 1.0, not the maximum
-                {6 * s, 900, "get set -1485"},
-                {7 * s, 0, "get set -1870"}, // now limited to 100 ns in a second
-                {kClearHistory, 0, ""}});
+    // Open up to 1.0 at first, not to the maximum; then limited to 100 ns in a second.
+    play(host, kLockIn + "4 0 get set 0 | 5 900 get set -990 | 6 900 get set -1485 |"
+                         "7 0 get set -1870 | 8 0 get set -2200 | 9 1000");
     host.offsetPpb = 0;
-    play(host, {{8 * s, 0, ""},
-                {9 * s, 0, "get set 0"},
-                {10 * s, 0, ""},
-                {11 * s, 0, "get set 0"},
-                {12 * s, 900, "get set -110"}}); // the configured maximum from the start
+    // A first pair passes whole, the next ones by the configured maximum.
+    play(host, "10 0 | 11 0 get set 0 | 12 0 | 13 900 get set -990 | 14 888 get set -1472 |"
+               "15 0 get set -1921");
 }
 
 TEST(StateMachine, AnExhaustedAllocatorLeavesAPairHalfTaken)
 {
     tFakeHost host;
     host.open().config().setSpikeFilterEnabled(true);
-    play(host, kLockIn);
-    play(host, {{4 * s, 0, "get set 0"}});
+    play(host, kLockIn + "4 0 get set 0");
     {
         const allocator::tFailNth failing(1); // the first entry of the history
         host.status.reset();
-        zvckmservo_adjustTime(&host.table, 5 * s, 5 * s + 100, &host.status.record);
+        zvckmservo_adjustTime(&host.table, 5 * kSecond, 5 * kSecond + 100, &host.status.record);
         EXPECT_TRUE(failing.fired());
     }
     EXPECT_EQ(-52000, host.code());
     EXPECT_EQ("", host.takeCalls());
     // The filter's last offset is the failed pair's 100 ns, the law's previous error is still 0:
-    // a rate of 100 ns/s and nothing else makes the mean that limits the pair behind the next.
-    play(host, {{6 * s, 200, "get set -220"}, {7 * s, 900, "get set -660"}}); // 200 + 3 * 100
+    // a rate of 100 ns/s and nothing else limits the pair behind the next, to 200 + 3 * 100.
+    play(host, "6 200 get set -220 | 7 900 get set -660");
 }
 
-TEST(StateMachine, AHostMayCallBackFromItsOwnOperation)
+TEST(StateMachine, ASetterTouchesItsOwnParameterOnly)
+{
+    tFakeHost host;
+    zvckmDravik::iServoConfig& config = host.open().config();
+    for (const char* const step : {"1 0", "2 0 get set 0", "3 0", "4 100 get set -110",
+                                   "5 200 get set -275", "6 900 get set -715"}) {
+        config.setFrequencyLockGain(1.0);
+        config.setPhaseLockGain(0.55);
+        config.setPhaseLockCoefficientA(2.0);
+        config.setPhaseLockCoefficientB(1.0);
+        config.setPhaseLockCoefficientC(1.0);
+        config.setSnapTimeThreshold(1e-6);
+        config.setSpikeFilterEnabled(true);
+        config.setSpikeFilterHistorySize(5);
+        config.setSpikeFilterMaxThreshold(1.0);
+        config.setSpikeFilterMinThreshold(2.5e-8);
+        config.setSpikeFilterGrowthFactor(3.0);
+        play(host, step);
+    }
+}
+
+TEST(StateMachine, OneLockCoversAPairAndEveryOtherCall)
+{
+    tFakeHost host;
+    tOpenServo& servo = host.open();
+    play(host, kLockIn);
+    const std::function<void()> others[] = {
+        [&] { servo.config().getPhaseLockGain(); },
+        [&] { servo.config().setPhaseLockGain(0.55); },
+        [&] { servo.controller().setState(zvckmDravik::kStatePhaseLock); },
+    };
+    for (const std::function<void()>& other : others) {
+        std::atomic<bool> through{false};
+        std::thread thread;
+        host.inOperation = [&](const std::string& operation, zverr_Status*) {
+            if (operation != "setFrequency") {
+                thread = std::thread([&] {
+                    other();
+                    through = true;
+                });
+            }
+            std::this_thread::sleep_for(std::chrono::milliseconds(20));
+            EXPECT_FALSE(through) << operation; // the pair's second operation included
+        };
+        host.pair(4 * kSecond, 4 * kSecond);
+        thread.join();
+        through = false;
+        uint64_t time = 0;
+        zvckmservo_getTime(&host.table, &time, &host.status.record);
+        thread.join();
+    }
+}
+
+TEST(StateMachine, AHostMayCallBackAndThePairGoesOnWhereItWas)
 {
     tFakeHost host;
     host.initialize();
     host.takeCalls();
-    play(host, kLockIn);
     host.inOperation = [&host](const std::string& operation, zverr_Status*) {
-        if (operation != "setFrequency") return;
         zverr_Status inner{0, 0, foreignReallocJson, nullptr};
-        zvckmservo_clearHistory(&host.table, &inner);
+        if (operation == "getFrequency") zvckmservo_clearHistory(&host.table, &inner);
         EXPECT_EQ(0, inner.code);
     };
-    play(host, {{4 * s, 100, "get set -110"}});
-    host.inOperation = nullptr;
-    play(host, {{5 * s, 0, ""}}); // a first pair
+    play(host, kLockIn + "4 100 get set -110 | 5 0");
 }
 
 TEST(PhaseLock, ALockedPairAllocatesNothingOnceTheHistoryIsFull)
