@@ -80,7 +80,8 @@ public:
 
 void lockFirst(benchmark::State& state)
 {
-    tMutex mutex;
+    zvplat::tFixedStatus status;
+    tMutex mutex(&status);
     for (auto _ : state) {
         mutex.lock();
         mutex.unlock();
@@ -89,7 +90,8 @@ void lockFirst(benchmark::State& state)
 
 void lockReentered(benchmark::State& state)
 {
-    tMutex mutex;
+    zvplat::tFixedStatus status;
+    tMutex mutex(&status);
     const tMutexGuard outer(mutex);
     for (auto _ : state) {
         mutex.lock();

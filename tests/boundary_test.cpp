@@ -77,7 +77,11 @@ TEST(Initialize, LeavesTheHandleAloneWhenItFails)
             mutexCreationFails = failing == "mutex";
             host.initialize();
             EXPECT_EQ(mutexCreationFails ? -52003 : -77, host.code());
-            EXPECT_EQ(mutexCreationFails ? "{}" : R"({"clock":"broken"})", host.status.text());
+            EXPECT_EQ(
+                mutexCreationFails
+                    ? R"({"file":"zvplat/quarks/synchronization","line":655,"component":"dravik"})"
+                    : R"({"clock":"broken"})",
+                host.status.text());
             EXPECT_EQ(&somethingElse, host.table.servoHandle);
             mutexCreationFails = false;
             host.table.servoHandle = nullptr;
@@ -90,20 +94,26 @@ TEST(Initialize, SurvivesTheFailureOfEachAllocation)
 {
     long n = 1;
     for (bool fired = true; fired; ++n) {
-        tFakeHost host;
-        host.initialize(); // whatever the test itself keeps is allocated by now
-        zvckmservo_finalize(&host.table);
-        host.takeCalls();
+        SCOPED_TRACE(testing::Message() << "allocation " << n);
         const long before = allocator::liveBlocks();
         {
-            const allocator::tFailNth failing(n);
-            zvckmservo_initialize(&host.table, &host.status.record);
-            fired = failing.fired();
+            tFakeHost host;
+            host.initialize(); // whatever the test itself keeps is allocated by now
+            zvckmservo_finalize(&host.table);
+            host.takeCalls();
+            {
+                const allocator::tFailNth failing(n);
+                zvckmservo_initialize(&host.table, &host.status.record);
+                fired = failing.fired();
+            }
+            EXPECT_EQ(fired ? -52000 : 0, host.code());
+            EXPECT_EQ(fired ? R"({"error_constant":"zvplaterr_memoryFull",)"
+                              R"("file":"zverr/tools/exception_errStatus","line":62,)"
+                              R"("component":"dravik","std_exception_what":"std::bad_alloc"})"
+                            : "(none)",
+                      host.status.text());
+            EXPECT_EQ(fired, host.table.servoHandle == nullptr);
         }
-        EXPECT_EQ(fired ? -52000 : 0, host.code()) << "allocation " << n;
-        EXPECT_EQ(fired, host.table.servoHandle == nullptr);
-        host.takeCalls();
-        zvckmservo_finalize(&host.table);
         EXPECT_EQ(before, allocator::liveBlocks());
     }
     EXPECT_GT(n, 2) << "the sweep did reach the servo";
@@ -183,11 +193,18 @@ TEST(Boundary, AFailingOperationArrivesWholeAndFreesTheLock)
         const char* text;
     };
     const char* const broken = R"({"clock":"broken"})";
+    const char* const thrown69 =
+        R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
+        R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
+        R"("std_exception_what":"broken"})";
+    const char* const thrown74 =
+        R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
+        R"("file":"zverr/tools/exception_errStatus","line":74,"component":"dravik"})";
     const Row rows[] = {
         {"getTime", 0, -77, broken},       {"getFrequency", 0, -77, broken},
         {"setFrequency", 0, -77, broken},  {"stepTime", 0, -77, broken},
-        {"getTime", 1, -52003, "(none)"},  {"getFrequency", 2, -52003, "(none)"},
-        {"stepTime", 1, -52003, "(none)"},
+        {"getTime", 1, -52003, thrown69},  {"getFrequency", 2, -52003, thrown74},
+        {"stepTime", 1, -52003, thrown69},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(testing::Message() << row.operation << " " << row.thrown);

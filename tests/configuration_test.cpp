@@ -11,14 +11,22 @@ namespace {
 
 using zvckmDravik::iServoConfig;
 
-int32_t codeOf(const std::function<void()>& call)
+// What a setter raises: code and payload; "" for nothing.
+std::string refusalOf(const std::function<void()>& call)
 {
     try {
         call();
     } catch (const zverr::Exception& failure) {
-        return failure.status.code;
+        expectBufferForm(failure.status);
+        return std::to_string(failure.status.code) + " " + failure.what();
     }
-    return 0;
+    return "";
+}
+
+std::string refusalAt(int line)
+{
+    return R"(-52005 {"error_constant":"zvplaterr_invalidParameter","file":"dravik/tServo","line":)" +
+           std::to_string(line) + R"(,"component":"dravik"})";
 }
 
 TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
@@ -28,21 +36,22 @@ TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
         double (iServoConfig::*get)() const;
         void (iServoConfig::*set)(double);
         double initial, lowest, highest;
+        int line;
     };
-#define PARAMETER(name, initial, lowest, highest)                                                  \
+#define PARAMETER(name, initial, lowest, highest, line)                                            \
     {                                                                                              \
-#name, &iServoConfig::get##name, &iServoConfig::set##name, initial, lowest, highest        \
+#name, &iServoConfig::get##name, &iServoConfig::set##name, initial, lowest, highest, line  \
     }
     const Row rows[] = {
-        PARAMETER(FrequencyLockGain, 1.0, 1e-9, 10.0),
-        PARAMETER(PhaseLockGain, 0.55, 1e-9, 10.0),
-        PARAMETER(PhaseLockCoefficientA, 2.0, -10.0, 10.0),
-        PARAMETER(PhaseLockCoefficientB, 1.0, -10.0, 10.0),
-        PARAMETER(PhaseLockCoefficientC, 1.0, -10.0, 10.0),
-        PARAMETER(SnapTimeThreshold, 1e-6, 1e-8, 10.0),
-        PARAMETER(SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0),
-        PARAMETER(SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0),
-        PARAMETER(SpikeFilterGrowthFactor, 3.0, 1.001, 100.0),
+        PARAMETER(FrequencyLockGain, 1.0, 1e-9, 10.0, 77),
+        PARAMETER(PhaseLockGain, 0.55, 1e-9, 10.0, 98),
+        PARAMETER(PhaseLockCoefficientA, 2.0, -10.0, 10.0, 119),
+        PARAMETER(PhaseLockCoefficientB, 1.0, -10.0, 10.0, 140),
+        PARAMETER(PhaseLockCoefficientC, 1.0, -10.0, 10.0, 161),
+        PARAMETER(SnapTimeThreshold, 1e-6, 1e-8, 10.0, 182),
+        PARAMETER(SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0, 256),
+        PARAMETER(SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0, 277),
+        PARAMETER(SpikeFilterGrowthFactor, 3.0, 1.001, 100.0, 298),
     };
 #undef PARAMETER
     const double infinity = std::numeric_limits<double>::infinity();
@@ -52,18 +61,18 @@ TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
         SCOPED_TRACE(row.name);
         EXPECT_EQ(row.initial, (config.*row.get)());
         for (const double good : {row.lowest, row.highest}) {
-            EXPECT_EQ(0, codeOf([&] { (config.*row.set)(good); }));
+            EXPECT_EQ("", refusalOf([&] { (config.*row.set)(good); }));
             EXPECT_EQ(good, (config.*row.get)());
         }
         for (const double bad :
              {std::nextafter(row.lowest, -infinity), std::nextafter(row.highest, infinity),
               -infinity, infinity, std::nan("")}) {
-            EXPECT_EQ(-52005, codeOf([&] { (config.*row.set)(bad); })) << bad;
+            EXPECT_EQ(refusalAt(row.line), refusalOf([&] { (config.*row.set)(bad); })) << bad;
             EXPECT_EQ(row.highest, (config.*row.get)()) << "a refused value changes nothing";
         }
     }
-    EXPECT_EQ(0, codeOf([&] { config.setPhaseLockCoefficientB(0.0); }));
-    EXPECT_EQ(-52005, codeOf([&] { config.setFrequencyLockGain(0.0); }));
+    EXPECT_EQ("", refusalOf([&] { config.setPhaseLockCoefficientB(0.0); }));
+    EXPECT_EQ(refusalAt(77), refusalOf([&] { config.setFrequencyLockGain(0.0); }));
 }
 
 TEST(Parameters, FilterSwitchAndHistorySize)
@@ -75,10 +84,10 @@ TEST(Parameters, FilterSwitchAndHistorySize)
     EXPECT_TRUE(config.getSpikeFilterEnabled());
     EXPECT_EQ(5U, config.getSpikeFilterHistorySize());
     for (const uint32_t good : {2U, 100U}) {
-        EXPECT_EQ(0, codeOf([&] { config.setSpikeFilterHistorySize(good); }));
+        EXPECT_EQ("", refusalOf([&] { config.setSpikeFilterHistorySize(good); }));
     }
     for (const uint32_t bad : {0U, 1U, 101U, static_cast<uint32_t>(-5)}) {
-        EXPECT_EQ(-52005, codeOf([&] { config.setSpikeFilterHistorySize(bad); })) << bad;
+        EXPECT_EQ(refusalAt(235), refusalOf([&] { config.setSpikeFilterHistorySize(bad); })) << bad;
     }
     EXPECT_EQ(100U, config.getSpikeFilterHistorySize());
 }

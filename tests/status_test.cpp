@@ -4,6 +4,9 @@
 #include "support/tHostStatus.h"
 #include "zverr/Exception.h"
 #include "zverr/errStatus.h"
+#include "zverr/jsonzLookup.h"
+#include "zverr/jsonzString.h"
+#include "zverr/payload.h"
 #include "zverr/tStatusGuard.h"
 #include "zverr/tools/exception_errStatus.h"
 
@@ -241,7 +244,7 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
     const auto own = [] { throw failureWith(-8, R"({"a":1})"); };
     const auto bare = [] { throw failureWith(-8, nullptr); };
     const auto memory = [] { throw std::bad_alloc(); };
-    const auto standard = [] { throw std::runtime_error("x"); };
+    const auto standard = [] { throw std::runtime_error("x\n"); };
     const auto number = [] { throw 42; };
     struct Row {
         const char* name;
@@ -252,8 +255,20 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
         const char* text;
         std::vector<uint32_t> requests; // made to the host's reallocJson
         tHostStatus::tMode mode;
+        uint32_t largest = UINT32_MAX;
     };
     const char* const warning = R"({"a long warning":"that leaves room"})";
+    const char* const text62 =
+        R"({"error_constant":"zvplaterr_memoryFull","file":"zverr/tools/exception_errStatus",)"
+        R"("line":62,"component":"dravik","std_exception_what":"std::bad_alloc"})";
+    const char* const text69 =
+        R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
+        R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
+        R"("std_exception_what":"x\n"})";
+    const char* const text74 =
+        R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
+        R"("file":"zverr/tools/exception_errStatus","line":74,"component":"dravik"})";
+    const std::vector<uint32_t> doubling = {4, 6, 10, 18, 34, 66, 130, 258};
     const Row rows[] = {
         {"own failure", own, 0, nullptr, -8, R"({"a":1})", {9}, tHostStatus::kGive},
         {"without payload", bare, 0, nullptr, -8, "{}", {4}, tHostStatus::kGive},
@@ -262,19 +277,128 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
         {"refused, a buffer", own, 2, "{}", -8, "{}", {9}, tHostStatus::kRefuse},
         {"reallocJson throws", own, 0, nullptr, -8, "(none)", {9}, tHostStatus::kThrow},
         {"older failure stays", own, -1, R"({"b":2})", -1, R"({"b":2})", {}, tHostStatus::kGive},
-        {"no memory", memory, 0, nullptr, -52000, "(none)", {}, tHostStatus::kGive},
-        {"standard exception", standard, 0, nullptr, -52003, "(none)", {}, tHostStatus::kGive},
-        {"anything else", number, 0, nullptr, -52003, "(none)", {}, tHostStatus::kGive},
-        {"over a warning", number, 2, warning, -52003, "{}", {}, tHostStatus::kGive},
+        {"no memory", memory, 0, nullptr, -52000, text62, doubling, tHostStatus::kGive},
+        {"no memory for that", memory, 0, nullptr, -52000, "(none)", {4}, tHostStatus::kRefuse},
+        {"standard exception", standard, 0, nullptr, -52003, text69, doubling, tHostStatus::kGive},
+        {"and a throw", standard, 0, nullptr, -52003, "(none)", {4}, tHostStatus::kThrow},
+        {"anything else", number, 0, nullptr, -52003, text74, doubling, tHostStatus::kGive},
+        {"over a warning", number, 2, warning, -52003, text74, {76, 150}, tHostStatus::kGive},
+        {"over no JSON",
+         number,
+         2,
+         "{no JSON",
+         -52003,
+         text74,
+         {18, 34, 66, 130, 258},
+         tHostStatus::kGive},
+        {"what fits exactly",
+         number,
+         0,
+         nullptr,
+         -52003,
+         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly"})",
+         {4, 6, 10, 18, 34, 66, 130},
+         tHostStatus::kGive,
+         66},
+        {"older failure, no JSON", number, -1, "{no", -1, "{no", {}, tHostStatus::kGive},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
         tHostStatus host(row.before, row.textBefore);
         host.mode = row.mode;
+        host.largest = row.largest;
         bridge(row.thrower, &host.record);
         EXPECT_EQ(row.code, host.code());
         EXPECT_EQ(row.text, host.text());
         EXPECT_EQ(row.requests, host.requests);
+    }
+}
+
+TEST(Payload, ReservesABufferAndFindsItsClosingBracket)
+{
+    struct Row {
+        const char* text; // null: no buffer yet
+        uint32_t extra;
+        int bracket;       // -1: null
+        uint32_t capacity; // afterwards
+        tHostStatus::tMode mode;
+    };
+    const Row rows[] = {
+        {nullptr, 2, 1, 4, tHostStatus::kGive},
+        {nullptr, 2, -1, 0, tHostStatus::kRefuse},
+        {nullptr, 0x7FFFFFFE, -1, 0, tHostStatus::kGive},
+        {R"({"a":1})", 2, 6, 9, tHostStatus::kGive},
+        {R"({"a":1})", 7, 6, 9, tHostStatus::kGive}, // no matter how full it is
+        {R"({"a":1})", 8, 6, 10, tHostStatus::kGive},
+        {R"([{}] rest)", 2, 3, 11, tHostStatus::kGive},
+        {R"({"a":})", 2, -1, 8, tHostStatus::kGive},
+        {R"( {})", 2, -1, 5, tHostStatus::kGive},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(testing::Message() << (row.text ? row.text : "none") << " " << row.extra);
+        tHostStatus host(1, row.text);
+        host.mode = row.mode;
+        const char* const bracket = zverr_reserveJson(&host.record, row.extra);
+        EXPECT_EQ(row.bracket < 0 ? nullptr : host.record.json + row.bracket, bracket);
+        EXPECT_EQ(row.capacity, host.record.capacity);
+    }
+    tOwnStatus own;
+    const char* const bracket = zverr_reserveJson(&own.record, 2);
+    EXPECT_EQ(own.record.json + 1, bracket);
+    EXPECT_EQ(512U, own.record.capacity);
+}
+
+TEST(Payload, GrowsByDoublingAndEndsWithAHostThatGrantsNothing)
+{
+    tOwnStatus own;
+    zverr_reserveJson(&own.record, 2);
+    for (const uint32_t capacity : {1024U, 2048U}) {
+        char* const position = zverr_growJson(own.record.json + 1, &own.record);
+        EXPECT_EQ(own.record.json + 1, position);
+        EXPECT_EQ(capacity, own.record.capacity);
+        expectBufferForm(own.record);
+    }
+    own.record.capacity = 0x80000000U; // the largest there can be
+    EXPECT_EQ(nullptr, zverr_growJson(own.record.json + 1, &own.record));
+    own.record.capacity = 2048;
+
+    tHostStatus host(0, "{}");
+    host.mode = tHostStatus::kGrantNothing;
+    EXPECT_EQ(nullptr, zverr_growJson(host.record.json + 1, &host.record));
+    EXPECT_EQ(std::vector<uint32_t>{6}, host.requests);
+}
+
+TEST(Payload, WriterStopsAtTheFirstMemberThatDoesNotFit)
+{
+    tHostStatus host;
+    host.largest = 66;
+    zverr_JsonWriter writer(&host.record);
+    writer.addObject("o").addInt("i", -1).addString("s", std::string("v")).endObject();
+    EXPECT_EQ(R"({"o":{"i":-1,"s":"v"}})", host.text());
+    writer.addObject("p").addString("long", std::string(40, 'x')).addUInt("u", 1).endObject();
+    EXPECT_EQ(R"({"o":{"i":-1,"s":"v"},"p":{}})", host.text());
+    zverr_JsonWriter().addUInt("u", 1).addObject("o").endObject().addSource({"f", 1, "c"});
+    zverr_JsonWriter(&host.record).addSource({"f", 7, nullptr});
+    EXPECT_EQ(R"({"o":{"i":-1,"s":"v"},"p":{},"file":"f","line":7})", host.text());
+}
+
+TEST(Payload, TakesMegabytesInTimeThatGrowsWithThem)
+{
+    std::string document(300000, '\x01');
+    for (int round = 0; round < 2; ++round) { // escaped twice: 14 characters a byte
+        tOwnStatus status;
+        zverr_JsonWriter writer(&status.record);
+        writer.addString("JSON", document).addString("key", "k");
+        uint32_t length = 0;
+        const char* const key =
+            jsonz_getString(jsonz_findMember(status.record.json, "key"), "", &length, nullptr);
+        EXPECT_EQ("k", std::string(key, length));
+        const char* const text =
+            jsonz_getString(jsonz_findMember(status.record.json, "JSON"), "", &length, nullptr);
+        std::string plain(length, ' ');
+        ASSERT_NE(nullptr, jsonz_unescape(text, length, plain.data()));
+        EXPECT_STREQ(document.c_str(), plain.c_str());
+        document.assign(text, length);
     }
 }
 

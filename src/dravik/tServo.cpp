@@ -1,8 +1,8 @@
 #include "dravik/tServo.h"
 
 #include "dravik/saturate.h"
-#include "zverr/Exception.h"
 #include "zverr/tStatusGuard.h"
+#include "zvplat/tFixedStatusGuard.h"
 
 // The lock, the state in force, and the host's clock in ratios and time spans. All operations on
 // the clock follow one pattern: the lock, a fresh status, one call of the host, and the end of the
@@ -23,11 +23,11 @@ int32_t roundToInt32(double value)
 } // namespace
 
 tServo::tServo(zvckmservo_HostTable* host)
-    : host(host), idleState(*this, *this, *this), frequencyLockState(*this, *this, *this),
+    : mutex(zvplat::tFixedStatusGuard().get()), // raises what it holds right here
+      host(host), idleState(*this, *this, *this), frequencyLockState(*this, *this, *this),
       phaseLockState(*this, *this, *this), snapTimeState(*this, *this, *this),
       currentState(&idleState)
 {
-    if (!mutex.isCreated()) zverr::raise(zvplaterr_softwareFaultPLATInternalUseOnly);
     {
         zverr::tStatusGuard status;
         maxFrequencyOffset = static_cast<double>(host->getMaxFrequencyOffset(&status)) * kPerPpb;

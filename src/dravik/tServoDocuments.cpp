@@ -1,5 +1,6 @@
 #include "dravik/tServo.h"
-#include "zverr/Exception.h"
+
+#include <stdexcept>
 
 // The three operations on JSON text. They report a failure rather than seem to succeed.
 
@@ -7,17 +8,17 @@ namespace zvckmDravik {
 
 std::string tServo::readServoConfigJson()
 {
-    zverr::raise(zvplaterr_softwareFaultPLATInternalUseOnly);
+    throw std::logic_error("no JSON text is taken or given yet");
 }
 
 void tServo::writeServoConfigJson(const std::string& /*json*/)
 {
-    zverr::raise(zvplaterr_softwareFaultPLATInternalUseOnly);
+    throw std::logic_error("no JSON text is taken or given yet");
 }
 
 void tServo::applyMetaData(const std::string& /*metaDataJson*/)
 {
-    zverr::raise(zvplaterr_softwareFaultPLATInternalUseOnly);
+    throw std::logic_error("no JSON text is taken or given yet");
 }
 
 } // namespace zvckmDravik

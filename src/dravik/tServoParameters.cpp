@@ -21,11 +21,9 @@ constexpr tBounds<double> kThreshold{1e-9, 10.0}; // seconds per second
 constexpr tBounds<double> kGrowthFactor{1.001, 100.0};
 
 // Refuses a value that is not a number too.
-template <class T> void check(T value, const tBounds<T>& bounds)
+template <class T> void check(T value, const tBounds<T>& bounds, const zverr_RaisingSite& site)
 {
-    if (!(value >= bounds.lowest && value <= bounds.highest)) {
-        zverr::raise(zvplaterr_invalidParameter);
-    }
+    if (!(value >= bounds.lowest && value <= bounds.highest)) zverr::raise(site);
 }
 
 } // namespace
@@ -73,37 +71,37 @@ double tServo::getSpikeFilterGrowthFactor() const { return read(spikeFilterGrowt
 
 void tServo::setFrequencyLockGain(double value)
 {
-    check(value, kGain);
+    check(value, kGain, kAtFrequencyLockGain);
     write(frequencyLockGain, value);
 }
 
 void tServo::setPhaseLockGain(double value)
 {
-    check(value, kGain);
+    check(value, kGain, kAtPhaseLockGain);
     write(phaseLockGain, value);
 }
 
 void tServo::setPhaseLockCoefficientA(double value)
 {
-    check(value, kCoefficient);
+    check(value, kCoefficient, kAtPhaseLockCoefficientA);
     write(phaseLockCoefficientA, value);
 }
 
 void tServo::setPhaseLockCoefficientB(double value)
 {
-    check(value, kCoefficient);
+    check(value, kCoefficient, kAtPhaseLockCoefficientB);
     write(phaseLockCoefficientB, value);
 }
 
 void tServo::setPhaseLockCoefficientC(double value)
 {
-    check(value, kCoefficient);
+    check(value, kCoefficient, kAtPhaseLockCoefficientC);
     write(phaseLockCoefficientC, value);
 }
 
 void tServo::setSnapTimeThreshold(double value)
 {
-    check(value, kSnapTimeThreshold);
+    check(value, kSnapTimeThreshold, kAtSnapTimeThreshold);
     write(snapTimeThreshold, value);
 }
 
@@ -111,25 +109,25 @@ void tServo::setSpikeFilterEnabled(bool value) { write(spikeFilterEnabled, value
 
 void tServo::setSpikeFilterHistorySize(uint32_t value)
 {
-    check(value, kHistorySize);
+    check(value, kHistorySize, kAtSpikeFilterHistorySize);
     write(spikeFilterHistorySize, value);
 }
 
 void tServo::setSpikeFilterMaxThreshold(double value)
 {
-    check(value, kThreshold);
+    check(value, kThreshold, kAtSpikeFilterMaxThreshold);
     write(spikeFilterMaxThreshold, value);
 }
 
 void tServo::setSpikeFilterMinThreshold(double value)
 {
-    check(value, kThreshold);
+    check(value, kThreshold, kAtSpikeFilterMinThreshold);
     write(spikeFilterMinThreshold, value);
 }
 
 void tServo::setSpikeFilterGrowthFactor(double value)
 {
-    check(value, kGrowthFactor);
+    check(value, kGrowthFactor, kAtSpikeFilterGrowthFactor);
     write(spikeFilterGrowthFactor, value);
 }
 

@@ -1,6 +1,7 @@
 #include "zverr/Exception.h"
 
 #include "zverr/errStatus.h"
+#include "zverr/payload.h"
 
 namespace zverr {
 
@@ -25,10 +26,10 @@ Exception::~Exception() noexcept = default;
 
 const char* Exception::what() const noexcept { return ExceptionBase::what(); }
 
-void raise(int32_t code)
+void raise(const zverr_RaisingSite& site)
 {
     Exception failure;
-    zverr_setCode(&failure.status, code);
+    zverr_setFailure(&failure.status, site);
     throw failure;
 }
 

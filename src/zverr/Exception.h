@@ -1,6 +1,6 @@
 #pragma once
 
-#include "zverr/status.h"
+#include "zverr/raisingSites.h"
 
 #include <exception>
 
@@ -34,7 +34,7 @@ public:
     const char* what() const noexcept override;
 };
 
-// Raises a failure of the plug-in's own.
-[[noreturn]] void raise(int32_t code);
+// Raises a failure of the plug-in's own, with the payload of its site.
+[[noreturn]] void raise(const zverr_RaisingSite& site);
 
 } // namespace zverr

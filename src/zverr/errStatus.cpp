@@ -22,11 +22,6 @@ uint32_t bufferSizeFor(uint32_t size)
     return result;
 }
 
-bool codeReplaces(int32_t newCode, int32_t code)
-{
-    return code == 0 ? newCode != 0 : code > 0 && newCode < 0;
-}
-
 } // namespace
 
 bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size)
@@ -61,9 +56,14 @@ bool zverr_setJson(zverr_Status* status, const char* text)
     return true;
 }
 
+bool zverr_codeReplaces(int32_t newCode, int32_t code)
+{
+    return code == 0 ? newCode != 0 : code > 0 && newCode < 0;
+}
+
 bool zverr_setCode(zverr_Status* status, int32_t code)
 {
-    if (!codeReplaces(code, status->code)) return false;
+    if (!zverr_codeReplaces(code, status->code)) return false;
     status->code = code;
     if (status->json != nullptr) {
         (void)zverr_setJson(status, nullptr);

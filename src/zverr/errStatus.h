@@ -16,9 +16,11 @@ inline zverr_Status zverr_emptyStatus() { return {0, 0, zverr_defaultReallocJson
 // the buffer. False if there is no room to be had for it; the old text then stays.
 bool zverr_setJson(zverr_Status* status, const char* text);
 
-// Sets the code by the one rule: a failure stays, a failure replaces a warning, a warning stays
-// until a failure comes, 0 never replaces anything. True if the code was taken; a payload that was
-// there is then wiped to "{}".
+// The one rule for a new code: a failure stays, a failure replaces a warning, a warning stays until
+// a failure comes, 0 never replaces anything.
+bool zverr_codeReplaces(int32_t newCode, int32_t code);
+
+// Sets the code by that rule. True if it was taken; a payload that was there is then wiped to "{}".
 bool zverr_setCode(zverr_Status* status, int32_t code);
 
 // Carries `source` over if its code is taken. Between records of the same reallocJson the buffer

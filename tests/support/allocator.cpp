@@ -43,9 +43,25 @@ void* operator new(size_t size)
     return block;
 }
 
+void* operator new[](size_t size) { return operator new(size); }
+
+void* operator new(size_t size, const std::nothrow_t& /*tag*/) noexcept
+{
+    return __wrap_malloc(size);
+}
+
+void* operator new[](size_t size, const std::nothrow_t& /*tag*/) noexcept
+{
+    return __wrap_malloc(size);
+}
+
 void operator delete(void* block) noexcept { __wrap_free(block); }
 
+void operator delete[](void* block) noexcept { __wrap_free(block); }
+
 void operator delete(void* block, size_t /*size*/) noexcept { __wrap_free(block); }
+
+void operator delete[](void* block, size_t /*size*/) noexcept { __wrap_free(block); }
 
 namespace allocator {
 

@@ -26,8 +26,8 @@ extern "C" bool foreignReallocJson(zverr_Status* status, uint32_t size)
         status->capacity = 0;
         return true;
     }
-    if (owner.mode == tHostStatus::kRefuse) return false;
-    if (size <= status->capacity) return true;
+    if (owner.mode == tHostStatus::kRefuse || size > owner.largest) return false;
+    if (owner.mode == tHostStatus::kGrantNothing || size <= status->capacity) return true;
     char* const buffer = new char[size]();
     const std::string text = status->json != nullptr ? status->json : "{}";
     text.copy(buffer, text.size());

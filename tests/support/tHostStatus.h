@@ -7,7 +7,8 @@
 #include <vector>
 
 // A host's own status record with a foreign reallocJson that gives exactly what is asked, notes
-// each request, and can be told to refuse or to throw. Checks the buffer's form when it ends.
+// each request, and can be told to refuse, to throw or to lie. Checks the buffer's form when it
+// ends.
 class tHostStatus
 {
 public:
@@ -22,7 +23,8 @@ public:
 
     zverr_Status record;
     std::vector<uint32_t> requests;
-    enum tMode { kGive, kRefuse, kThrow } mode = kGive;
+    enum tMode { kGive, kRefuse, kThrow, kGrantNothing } mode = kGive;
+    uint32_t largest = UINT32_MAX; // larger requests are refused
 };
 
 extern "C" bool foreignReallocJson(zverr_Status* status, uint32_t size);

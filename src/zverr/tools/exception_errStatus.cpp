@@ -2,10 +2,13 @@
 
 #include "zverr/Exception.h"
 #include "zverr/errStatus.h"
+#include "zverr/payload.h"
 
 #include <new>
 
 namespace {
+
+const char* const kWhat = "std_exception_what";
 
 void takeActiveException(zverr_Status* status)
 {
@@ -13,10 +16,12 @@ void takeActiveException(zverr_Status* status)
         throw;
     } catch (zverr::ExceptionBase& failure) {
         zverr_takeStatus(status, &failure.status);
-    } catch (std::bad_alloc&) {
-        zverr_setCode(status, zvplaterr_memoryFull);
+    } catch (std::bad_alloc& exhausted) {
+        zverr_setFailure(status, kAtBadAlloc).addString(kWhat, exhausted.what());
+    } catch (std::exception& other) {
+        zverr_setFailure(status, kAtStandardException).addString(kWhat, other.what());
     } catch (...) {
-        zverr_setCode(status, zvplaterr_softwareFaultPLATInternalUseOnly);
+        zverr_setFailure(status, kAtUnknownException);
     }
 }
 

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "zvplat/tFixedStatus.h"
+
 #include <pthread.h>
 
 // A recursive, priority-inheriting mutex. Recursive because a servo's states call back into the
@@ -7,13 +9,11 @@
 class tMutex
 {
 public:
-    tMutex();
+    // A mutex that the system refused is told in `status`, and must not be locked.
+    explicit tMutex(zvplat::tFixedStatus* status);
     ~tMutex();
     tMutex(const tMutex&) = delete;
     tMutex& operator=(const tMutex&) = delete;
-
-    // False if the system refused the mutex. It must not be locked then.
-    bool isCreated() const { return created; }
 
     void lock() { pthread_mutex_lock(&mutex); }
     void unlock() { pthread_mutex_unlock(&mutex); }

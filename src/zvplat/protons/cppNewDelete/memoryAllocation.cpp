@@ -1,0 +1,15 @@
+#include "zvplat/protons/cppNewDelete/memoryAllocation.h"
+
+#include <new>
+
+namespace zvplat {
+
+char* newArray(size_t size, tFixedStatus* status)
+{
+    if (status->code < 0) return nullptr;
+    char* const array = new (std::nothrow) char[size];
+    if (array == nullptr) status->set(kAtNewArray);
+    return array;
+}
+
+} // namespace zvplat
