@@ -1,14 +1,17 @@
-// The platform layer: mutex, fixed record, memory.
+// The platform layer: mutex, fixed record, memory, containers.
 
 #include "support/allocator.h"
 #include "support/tHostStatus.h"
 #include "zverr/Exception.h"
+#include "zvktl/err/string.h"
+#include "zvktl/err/vector.h"
 #include "zvplat/protons/cppNewDelete/memoryAllocation.h"
 #include "zvplat/quarks/synchronization.h"
 #include "zvplat/tFixedStatusAdapter.h"
 #include "zvplat/tFixedStatusGuard.h"
 
 #include <atomic>
+#include <functional>
 #include <gtest/gtest.h>
 #include <memory>
 #include <string>
@@ -17,6 +20,10 @@
 namespace {
 
 using zvplat::tFixedStatus;
+
+const char* const kMemoryFull =
+    R"({"error_constant":"zvplaterr_memoryFull","file":"zvktl/err/Allocator","line":32,)"
+    R"("component":"dravik"})";
 
 TEST(Mutex, CanBeTakenTwiceOnOneThreadAndExcludesAnother)
 {
@@ -199,6 +206,206 @@ TEST(Memory, ArraysAreNullAfterAFailureAndWithoutMemory)
     EXPECT_EQ(R"({"file":"zvplat/protons/cppNewDelete/memoryAllocation","line":346,)"
               R"("component":"dravik"})",
               warned.text());
+}
+
+using zvktl::err::string;
+using tBytes = zvktl::err::vector<char>;
+
+// An element as the containers want it: two strings.
+struct tPair {
+    tPair() = default;
+    tPair(const tPair& other, zverr_Status* status)
+        : name(other.name, status), value(other.value, status)
+    {}
+    void swap(tPair& other)
+    {
+        name.swap(other.name);
+        value.swap(other.value);
+    }
+    string name;
+    string value;
+};
+using tPairs = zvktl::err::vector<tPair>;
+
+std::string textOf(const tBytes& bytes) { return {bytes.data, bytes.size}; }
+
+std::string textOf(const tPairs& pairs)
+{
+    std::string text;
+    for (size_t i = 0; i < pairs.size; ++i) {
+        text += std::string(pairs.data[i].name.getText()) + pairs.data[i].value.getText() + " ";
+    }
+    return text;
+}
+
+// Inserts a pair as the owner of a vector does it.
+void insert(tPairs& pairs, size_t position, const std::string& name, zverr_Status* status)
+{
+    tPair pair;
+    pair.name.assign(name.data(), name.size(), status);
+    pairs.open_gap(position, 1, status);
+    if (status->code < 0) return;
+    pairs.data[position].swap(pair);
+    ++pairs.size;
+}
+
+TEST(String, CapacitiesAndContents)
+{
+    tHostStatus status;
+    zverr_Status* const s = &status.record;
+    struct Row {
+        size_t reserve, capacity; // one after the other, on one string
+    };
+    string text;
+    EXPECT_STREQ("", text.getText());
+    text.assign("", 0, s);
+    EXPECT_EQ(0U, text.getCapacity()) << "nothing to store, nothing allocated";
+    for (const Row& row :
+         {Row{0, 127}, Row{127, 127}, Row{128, 190}, Row{191, 285}, Row{1000, 1000}}) {
+        text.assign("ab", 2, s);
+        text.reserve(row.reserve, s);
+        EXPECT_EQ(row.capacity, text.getCapacity());
+        EXPECT_STREQ("ab", text.getText());
+    }
+    const char* const before = text.getText();
+    text.assign(std::string(1000, 'x').c_str(), 1000, s);
+    EXPECT_EQ(before, text.getText()) << "what fits stays in place";
+    text.assign(before + 998, 2, s);
+    EXPECT_STREQ("xx", text.getText());
+    text.assign(std::string(1001, 'y').c_str(), 1001, s);
+    EXPECT_EQ(1001U, text.getCapacity()) << "no growth by half";
+    text.assign("", 0, s);
+    EXPECT_EQ(0U, text.getSize());
+    EXPECT_STREQ("", text.getText());
+
+    const string empty("", s);
+    EXPECT_EQ(127U, empty.getCapacity());
+    const string longer(std::string(200, 'z').c_str(), s);
+    EXPECT_EQ(200U, longer.getCapacity());
+    const string copy(longer, s);
+    EXPECT_STREQ(longer.getText(), copy.getText());
+    EXPECT_NE(longer.getText(), copy.getText());
+    EXPECT_EQ(0, status.code());
+    text.reserve(SIZE_MAX, s);
+    EXPECT_EQ(-52000, status.code());
+    EXPECT_EQ(kMemoryFull, status.text());
+}
+
+TEST(Vectors, OpenGapsAndGrowByHalf)
+{
+    tHostStatus status;
+    zverr_Status* const s = &status.record;
+    tBytes bytes;
+    tPairs pairs;
+    std::string expectedBytes;
+    std::string expectedPairs;
+    for (size_t i = 0; i < 20; ++i) {
+        const size_t position = i * 7 % (i + 1); // front, end and between
+        const std::string name(1, static_cast<char>('a' + i));
+        bytes.insert(position, 2, name[0], s);
+        insert(pairs, position, name, s);
+        expectedBytes.insert(position, 2, name[0]);
+        expectedPairs.insert(2 * position, name + " ");
+        EXPECT_EQ(expectedBytes, textOf(bytes));
+        EXPECT_EQ(expectedPairs, textOf(pairs));
+        EXPECT_EQ(i < 8 ? 8U : i < 12 ? 12U : i < 18 ? 18U : 27U, pairs.capacity);
+    }
+    EXPECT_EQ(40U, bytes.capacity); // 8, 12, 18, 27, 40
+    pairs.open_gap(1, 5, s);
+    EXPECT_STREQ("", pairs.data[1].name.getText());
+    EXPECT_STREQ("", pairs.data[5].value.getText());
+    pairs.size += 5;
+    EXPECT_EQ(expectedPairs.size() + 5, textOf(pairs).size());
+    pairs.clear();
+    EXPECT_EQ(0U, pairs.size);
+    EXPECT_EQ(27U, pairs.capacity);
+    EXPECT_EQ(0, status.code());
+
+    bytes.insert(0, SIZE_MAX, 'x', s);
+    EXPECT_EQ(kMemoryFull, status.text());
+    for (const size_t count : {SIZE_MAX, size_t{178956971}}) {
+        status.reset();
+        insert(pairs, 0, "a", s);
+        status.mode = tHostStatus::kRefuse; // no payload: what is allocated is the array
+        const long before = allocator::allocations();
+        pairs.open_gap(0, count, s);
+        EXPECT_EQ(-52000, status.code());
+        EXPECT_EQ(before, allocator::allocations()) << "not even tried";
+        status.mode = tHostStatus::kGive;
+    }
+}
+
+TEST(Containers, DoNothingUnderAFailureAndKeepTheirContentsWithoutMemory)
+{
+    // Each changes something large enough to need memory; the object holds what it held if it
+    // fails.
+    struct tObjects {
+        explicit tObjects(zverr_Status* status) : text("text", status)
+        {
+            bytes.insert(0, 8, 'b', status);
+            for (int i = 0; i < 8; ++i) {
+                insert(pairs, 0, "p", status);
+            }
+        }
+        std::string all() const { return text.getText() + textOf(bytes) + textOf(pairs); }
+        string text;
+        tBytes bytes;
+        tPairs pairs;
+    };
+    struct Row {
+        const char* name;
+        std::function<void(tObjects&, zverr_Status*)> change;
+        long allocations;
+    };
+    const std::string longText(300, 'x');
+    const Row rows[] = {
+        {"construct", [&](tObjects&, zverr_Status* s) { string(longText.c_str(), s); }, 1},
+        {"copy", [](tObjects& o, zverr_Status* s) { string(o.text, s); }, 1},
+        {"reserve", [](tObjects& o, zverr_Status* s) { o.text.reserve(300, s); }, 1},
+        {"assign", [&](tObjects& o, zverr_Status* s) { o.text.assign(longText.c_str(), 300, s); },
+         1},
+        {"assign less", [](tObjects& o, zverr_Status* s) { o.text.assign("x", 1, s); }, 0},
+        {"insert", [](tObjects& o, zverr_Status* s) { o.bytes.insert(4, 1, 'x', s); }, 1},
+        {"open_gap", [](tObjects& o, zverr_Status* s) { insert(o.pairs, 4, "x", s); }, 18},
+        {"chain",
+         [&](tObjects&, zverr_Status* s) {
+             const string name(longText.c_str(), s);
+             const string copy(name, s);
+         },
+         2},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        tHostStatus good;
+        tHostStatus failed(-1, R"({"b":2})");
+        const long before = allocator::liveBlocks();
+        {
+            tObjects untouched(&good.record);
+            const std::string contents = untouched.all();
+            const long allocations = allocator::allocations();
+            row.change(untouched, &failed.record);
+            EXPECT_EQ(allocations, allocator::allocations());
+            EXPECT_EQ(contents, untouched.all());
+        }
+        EXPECT_EQ(before, allocator::liveBlocks());
+        EXPECT_EQ(R"({"b":2})", failed.text());
+        long n = 1;
+        for (bool fired = true; fired; ++n) {
+            tHostStatus status;
+            tObjects objects(&good.record);
+            const std::string contents = objects.all();
+            {
+                const allocator::tFailNth failing(n);
+                row.change(objects, &status.record);
+                fired = failing.fired();
+            }
+            EXPECT_EQ(fired ? -52000 : 0, status.code()) << "allocation " << n;
+            EXPECT_EQ(fired ? kMemoryFull : "(none)", status.text());
+            EXPECT_EQ(fired ? contents : objects.all(), objects.all());
+        }
+        EXPECT_EQ(row.allocations, n - 2);
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
 }
 
 } // namespace
