@@ -1,7 +1,8 @@
-// The platform layer: mutex, fixed record, memory, containers.
+// The platform layer: mutex, fixed record, memory, containers, dynamic loading.
 
 #include "support/allocator.h"
 #include "support/tHostStatus.h"
+#include "zvdynlib/dynload.h"
 #include "zverr/Exception.h"
 #include "zvktl/err/string.h"
 #include "zvktl/err/vector.h"
@@ -11,6 +12,7 @@
 #include "zvplat/tFixedStatusGuard.h"
 
 #include <atomic>
+#include <dlfcn.h>
 #include <functional>
 #include <gtest/gtest.h>
 #include <memory>
@@ -406,6 +408,40 @@ TEST(Containers, DoNothingUnderAFailureAndKeepTheirContentsWithoutMemory)
         EXPECT_EQ(row.allocations, n - 2);
         EXPECT_EQ(before, allocator::liveBlocks());
     }
+}
+
+TEST(Dynload, ReportsWhatTheLoaderSays)
+{
+    tHostStatus status;
+    EXPECT_EQ(nullptr, zvdynlib_load("/none/lib.so", RTLD_NOW, &status.record));
+    EXPECT_EQ(-52005, status.code());
+    const std::string text = status.text();
+    EXPECT_EQ(R"({"error_constant":"zvplaterr_invalidParameter","file":"zvdynlib/dynload",)"
+              R"("line":110,"component":"dravik","zvdynlib_debug":{)"
+              R"("debug":"failed to zvdynlib_load library","path":"/none/lib.so"},)"
+              R"("internal_error":{"api":"dlerror","string":")"
+              R"(/none/lib.so: cannot open shared object file: No such file or directory"}})",
+              text);
+    EXPECT_EQ(nullptr, zvdynlib_symbol(RTLD_DEFAULT, "malloc", &status.record));
+    EXPECT_EQ(nullptr, zvdynlib_load("libc.so.6", RTLD_NOW, &status.record));
+    EXPECT_EQ(text, status.text()) << "a chain keeps its first failure";
+
+    tHostStatus warned(2);
+    void* const handle = zvdynlib_load("libc.so.6", RTLD_NOW, &warned.record);
+    ASSERT_NE(nullptr, handle);
+    EXPECT_NE(nullptr, zvdynlib_symbol(handle, "malloc", &warned.record));
+    EXPECT_EQ(2, warned.code());
+    EXPECT_EQ(nullptr, zvdynlib_symbol(handle, "no\tsymbol", &warned.record));
+    EXPECT_EQ(-52005, warned.code());
+    EXPECT_EQ(
+        0U,
+        warned.text().find(
+            R"({"error_constant":"zvplaterr_invalidParameter","file":"zvdynlib/dynload","line":185,)"
+            R"("component":"dravik","zvdynlib_debug":{"zvdynlib_symbol":"no\tsymbol"},)"
+            R"("internal_error":{"api":"dlerror","string":")"))
+        << warned.text();
+    EXPECT_NE(std::string::npos, warned.text().find(R"(undefined symbol: no\tsymbol"}})"));
+    EXPECT_EQ(0, zvdynlib_close(handle));
 }
 
 } // namespace
