@@ -377,6 +377,8 @@ TEST(Payload, WriterStopsAtTheFirstMemberThatDoesNotFit)
     EXPECT_EQ(R"({"o":{"i":-1,"s":"v"}})", host.text());
     writer.addObject("p").addString("long", std::string(40, 'x')).addUInt("u", 1).endObject();
     EXPECT_EQ(R"({"o":{"i":-1,"s":"v"},"p":{}})", host.text());
+    EXPECT_EQ(std::vector<uint32_t>({4, 6, 10, 18, 34, 66, 130}), host.requests)
+        << "what stopped asks for nothing";
     zverr_JsonWriter().addUInt("u", 1).addObject("o").endObject().addSource({"f", 1, "c"});
     zverr_JsonWriter(&host.record).addSource({"f", 7, nullptr});
     EXPECT_EQ(R"({"o":{"i":-1,"s":"v"},"p":{},"file":"f","line":7})", host.text());

@@ -50,6 +50,22 @@ struct zverr_Status {
     char* json;
 };
 
+/* The payload of a failure that the plug-in raises is one JSON object without white space:
+ *
+ *     {"error_constant":"zvplaterr_invalidParameter","file":"dravik/tServo","line":98,
+ *      "component":"dravik"}
+ *
+ *   "error_constant"      the name of the code; absent where the platform layer raised it
+ *   "file", "line"        the source unit and a number that stands for the place in it; both stay
+ *                         from release to release
+ *   "component"           always "dravik"
+ *   "std_exception_what"  what an exception said that reached the boundary
+ *   "internal_error"      what the operating system said: "api", "string" and, of errno, "code"
+ *   "..._debug"           the raising library's own details
+ *
+ * Details never change an outcome: what there is no room for is left out from that member on, and
+ * the code stands. A failure of a host operation keeps the payload that the host gave it. */
+
 /* The codes that the plug-in raises, now or in a later minor version. Two failures of the same kind
  * share a code. */
 enum {

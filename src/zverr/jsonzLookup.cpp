@@ -24,7 +24,7 @@ template <class Number> int32_t toInt32(Number number)
 bool localeHasDecimalComma()
 {
     char sample[kScratchSize];
-    std::snprintf(sample, sizeof sample, "%.1f", 1.5);
+    (void)std::snprintf(sample, sizeof sample, "%.1f", 1.5);
     return sample[1] == ',';
 }
 

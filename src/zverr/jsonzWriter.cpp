@@ -2,6 +2,7 @@
 
 #include "zverr/jsonz.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <cstring>
 
@@ -10,6 +11,7 @@ namespace {
 constexpr size_t kScratchSize = 64; // for the digits of a number
 constexpr unsigned char kDelete = 0x7F;
 constexpr uint32_t kLongestEscape = 6;
+constexpr char kHexDigits[] = "0123456789abcdef";
 
 // The character behind the backslash, for those that have a short escape; else 0.
 char shortEscape(unsigned char c)
@@ -48,8 +50,8 @@ char* copyEscapedCharacter(char* out, unsigned char c)
         out[0] = '\\';
         out[1] = shortEscape(c);
     } else {
-        char escape[kLongestEscape + 1];
-        std::snprintf(escape, sizeof escape, "\\u%04x", c);
+        const char escape[kLongestEscape] = {
+            '\\', 'u', '0', '0', kHexDigits[c >> 4], kHexDigits[c & 0xF]};
         std::memcpy(out, escape, kLongestEscape);
     }
     return out + length;
@@ -94,9 +96,7 @@ char* putBare(char* position, const char* key, const char* value)
     const size_t length = std::strlen(value);
     char* const gap = openGapFor(position, jsonz_keyLength(key) + length);
     if (gap == nullptr) return nullptr;
-    char* const out = jsonz_putKey(gap, key);
-    std::memcpy(out, value, length);
-    return out + length;
+    return std::copy_n(value, length, jsonz_putKey(gap, key));
 }
 
 // Tries `put` at the position, and at the same place in an ever larger buffer, until it succeeds.
@@ -182,14 +182,14 @@ char* jsonz_putString(char* position, const char* key, const char* value)
 char* jsonz_putInt(char* position, const char* key, int32_t value)
 {
     char digits[kScratchSize];
-    std::snprintf(digits, sizeof digits, "%i", value);
+    (void)std::snprintf(digits, sizeof digits, "%i", value);
     return putBare(position, key, digits);
 }
 
 char* jsonz_putUInt(char* position, const char* key, uint32_t value)
 {
     char digits[kScratchSize];
-    std::snprintf(digits, sizeof digits, "%u", value);
+    (void)std::snprintf(digits, sizeof digits, "%u", value);
     return putBare(position, key, digits);
 }
 
