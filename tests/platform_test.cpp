@@ -4,6 +4,9 @@
 #include "support/tHostStatus.h"
 #include "zvdynlib/dynload.h"
 #include "zverr/Exception.h"
+#include "zverr/errStatus.h"
+#include "zverr/jsonzLookup.h"
+#include "zverr/tools/exception_errStatus.h"
 #include "zvktl/err/string.h"
 #include "zvktl/err/vector.h"
 #include "zvplat/protons/cppNewDelete/memoryAllocation.h"
@@ -12,10 +15,12 @@
 #include "zvplat/tFixedStatusGuard.h"
 
 #include <atomic>
+#include <cstring>
 #include <dlfcn.h>
 #include <functional>
 #include <gtest/gtest.h>
 #include <memory>
+#include <stdexcept>
 #include <string>
 #include <thread>
 
@@ -404,6 +409,58 @@ TEST(Containers, DoNothingUnderAFailureAndKeepTheirContentsWithoutMemory)
             EXPECT_EQ(fired ? -52000 : 0, status.code()) << "allocation " << n;
             EXPECT_EQ(fired ? kMemoryFull : "(none)", status.text());
             EXPECT_EQ(fired ? contents : objects.all(), objects.all());
+        }
+        EXPECT_EQ(row.allocations, n - 2);
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
+}
+
+TEST(Details, AreAllThatExhaustedMemoryCosts)
+{
+    const std::string longText(2000, '\n'); // more than two buffers
+    const std::runtime_error thrown(longText);
+    struct Row {
+        const char* name;
+        std::function<void(zverr_Status*)> fail;
+        int32_t code;
+        long allocations;
+    };
+    const Row rows[] = {
+        {"load", [&](zverr_Status* s) { zvdynlib_load(longText.c_str(), RTLD_NOW, s); }, -52005, 6},
+        {"symbol", [](zverr_Status* s) { zvdynlib_symbol(nullptr, "?", s); }, -52005, 1},
+        {"fixed record",
+         [](zverr_Status* s) { zvplat::tFixedStatusAdapter(s).get()->set(-5, "c", "f", 7); }, -5,
+         1},
+        {"exception",
+         [&thrown](zverr_Status* s) {
+             try {
+                 throw std::runtime_error(thrown); // the copy shares its text
+             } catch (...) {
+                 zverr_exceptionToStatus(s);
+             }
+         },
+         -52003, 5},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        const long before = allocator::liveBlocks();
+        long n = 1;
+        size_t length = 0;
+        for (bool fired = true; fired; ++n) {
+            zverr_Status status = zverr_emptyStatus();
+            {
+                const allocator::tFailNth failing(n);
+                row.fail(&status);
+                fired = failing.fired();
+            }
+            EXPECT_EQ(row.code, status.code);
+            expectBufferForm(status);
+            if (status.json != nullptr) {
+                EXPECT_NE(nullptr, jsonz_closingBracket(status.json));
+                EXPECT_LE(length, std::strlen(status.json)) << "more memory, more details";
+                length = std::strlen(status.json);
+            }
+            zverr_releaseJson(&status);
         }
         EXPECT_EQ(row.allocations, n - 2);
         EXPECT_EQ(before, allocator::liveBlocks());
