@@ -90,6 +90,26 @@ TEST(Initialize, LeavesTheHandleAloneWhenItFails)
     }
 }
 
+TEST(Initialize, DuringAnUnwindingAMissingMutexIsReplaced)
+{
+    struct tAtUnwinding {
+        ~tAtUnwinding() { host.initialize(); }
+        tFakeHost& host;
+    };
+    tFakeHost host;
+    mutexCreationFails = true;
+    EXPECT_THROW(
+        {
+            const tAtUnwinding atUnwinding{host};
+            throw 42;
+        },
+        int);
+    mutexCreationFails = false;
+    EXPECT_EQ(0, host.code()) << "no guard raises during an unwinding";
+    lockIn(host);
+    expectLockFree(host);
+}
+
 TEST(Initialize, SurvivesTheFailureOfEachAllocation)
 {
     long n = 1;

@@ -246,13 +246,17 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
     const auto memory = [] { throw std::bad_alloc(); };
     const auto standard = [] { throw std::runtime_error("x\n"); };
     const auto number = [] { throw 42; };
+    struct tSilent : std::exception {
+        const char* what() const noexcept override { return nullptr; }
+    };
+    const auto silent = [] { throw tSilent(); };
     struct Row {
         const char* name;
         std::function<void()> thrower;
         int32_t before;
         const char* textBefore;
         int32_t code;
-        const char* text;
+        std::string text;
         std::vector<uint32_t> requests; // made to the host's reallocJson
         tHostStatus::tMode mode;
         uint32_t largest = UINT32_MAX;
@@ -261,10 +265,12 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
     const char* const text62 =
         R"({"error_constant":"zvplaterr_memoryFull","file":"zverr/tools/exception_errStatus",)"
         R"("line":62,"component":"dravik","std_exception_what":"std::bad_alloc"})";
-    const char* const text69 =
+    const std::string at69 =
         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
         R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
-        R"("std_exception_what":"x\n"})";
+        R"("std_exception_what":")";
+    const std::string text69 = at69 + R"(x\n"})";
+    const std::string text69Silent = at69 + R"("})";
     const char* const text74 =
         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
         R"("file":"zverr/tools/exception_errStatus","line":74,"component":"dravik"})";
@@ -275,6 +281,16 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
         {"fits over a warning", own, 2, warning, -8, R"({"a":1})", {}, tHostStatus::kGive},
         {"refused, no buffer", own, 0, nullptr, -8, "(none)", {9}, tHostStatus::kRefuse},
         {"refused, a buffer", own, 2, "{}", -8, "{}", {9}, tHostStatus::kRefuse},
+        {"granted, not given", own, 2, "{}", -8, "{}", {9}, tHostStatus::kGrantNothing},
+        {"granted, no buffer",
+         number,
+         0,
+         nullptr,
+         -52003,
+         "(none)",
+         {4},
+         tHostStatus::kGrantNothing},
+        {"what() is null", silent, 0, nullptr, -52003, text69Silent, doubling, tHostStatus::kGive},
         {"reallocJson throws", own, 0, nullptr, -8, "(none)", {9}, tHostStatus::kThrow},
         {"older failure stays", own, -1, R"({"b":2})", -1, R"({"b":2})", {}, tHostStatus::kGive},
         {"no memory", memory, 0, nullptr, -52000, text62, doubling, tHostStatus::kGive},

@@ -23,7 +23,7 @@ int32_t roundToInt32(double value)
 } // namespace
 
 tServo::tServo(zvckmservo_HostTable* host)
-    : mutex(zvplat::tFixedStatusGuard().get()), // raises what it holds right here
+    : mutex(zvplat::tFixedStatusGuard().get()), // raises its failure right here
       host(host), idleState(*this, *this, *this), frequencyLockState(*this, *this, *this),
       phaseLockState(*this, *this, *this), snapTimeState(*this, *this, *this),
       currentState(&idleState)

@@ -71,37 +71,37 @@ double tServo::getSpikeFilterGrowthFactor() const { return read(spikeFilterGrowt
 
 void tServo::setFrequencyLockGain(double value)
 {
-    check(value, kGain, kAtFrequencyLockGain);
+    check(value, kGain, zverr::kAtFrequencyLockGain);
     write(frequencyLockGain, value);
 }
 
 void tServo::setPhaseLockGain(double value)
 {
-    check(value, kGain, kAtPhaseLockGain);
+    check(value, kGain, zverr::kAtPhaseLockGain);
     write(phaseLockGain, value);
 }
 
 void tServo::setPhaseLockCoefficientA(double value)
 {
-    check(value, kCoefficient, kAtPhaseLockCoefficientA);
+    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientA);
     write(phaseLockCoefficientA, value);
 }
 
 void tServo::setPhaseLockCoefficientB(double value)
 {
-    check(value, kCoefficient, kAtPhaseLockCoefficientB);
+    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientB);
     write(phaseLockCoefficientB, value);
 }
 
 void tServo::setPhaseLockCoefficientC(double value)
 {
-    check(value, kCoefficient, kAtPhaseLockCoefficientC);
+    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientC);
     write(phaseLockCoefficientC, value);
 }
 
 void tServo::setSnapTimeThreshold(double value)
 {
-    check(value, kSnapTimeThreshold, kAtSnapTimeThreshold);
+    check(value, kSnapTimeThreshold, zverr::kAtSnapTimeThreshold);
     write(snapTimeThreshold, value);
 }
 
@@ -109,25 +109,25 @@ void tServo::setSpikeFilterEnabled(bool value) { write(spikeFilterEnabled, value
 
 void tServo::setSpikeFilterHistorySize(uint32_t value)
 {
-    check(value, kHistorySize, kAtSpikeFilterHistorySize);
+    check(value, kHistorySize, zverr::kAtSpikeFilterHistorySize);
     write(spikeFilterHistorySize, value);
 }
 
 void tServo::setSpikeFilterMaxThreshold(double value)
 {
-    check(value, kThreshold, kAtSpikeFilterMaxThreshold);
+    check(value, kThreshold, zverr::kAtSpikeFilterMaxThreshold);
     write(spikeFilterMaxThreshold, value);
 }
 
 void tServo::setSpikeFilterMinThreshold(double value)
 {
-    check(value, kThreshold, kAtSpikeFilterMinThreshold);
+    check(value, kThreshold, zverr::kAtSpikeFilterMinThreshold);
     write(spikeFilterMinThreshold, value);
 }
 
 void tServo::setSpikeFilterGrowthFactor(double value)
 {
-    check(value, kGrowthFactor, kAtSpikeFilterGrowthFactor);
+    check(value, kGrowthFactor, zverr::kAtSpikeFilterGrowthFactor);
     write(spikeFilterGrowthFactor, value);
 }
 

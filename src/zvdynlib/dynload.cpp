@@ -24,7 +24,7 @@ void* zvdynlib_load(const char* path, int flag, zverr_Status* status)
     if (status->code < 0) return nullptr;
     void* const handle = dlopen(path, flag);
     if (handle != nullptr) return handle;
-    zverr_JsonWriter writer = zverr_setFailure(status, kAtLoad);
+    zverr_JsonWriter writer = zverr_setFailure(status, zverr::kAtLoad);
     writer.addObject(kDetails)
         .addString("debug", "failed to zvdynlib_load library")
         .addString("path", path)
@@ -38,7 +38,7 @@ void* zvdynlib_symbol(void* handle, const char* symbol, zverr_Status* status)
     if (status->code < 0) return nullptr;
     void* const address = dlsym(handle, symbol);
     if (address != nullptr) return address;
-    zverr_JsonWriter writer = zverr_setFailure(status, kAtSymbol);
+    zverr_JsonWriter writer = zverr_setFailure(status, zverr::kAtSymbol);
     writer.addObject(kDetails).addString("zvdynlib_symbol", symbol).endObject();
     addLoadersWord(writer);
     return nullptr;

@@ -45,13 +45,19 @@ bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size)
     return true;
 }
 
+bool zverr_ensureCapacity(zverr_Status* status, uint32_t size)
+{
+    if (status->capacity < size && !status->reallocJson(status, size)) return false;
+    return status->json != nullptr && status->capacity >= size;
+}
+
 bool zverr_setJson(zverr_Status* status, const char* text)
 {
     if (text == nullptr) text = kEmptyObject;
     const size_t length = std::strlen(text);
     if (length > kLongestText) return false;
     const uint32_t need = static_cast<uint32_t>(length) + kJsonzOverhead;
-    if (status->capacity < need && !status->reallocJson(status, need)) return false;
+    if (!zverr_ensureCapacity(status, need)) return false;
     jsonz_formatBuffer(status->json, status->capacity, text);
     return true;
 }

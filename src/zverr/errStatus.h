@@ -12,6 +12,10 @@ extern "C" bool zverr_defaultReallocJson(zverr_Status* status, uint32_t size);
 // An empty record as the plug-in makes it for itself: no code, no buffer, the standard reallocJson.
 inline zverr_Status zverr_emptyStatus() { return {0, 0, zverr_defaultReallocJson, nullptr}; }
 
+// Sees to a buffer of at least that size. A reallocJson that grants it and does not give it counts
+// as one that refuses.
+bool zverr_ensureCapacity(zverr_Status* status, uint32_t size);
+
 // Puts `text` into the buffer in place of what was there; null stands for "{}". `text` lies outside
 // the buffer. False if there is no room to be had for it; the old text then stays.
 bool zverr_setJson(zverr_Status* status, const char* text);

@@ -5,9 +5,10 @@
 // Checks a JSON text in place and finds where its values begin and end. Numbers are taken more
 // widely than JSON does: `-`, `1.`, `1e+` and `007` count.
 
-// How deep objects and arrays may be nested, the outermost one counted. A text nested deeper does
-// not parse: no text may exhaust the stack. Each level is one recursion, 120 bytes of stack on a
-// 32-bit target and 170 on a 64-bit one in a release build, so the deepest takes some 160 KB.
+// How deep objects and arrays may be nested, the value that is parsed counted. What is nested
+// deeper does not parse: no text may exhaust the stack. Each level is one recursion, 120 bytes of
+// stack on a 32-bit target and 170 on a 64-bit one in a release build, so the deepest takes some
+// 160 KB.
 constexpr uint32_t kJsonzDeepestNesting = 1000;
 
 enum jsonz_TokenType : uint32_t {
@@ -23,7 +24,7 @@ enum jsonz_TokenType : uint32_t {
 enum jsonz_Error : uint32_t {
     jsonz_errorValueExpected = 1, // the text pointer is null
     // A string does not begin with a quote, holds a control character or is not closed. Also what
-    // is told of a text that begins none of the six kinds of values.
+    // is told of a text that begins none of the six kinds of values, or is nested too deep.
     jsonz_errorDoubleQuoteExpected = 2,
     jsonz_errorCurlyBracketExpected = 3,  // no `{`, or the text ends inside an object
     jsonz_errorSquareBracketExpected = 4, // no `[`, or the text ends inside an array

@@ -74,10 +74,10 @@ bool needsComma(const char* position)
 }
 
 // True if at least `room` zero bytes stand between the text's terminator and the end mark.
-bool hasRoom(const char* terminator, uint32_t room)
+bool hasRoom(const char* terminator, uint64_t room)
 {
     const char* const first = terminator + 1;
-    uint32_t free = 0;
+    uint64_t free = 0;
     while (free < room && first[free] == 0) {
         ++free;
     }
@@ -87,7 +87,7 @@ bool hasRoom(const char* terminator, uint32_t room)
 // As jsonz_openGap, for a length that was counted and may be beyond any buffer's size.
 char* openGapFor(char* position, uint64_t length)
 {
-    return length < UINT32_MAX ? jsonz_openGap(position, static_cast<uint32_t>(length)) : nullptr;
+    return length <= UINT32_MAX ? jsonz_openGap(position, static_cast<uint32_t>(length)) : nullptr;
 }
 
 // A value that needs no quotes.
@@ -152,15 +152,15 @@ char* jsonz_openGap(char* position, uint32_t room)
     // In front of an empty container's white space the member is alone as well.
     const char* const next = inFront ? jsonz_skipWhiteSpace(gap) : gap;
     const bool comma = needsComma(next);
-    if (comma) ++room;
+    const uint64_t width = uint64_t{room} + (comma ? 1 : 0);
 
     char* const terminator = gap + std::strlen(gap);
-    if (!hasRoom(terminator, room)) return nullptr;
-    std::memmove(gap + room, gap, static_cast<size_t>(terminator - gap) + 1);
+    if (!hasRoom(terminator, width)) return nullptr;
+    std::memmove(gap + width, gap, static_cast<size_t>(terminator - gap) + 1);
 
     if (!comma) return gap;
     if (inFront) {
-        gap[room - 1] = ',';
+        gap[room] = ',';
         return gap;
     }
     *gap = ',';

@@ -18,8 +18,7 @@ char* growStatus(char* position, void* status)
 char* zverr_reserveJson(zverr_Status* status, uint32_t extra)
 {
     if (extra > kLargestExtra) return nullptr;
-    const uint32_t size = extra + kJsonzOverhead;
-    if (size > status->capacity && !status->reallocJson(status, size)) return nullptr;
+    if (!zverr_ensureCapacity(status, extra + kJsonzOverhead)) return nullptr;
     const char* const bracket = jsonz_closingBracket(status->json);
     return bracket != nullptr ? status->json + (bracket - status->json) : nullptr;
 }
@@ -29,7 +28,7 @@ char* zverr_growJson(char* position, zverr_Status* status)
     const auto offset = position - status->json;
     const uint32_t capacity = status->capacity;
     if (zverr_reserveJson(status, 2 * (capacity - kJsonzOverhead)) == nullptr) return nullptr;
-    // A host that grants room and gives none would be asked for ever.
+    // A request that wrapped around got nothing, and would be repeated for ever.
     return status->capacity > capacity ? status->json + offset : nullptr;
 }
 
@@ -83,6 +82,7 @@ zverr_JsonWriter zverr_setFailure(zverr_Status* status, const zverr_RaisingSite&
 {
     if (!zverr_setCode(status, site.code)) return {};
     zverr_JsonWriter writer(status);
-    writer.addString("error_constant", site.constant).addSource(site.position);
+    if (site.constant != nullptr) writer.addString("error_constant", site.constant);
+    writer.addSource(site.position);
     return writer;
 }

@@ -8,7 +8,8 @@ namespace zvplat {
 // The platform layer's own record of a failure: fixed arrays, no heap memory, no JSON, so that
 // exhausted memory can be told in it too. Nothing in it needs releasing.
 struct tFixedStatus {
-    // The stamp of a record that has all fields. One with a smaller stamp holds a code alone.
+    // The stamp of a record that has all fields, a fixed number and not its sizeof. A record with a
+    // smaller stamp holds a code alone.
     static constexpr uint32_t kStamp = 164;
 
     // Sets the code by the rule of zverr_setCode, and with it the rest. True if it was taken. A

@@ -8,7 +8,11 @@
 
 namespace {
 
-const char* const kWhat = "std_exception_what";
+void addWhat(zverr_JsonWriter writer, const std::exception& exception)
+{
+    const char* const what = exception.what(); // of a host's class it may be anything
+    writer.addString("std_exception_what", what != nullptr ? what : "");
+}
 
 void takeActiveException(zverr_Status* status)
 {
@@ -17,11 +21,11 @@ void takeActiveException(zverr_Status* status)
     } catch (zverr::ExceptionBase& failure) {
         zverr_takeStatus(status, &failure.status);
     } catch (std::bad_alloc& exhausted) {
-        zverr_setFailure(status, kAtBadAlloc).addString(kWhat, exhausted.what());
+        addWhat(zverr_setFailure(status, zverr::kAtBadAlloc), exhausted);
     } catch (std::exception& other) {
-        zverr_setFailure(status, kAtStandardException).addString(kWhat, other.what());
+        addWhat(zverr_setFailure(status, zverr::kAtStandardException), other);
     } catch (...) {
-        zverr_setFailure(status, kAtUnknownException);
+        zverr_setFailure(status, zverr::kAtUnknownException);
     }
 }
 

@@ -15,6 +15,6 @@ void* allocate(size_t bytes, zverr_Status* status)
 
 void release(void* memory) { ::operator delete(memory); }
 
-void reportMemoryFull(zverr_Status* status) { zverr_setFailure(status, kAtAllocator); }
+void reportMemoryFull(zverr_Status* status) { zverr_setFailure(status, zverr::kAtAllocator); }
 
 } // namespace zvktl::err

@@ -91,6 +91,7 @@ template <class Element> void vector<Element>::openInPlace(size_t position, size
 template <class Element>
 void vector<Element>::openInNewArray(size_t position, size_t count, zverr_Status* status)
 {
+    static_assert(kLargestCapacity <= SIZE_MAX / sizeof(Element), "a size in bytes is a size_t");
     const size_t newCapacity = grownCapacity(capacity, size + count);
     if (newCapacity > kLargestCapacity) return reportMemoryFull(status);
     void* const memory = allocate(newCapacity * sizeof(Element), status);

@@ -20,7 +20,7 @@ bool create(pthread_mutex_t* mutex)
 
 tMutex::tMutex(zvplat::tFixedStatus* status) : created(create(&mutex))
 {
-    if (!created) status->set(kAtMutexCreation);
+    if (!created) status->set(zverr::kAtMutexCreation);
 }
 
 tMutex::~tMutex()

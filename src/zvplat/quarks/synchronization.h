@@ -9,7 +9,8 @@
 class tMutex
 {
 public:
-    // A mutex that the system refused is told in `status`, and must not be locked.
+    // A mutex that the system refused is told in `status`. Should the owner live on, it can be
+    // locked all the same, but does not inherit priorities.
     explicit tMutex(zvplat::tFixedStatus* status);
     ~tMutex();
     tMutex(const tMutex&) = delete;
@@ -21,7 +22,7 @@ public:
 private:
     friend class tMutexGuard;
 
-    pthread_mutex_t mutex;
+    pthread_mutex_t mutex = PTHREAD_RECURSIVE_MUTEX_INITIALIZER_NP;
     bool created;
 };
 

@@ -8,7 +8,7 @@ char* newArray(size_t size, tFixedStatus* status)
 {
     if (status->code < 0) return nullptr;
     char* const array = new (std::nothrow) char[size];
-    if (array == nullptr) status->set(kAtNewArray);
+    if (array == nullptr) status->set(zverr::kAtNewArray);
     return array;
 }
 
