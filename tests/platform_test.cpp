@@ -1,6 +1,7 @@
 // The platform layer: mutex, fixed record, memory, containers, dynamic loading.
 
 #include "support/allocator.h"
+#include "support/systemLog.h"
 #include "support/tHostStatus.h"
 #include "zvdynlib/dynload.h"
 #include "zverr/Exception.h"
@@ -13,6 +14,7 @@
 #include "zvplat/quarks/synchronization.h"
 #include "zvplat/tFixedStatusAdapter.h"
 #include "zvplat/tFixedStatusGuard.h"
+#include "zvsdbg/debugLine.h"
 
 #include <atomic>
 #include <cstring>
@@ -464,6 +466,76 @@ TEST(Details, AreAllThatExhaustedMemoryCosts)
         }
         EXPECT_EQ(row.allocations, n - 2);
         EXPECT_EQ(before, allocator::liveBlocks());
+    }
+}
+
+TEST(DebugLine, KeepsItsFormHoweverLongItsParts)
+{
+    const std::string prefix = "6 [    dravik|                   dravik/tServo|0434] ";
+    const std::string file32(32, 'f');
+    const std::string file33 = "x" + file32;
+    struct Row {
+        const char* name;
+        int32_t level;
+        tDebugLocation location;
+        std::string message;
+        std::string line; // "": dropped
+    };
+    const Row rows[] = {
+        {"dropped", 4095, {"dravik/tServo", 434, "\n"}, "m", ""},
+        {"lowest level", 4096, {"dravik/tServo", 434, "\n"}, "m", prefix + "m\n"},
+        {"empty message", 8192, {"dravik/tServo", 434, "\n"}, "", prefix + "\n"},
+        {"longest message",
+         8192,
+         {"dravik/tServo", 434, "\n"},
+         std::string(459, 'm'),
+         prefix + std::string(459, 'm') + "\n"},
+        {"cut",
+         8192,
+         {"dravik/tServo", 434, "\n"},
+         std::string(2000, 'm'),
+         prefix + std::string(459, 'm') + "\n"},
+        {"long end",
+         8192,
+         {"dravik/tServo", 434, " and so on\n"},
+         std::string(459, 'm'),
+         prefix + std::string(449, 'm') + " and so on\n"},
+        {"no end", 8192, {"dravik/tServo", 434, ""}, "m", prefix + "m"},
+        {"file of 32",
+         8192,
+         {file32.c_str(), 12345, ""},
+         "m",
+         "6 [    dravik|" + file32 + "|2345] m"},
+        {"file of 33", 8192, {file33.c_str(), 0, ""}, "m", "6 [    dravik|" + file32 + "|0000] m"},
+    };
+    takeSystemLog();
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        const tDebugLocation location = row.location;
+        zvsdbg_line(row.level, &location, "%s", row.message.c_str());
+        const std::vector<std::string> log = takeSystemLog();
+        EXPECT_EQ(row.line.empty() ? std::vector<std::string>{} : std::vector{row.line}, log);
+    }
+}
+
+TEST(DebugLine, FieldsStayInTheirBuffer)
+{
+    struct Row {
+        size_t remaining;
+        const char* text;
+        int32_t width;
+        const char* out; // behind one byte that is always there
+    };
+    for (const Row& row :
+         {Row{8, "abc", 0, "_abc"}, Row{8, "abc", 5, "_..abc"}, Row{8, "abc", 2, "_bc"},
+          Row{3, "abc", 0, "_ab"}, Row{4, "ab", 5, "_..."}, Row{3, "ab", 5, "_.."},
+          Row{2, "ab", 9, "_."}, Row{1, "ab", 2, "_"}, Row{0, "ab", 2, ""}, Row{0, "a", 5, ""}}) {
+        SCOPED_TRACE(testing::Message() << row.remaining << " " << row.text << " " << row.width);
+        std::vector<char> buffer(row.remaining + 1, '#'); // nothing behind it
+        buffer[0] = '_';
+        char* const end = write_field(buffer.data() + 1, row.remaining, row.text, row.width, '.');
+        EXPECT_STREQ(row.out, buffer.data());
+        EXPECT_EQ(buffer.data() + std::strlen(row.out), end);
     }
 }
 
