@@ -1,11 +1,18 @@
-// The tuning parameters: defaults, bounds, and the limits from the host.
+// The tuning parameters, and the document and the file that carry them.
 
+#include "support/systemLog.h"
 #include "support/tFakeHost.h"
 #include "zverr/Exception.h"
 
+#include <algorithm>
+#include <clocale>
 #include <cmath>
+#include <cstdlib>
+#include <fstream>
 #include <gtest/gtest.h>
 #include <limits>
+#include <random>
+#include <unistd.h>
 
 namespace {
 
@@ -100,6 +107,226 @@ TEST(Parameters, HostLimitsAreMultipliedByAPartPerBillion)
     iServoConfig& config = host.open().config();
     EXPECT_EQ(0x1.c4a524d6e8c95p-14, config.getMaxFrequencyOffset());
     EXPECT_EQ(-0x1.e5dc1afc0d5fdp-14, config.getMinFrequencyOffset());
+}
+
+// The values of the document in force, in its order.
+std::string valuesOf(tFakeHost& host)
+{
+    char buffer[512] = {};
+    EXPECT_EQ(0, zvckmservo_readServoConfigJson(&host.table, buffer, sizeof buffer - 1,
+                                                &host.status.record));
+    std::string values;
+    const std::string text = buffer;
+    for (size_t at = text.find(":\t"); at != std::string::npos; at = text.find(":\t", at + 1)) {
+        values += text.substr(at + 2, text.find_first_of(",\n", at) - at - 2) + " ";
+    }
+    return values;
+}
+
+TEST(Document, IsGivenOutWholeOrCutToTheBuffer)
+{
+    const std::string text =
+        "{\n\t\"frequencyLockGain\":\t1,\n\t\"phaseLockGain\":\t0.55,\n"
+        "\t\"phaseLockCoefficientA\":\t2,\n\t\"phaseLockCoefficientB\":\t1,\n"
+        "\t\"phaseLockCoefficientC\":\t1,\n\t\"snapTimeThreshold\":\t1e-06,\n"
+        "\t\"spikeFilterEnabled\":\t0,\n\t\"spikeFilterHistorySize\":\t5,\n"
+        "\t\"spikeFilterMaxThreshold\":\t1,\n\t\"spikeFilterMinThreshold\":\t2.5e-08,\n"
+        "\t\"spikeFilterGrowthFactor\":\t3\n}";
+    tFakeHost host;
+    host.open();
+    zverr_Status* const status = &host.status.record;
+    for (const size_t size : {text.size() + 5, text.size(), text.size() - 1, size_t{1}}) {
+        std::string buffer(size, '#');
+        EXPECT_EQ(0, zvckmservo_readServoConfigJson(&host.table, buffer.data(), size, status));
+        const size_t copied = std::min(size, text.size());
+        EXPECT_EQ(text.substr(0, copied) + std::string(size - copied, '#'), buffer);
+    }
+    EXPECT_EQ(0, zvckmservo_readServoConfigJson(&host.table, nullptr, 0, status));
+    EXPECT_EQ(0, host.code());
+}
+
+TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
+{
+    const std::string defaults = "1 0.55 2 1 1 1e-06 0 5 1 2.5e-08 3 ";
+    struct Row {
+        const char* name;
+        std::string text;
+        const char* refusal; // what the payload says behind the constant; "": none
+        std::string values;
+    };
+    const Row rows[] = {
+        {"nothing", "{}", "", defaults},
+        {"no object", "[1]", "", defaults},
+        {"all",
+         R"({"frequencyLockGain":2,"phaseLockGain":3,"phaseLockCoefficientA":4,)"
+         R"("phaseLockCoefficientB":5,"phaseLockCoefficientC":6,"snapTimeThreshold":7,)"
+         R"("spikeFilterEnabled":1,"spikeFilterHistorySize":8,"spikeFilterMaxThreshold":9,)"
+         R"("spikeFilterMinThreshold":1.5,"spikeFilterGrowthFactor":10} behind)",
+         "", "2 3 4 5 6 7 1 8 9 1.5 10 "},
+        {"any case, others ignored", R"({"x":{},"SNAPTIMETHRESHOLD":0.001})", "",
+         "1 0.55 2 1 1 0.001 0 5 1 2.5e-08 3 "},
+        {"first match", R"({"PhaseLockGain":2,"phaseLockGain":3})", "",
+         "1 2 2 1 1 1e-06 0 5 1 2.5e-08 3 "},
+        {"first match is bad", R"({"PhaseLockGain":"","phaseLockGain":3})",
+         R"("dravik/tJsonConfig","line":86)", defaults},
+        {"out of bounds", R"({"phaseLockCoefficientA":9,"phaseLockGain":11,"frequencyLockGain":2})",
+         R"("dravik/tServo","line":98)", "2 0.55 2 1 1 1e-06 0 5 1 2.5e-08 3 "},
+        {"flag cut", R"({"spikeFilterEnabled":1.9,"spikeFilterHistorySize":7.9})", "",
+         "1 0.55 2 1 1 1e-06 1 7 1 2.5e-08 3 "},
+        {"flag too large", R"({"spikeFilterEnabled":1e999})", "", defaults},
+        {"flag of two", R"({"spikeFilterEnabled":2})", "", defaults},
+        {"flag below one", R"({"spikeFilterEnabled":0.9999999999999999})", "", defaults},
+        {"flag in words", R"({"spikeFilterEnabled":true})", R"("dravik/tJsonConfig","line":61)",
+         defaults},
+        {"size cut to 100", R"({"spikeFilterHistorySize":100.99})", "",
+         "1 0.55 2 1 1 1e-06 0 100 1 2.5e-08 3 "},
+        {"size below 2", R"({"spikeFilterHistorySize":1.9999})", R"("dravik/tServo","line":235)",
+         defaults},
+        {"size below 0", R"({"spikeFilterHistorySize":-1})", R"("dravik/tServo","line":235)",
+         defaults},
+        {"null", R"({"phaseLockGain":null})", R"("dravik/tJsonConfig","line":86)", defaults},
+        {"infinite", R"({"phaseLockGain":1e999})", R"("dravik/tServo","line":98)", defaults},
+        {"no JSON at the end", R"({"phaseLockGain":2)", R"("dravik/tJsonConfig","line":29)",
+         defaults},
+        {"nested to the limit", R"({"x":)" + std::string(999, '[') + std::string(999, ']') + "}",
+         "", defaults},
+        {"nested too deep", R"({"x":)" + std::string(1000, '[') + std::string(1000, ']') + "}",
+         R"("dravik/tJsonConfig","line":29)", defaults},
+    };
+    for (const char* locale : {"C", "de_DE.UTF-8"}) {
+        ASSERT_NE(nullptr, std::setlocale(LC_ALL, locale));
+        for (const Row& row : rows) {
+            SCOPED_TRACE(testing::Message() << locale << ": " << row.name);
+            tFakeHost host;
+            host.open();
+            const bool refused = *row.refusal != 0;
+            EXPECT_EQ(refused ? 1 : 0, zvckmservo_writeServoConfigJson(
+                                           &host.table, row.text.c_str(), &host.status.record));
+            EXPECT_EQ(refused ? R"({"error_constant":"zvplaterr_invalidParameter","file":)" +
+                                    std::string(row.refusal) + R"(,"component":"dravik"})"
+                              : "(none)",
+                      host.status.text());
+            EXPECT_EQ(refused ? -52005 : 0, host.code());
+            host.status.reset();
+            EXPECT_EQ(row.values, valuesOf(host));
+        }
+    }
+    (void)std::setlocale(LC_ALL, "C");
+    tFakeHost host;
+    host.open();
+    EXPECT_EQ(1, zvckmservo_writeServoConfigJson(&host.table, nullptr, &host.status.record));
+    EXPECT_EQ(R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
+              R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
+              R"("std_exception_what":"no configuration text"})",
+              host.status.text());
+}
+
+// DRAVIK_ROUND_TRIPS in the environment makes it as long as one likes.
+TEST(Document, ReadsBackAsTheVerySameNumbers)
+{
+    const char* const asked = std::getenv("DRAVIK_ROUND_TRIPS");
+    const long rounds = asked != nullptr ? std::atol(asked) : 5000;
+    using tSetter = void (iServoConfig::*)(double);
+    struct Row {
+        tSetter set;
+        double lowest, highest;
+    };
+    const Row rows[] = {
+        {&iServoConfig::setFrequencyLockGain, 1e-9, 10},
+        {&iServoConfig::setPhaseLockGain, 1e-9, 10},
+        {&iServoConfig::setPhaseLockCoefficientA, -10, 10},
+        {&iServoConfig::setPhaseLockCoefficientB, -10, 10},
+        {&iServoConfig::setPhaseLockCoefficientC, -10, 10},
+        {&iServoConfig::setSnapTimeThreshold, 1e-8, 10},
+        {&iServoConfig::setSpikeFilterMaxThreshold, 1e-9, 10},
+        {&iServoConfig::setSpikeFilterMinThreshold, 1e-9, 10},
+        {&iServoConfig::setSpikeFilterGrowthFactor, 1.001, 100},
+    };
+    const auto all = [](const iServoConfig& c) {
+        return std::vector<double>{c.getFrequencyLockGain(),       c.getPhaseLockGain(),
+                                   c.getPhaseLockCoefficientA(),   c.getPhaseLockCoefficientB(),
+                                   c.getPhaseLockCoefficientC(),   c.getSnapTimeThreshold(),
+                                   c.getSpikeFilterMaxThreshold(), c.getSpikeFilterMinThreshold(),
+                                   c.getSpikeFilterGrowthFactor()};
+    };
+    tFakeHost first;
+    tFakeHost second;
+    iServoConfig& from = first.open().config();
+    iServoConfig& to = second.open().config();
+    std::mt19937_64 random(1);
+    for (const char* locale : {"C", "de_DE.UTF-8"}) {
+        ASSERT_NE(nullptr, std::setlocale(LC_ALL, locale));
+        for (long round = 0; round < rounds; ++round) {
+            for (const Row& row : rows) {
+                const double share = static_cast<double>(random()) * 0x1p-64;
+                const bool small = random() % 2 == 0 && row.lowest > 0; // all magnitudes alike
+                (from.*
+                 row.set)(std::clamp(small ? row.lowest * std::pow(row.highest / row.lowest, share)
+                                           : row.lowest + (row.highest - row.lowest) * share,
+                                     row.lowest, row.highest));
+            }
+            const std::string text = from.readServoConfigJson();
+            to.writeServoConfigJson(text);
+            ASSERT_EQ(all(from), all(to)) << text;
+        }
+    }
+    (void)std::setlocale(LC_ALL, "C");
+}
+
+// A file of its own that ends with the scope.
+struct tScratchFile {
+    explicit tScratchFile(const std::string& text)
+        : path(testing::TempDir() + "dravik_" + std::to_string(getpid()) + "_%s.json")
+    {
+        std::ofstream(path) << text;
+    }
+    ~tScratchFile() { (void)std::remove(path.c_str()); }
+    std::string path;
+};
+
+TEST(ConfigFile, IsJoinedToOneLineAndApplied)
+{
+    struct Row {
+        std::string text;
+        int32_t code;
+        const char* growthFactor;
+    };
+    const Row rows[] = {
+        {"{\n\"spikeFilterGrowthFactor\"\n:1\n2}\n", 0, "12 "},
+        {"{\r\n\"spikeFilterGrowthFactor\":\r\n7}", 0, "7 "},
+        {"{\"spikeFilterGrowthFactor\":1\r\n2}", -52005, "3 "},
+        {std::string("{\"spikeFilterGrowthFactor\":4}\0{", 33), 0, "4 "},
+        {"{\"spikeFilterGrowthFactor\":1}", -52005, "3 "},
+        {"", -52005, "3 "},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.text);
+        const tScratchFile file(row.text);
+        tFakeHost host;
+        tOpenServo& servo = host.open();
+        takeSystemLog();
+        const std::string refusal = refusalOf([&] { servo.readConfigFile(file.path); });
+        EXPECT_EQ(row.code == 0 ? "" : "-52005", refusal.substr(0, refusal.find(' ')));
+        EXPECT_EQ(
+            std::vector<std::string>{
+                "6 [    dravik|                   dravik/tServo|0434] Reading servo "
+                "configuration from: " +
+                file.path + "\n"},
+            takeSystemLog());
+        const std::string values = valuesOf(host);
+        EXPECT_EQ(row.growthFactor, values.substr(values.rfind(' ', values.size() - 2) + 1));
+    }
+    tFakeHost host;
+    tOpenServo& servo = host.open();
+    EXPECT_EQ("", refusalOf([&] { servo.readConfigFile("/none/%n"); }));
+    EXPECT_EQ(
+        std::vector<std::string>{"6 [    dravik|                   dravik/tServo|0444] Unable "
+                                 "to read configuration from: /none/%n\n"},
+        takeSystemLog());
+    EXPECT_EQ(refusalOf([&] { servo.writeServoConfigJson(""); }),
+              refusalOf([&] { servo.readConfigFile("/"); }))
+        << "a folder opens, and has no text";
+    EXPECT_EQ(1U, takeSystemLog().size());
 }
 
 } // namespace

@@ -34,6 +34,10 @@ public:
 
     std::string readServoConfigJson() override;
     void writeServoConfigJson(const std::string& json) override;
+    // Applies the document in a file, read under the lock. A file that cannot be opened is told in
+    // the system log and changes nothing.
+    virtual void readConfigFile(const std::string& path);
+    // Loads the default document of the selected time reference's type, once per change of type.
     void applyMetaData(const std::string& metaDataJson);
 
 protected:

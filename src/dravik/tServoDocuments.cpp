@@ -1,24 +1,98 @@
+#include "dravik/tJsonConfig.h"
 #include "dravik/tServo.h"
+#include "dravik/timeReferenceMetaData.h"
+#include "zvsdbg/debugLine.h"
 
-#include <stdexcept>
+#include <fstream>
 
-// The three operations on JSON text. They report a failure rather than seem to succeed.
+// The configuration document, in and out, and the file that one is loaded from. It is one JSON
+// object of numbers, the flag included; the order below is the order in which a document is applied
+// and given out. Every operation holds the lock from end to end.
 
 namespace zvckmDravik {
 
+namespace {
+
+constexpr int32_t kAlwaysWritten = 0x2000;
+constexpr tDebugLocation kAtReading = {"dravik/tServo", 434, "\n"};
+constexpr tDebugLocation kAtUnableToRead = {"dravik/tServo", 444, "\n"};
+
+// All lines of a file as one, without their line feeds. A file that cannot be read to its end gives
+// what was read; exhausted memory is not such an end, and is raised.
+std::string readLines(std::ifstream& file)
+{
+    std::string text;
+    file.exceptions(std::ios::badbit); // getline would keep a bad_alloc to itself
+    try {
+        for (std::string line; std::getline(file, line);) {
+            text += line;
+        }
+    } catch (const std::ios::failure&) { // NOLINT(bugprone-empty-catch): as told above
+    }
+    return text;
+}
+
+} // namespace
+
+// Each value is stored before the next key is looked at; nothing is checked first or rolled back.
+void tServo::writeServoConfigJson(const std::string& json)
+{
+    const tMutexGuard lock(mutex);
+    const tJsonConfig config(json);
+    const auto apply = [&](const char* key, auto get, auto set) {
+        if (config.hasKey(key)) (this->*set)((config.*get)(key));
+    };
+    apply("frequencyLockGain", &tJsonConfig::getDouble, &tServo::setFrequencyLockGain);
+    apply("phaseLockGain", &tJsonConfig::getDouble, &tServo::setPhaseLockGain);
+    apply("phaseLockCoefficientA", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientA);
+    apply("phaseLockCoefficientB", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientB);
+    apply("phaseLockCoefficientC", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientC);
+    apply("snapTimeThreshold", &tJsonConfig::getDouble, &tServo::setSnapTimeThreshold);
+    apply("spikeFilterEnabled", &tJsonConfig::getBool, &tServo::setSpikeFilterEnabled);
+    apply("spikeFilterHistorySize", &tJsonConfig::getInteger, &tServo::setSpikeFilterHistorySize);
+    apply("spikeFilterMaxThreshold", &tJsonConfig::getDouble, &tServo::setSpikeFilterMaxThreshold);
+    apply("spikeFilterMinThreshold", &tJsonConfig::getDouble, &tServo::setSpikeFilterMinThreshold);
+    apply("spikeFilterGrowthFactor", &tJsonConfig::getDouble, &tServo::setSpikeFilterGrowthFactor);
+}
+
 std::string tServo::readServoConfigJson()
 {
-    throw std::logic_error("no JSON text is taken or given yet");
+    const tMutexGuard lock(mutex);
+    tJsonConfig config;
+    config.setDouble("frequencyLockGain", frequencyLockGain);
+    config.setDouble("phaseLockGain", phaseLockGain);
+    config.setDouble("phaseLockCoefficientA", phaseLockCoefficientA);
+    config.setDouble("phaseLockCoefficientB", phaseLockCoefficientB);
+    config.setDouble("phaseLockCoefficientC", phaseLockCoefficientC);
+    config.setDouble("snapTimeThreshold", snapTimeThreshold);
+    config.setBool("spikeFilterEnabled", spikeFilterEnabled);
+    config.setInteger("spikeFilterHistorySize", spikeFilterHistorySize);
+    config.setDouble("spikeFilterMaxThreshold", spikeFilterMaxThreshold);
+    config.setDouble("spikeFilterMinThreshold", spikeFilterMinThreshold);
+    config.setDouble("spikeFilterGrowthFactor", spikeFilterGrowthFactor);
+    return config.toString();
 }
 
-void tServo::writeServoConfigJson(const std::string& /*json*/)
+void tServo::readConfigFile(const std::string& path)
 {
-    throw std::logic_error("no JSON text is taken or given yet");
+    const tMutexGuard lock(mutex);
+    std::ifstream file(path);
+    if (!file.good()) {
+        zvsdbg_line(kAlwaysWritten, &kAtUnableToRead, "Unable to read configuration from: %s",
+                    path.c_str());
+        return;
+    }
+    const std::string text = readLines(file);
+    zvsdbg_line(kAlwaysWritten, &kAtReading, "Reading servo configuration from: %s", path.c_str());
+    writeServoConfigJson(text);
 }
 
-void tServo::applyMetaData(const std::string& /*metaDataJson*/)
+void tServo::applyMetaData(const std::string& metaDataJson)
 {
-    throw std::logic_error("no JSON text is taken or given yet");
+    const tMutexGuard lock(mutex);
+    const std::string type = getSelectedTimeReferenceType(metaDataJson);
+    if (type == timeReferenceType) return;
+    timeReferenceType = type; // whatever becomes of the file
 }
 
 } // namespace zvckmDravik

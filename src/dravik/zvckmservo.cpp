@@ -3,6 +3,8 @@
 #include "dravik/tServo.h"
 #include "zverr/tools/exception_errStatus.h"
 
+#include <stdexcept>
+
 // The boundary. Each function checks the status that came in, calls one operation of the servo and
 // turns whatever is thrown into the status; nothing else happens here.
 
@@ -74,6 +76,7 @@ int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host, const char* conf
 {
     if (status->code < 0) return 1;
     try {
+        if (configJson == nullptr) throw std::logic_error("no configuration text");
         servoOf(host).writeServoConfigJson(configJson);
     } catch (...) {
         zverr_exceptionToStatus(status);
@@ -96,7 +99,7 @@ int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, char* buffer, siz
 void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
                               zverr_Status* status)
 {
-    if (status->code < 0) return;
+    if (status->code < 0 || metaDataJson == nullptr) return;
     try {
         servoOf(host).applyMetaData(metaDataJson);
     } catch (...) {

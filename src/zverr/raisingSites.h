@@ -39,6 +39,11 @@ constexpr zverr_RaisingSite invalidParameterAt(const char* file, uint32_t line)
     return {zvplaterr_invalidParameter, "zvplaterr_invalidParameter", {file, line, kComponent}};
 }
 
+constexpr zverr_RaisingSite resourceNotFoundAt(const char* file, uint32_t line)
+{
+    return {zvplaterr_resourceNotFound, "zvplaterr_resourceNotFound", {file, line, kComponent}};
+}
+
 // The bridge, by the exception that it met.
 constexpr const char* kBridgeFile = "zverr/tools/exception_errStatus";
 constexpr auto kAtBadAlloc = memoryFullAt(kBridgeFile, 62);
@@ -60,6 +65,27 @@ constexpr auto kAtAllocator = memoryFullAt("zvktl/err/Allocator", 32);
 // The dynamic loader.
 constexpr auto kAtLoad = invalidParameterAt("zvdynlib/dynload", 110);
 constexpr auto kAtSymbol = invalidParameterAt("zvdynlib/dynload", 185);
+
+// The accessor of the configuration document.
+constexpr const char* kJsonConfigFile = "dravik/tJsonConfig";
+constexpr auto kAtNewDocument = memoryFullAt(kJsonConfigFile, 16);
+constexpr auto kAtParseDocument = invalidParameterAt(kJsonConfigFile, 29);
+constexpr auto kAtNoInteger = resourceNotFoundAt(kJsonConfigFile, 56);
+constexpr auto kAtBadInteger = invalidParameterAt(kJsonConfigFile, 61);
+constexpr auto kAtNoDouble = resourceNotFoundAt(kJsonConfigFile, 81);
+constexpr auto kAtBadDouble = invalidParameterAt(kJsonConfigFile, 86);
+constexpr auto kAtSetInteger = invalidParameterAt(kJsonConfigFile, 110);
+constexpr auto kAtSetDouble = invalidParameterAt(kJsonConfigFile, 145);
+
+// The helpers for JSON documents. The last one's constant is these very letters.
+constexpr zverr_RaisingSite kAtCppJson = {
+    jsonErrorsInvalidJSON, "jsonErrorsInvalidJSON", {"zvjsonkit/CppJson", 34, kComponent}};
+constexpr zverr_RaisingSite kAtAssertObject = {
+    jsonErrorsNotAnObject, "jsonErrorsNotAnObject", {"zvjsonkit/cJSONUtils", 78, kComponent}};
+constexpr zverr_RaisingSite kAtAssertString = {
+    jsonErrorsTypeMismatch, "jsonErrorsTypeMismatch", {"zvjsonkit/cJSONUtils", 305, kComponent}};
+constexpr zverr_RaisingSite kAtGetOptionalString = {
+    jsonErrorsTypeMismatch, "errCode", {"zvsynctools_cjson/jsonHelperFunctions", 50, kComponent}};
 
 // The setters of the tuning parameters.
 constexpr const char* kServoFile = "dravik/tServo";
