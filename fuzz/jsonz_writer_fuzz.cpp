@@ -2,8 +2,7 @@
 // far. What was written parses at every step and reads back the same.
 
 #include "require.h"
-#include "zverr/errStatus.h"
-#include "zverr/jsonz.h"
+#include "tExactStatus.h"
 #include "zverr/jsonzLookup.h"
 #include "zverr/jsonzString.h"
 #include "zverr/payload.h"
@@ -16,20 +15,6 @@
 
 namespace {
 
-uint32_t largestBuffer;
-
-// A host's own: exactly what is asked, in a fresh allocation.
-bool exactReallocJson(zverr_Status* status, uint32_t size)
-{
-    if (size > largestBuffer) return false;
-    char* const buffer = new char[size];
-    jsonz_formatBuffer(buffer, size, status->json != nullptr ? status->json : "{}");
-    delete[] status->json;
-    status->json = buffer;
-    status->capacity = size;
-    return true;
-}
-
 struct tMember {
     std::string key;
     bool isString;
@@ -40,13 +25,11 @@ struct tMember {
 
 constexpr const char* kObjectKey = "o";
 
-void readBack(const zverr_Status& status, const std::vector<tMember>& members)
+void readBack(const tExactStatus& status, const std::vector<tMember>& members)
 {
     const char* const last = status.json + std::strlen(status.json) - 1;
     REQUIRE(jsonz_closingBracket(status.json) == last);
-    REQUIRE(status.json[status.capacity - 1] == kJsonzEndMark);
-    REQUIRE(std::all_of(last + 1, static_cast<const char*>(status.json) + status.capacity - 1,
-                        [](char c) { return c == 0; }));
+    status.requireForm();
     const char* const object = jsonz_findMember(status.json, kObjectKey);
     for (auto at = members.begin(); at != members.end(); ++at) {
         const tMember& member = *at;
@@ -72,8 +55,7 @@ void readBack(const zverr_Status& status, const std::vector<tMember>& members)
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
 {
     FuzzedDataProvider input(data, size);
-    largestBuffer = input.ConsumeIntegralInRange<uint32_t>(4, 4096);
-    zverr_Status status = {0, 0, exactReallocJson, nullptr};
+    tExactStatus status(input.ConsumeIntegralInRange<uint32_t>(4, 4096));
     const jsonz_Grower grower = {[](char* position, void* context) {
                                      return zverr_growJson(position,
                                                            static_cast<zverr_Status*>(context));
@@ -122,6 +104,5 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size)
         readBack(status, members);
     }
     if (status.json != nullptr) readBack(status, members);
-    delete[] status.json;
     return 0;
 }
