@@ -295,7 +295,7 @@ TEST(ConfigFile, IsJoinedToOneLineAndApplied)
         {"{\n\"spikeFilterGrowthFactor\"\n:1\n2}\n", 0, "12 "},
         {"{\r\n\"spikeFilterGrowthFactor\":\r\n7}", 0, "7 "},
         {"{\"spikeFilterGrowthFactor\":1\r\n2}", -52005, "3 "},
-        {std::string("{\"spikeFilterGrowthFactor\":4}\0{", 33), 0, "4 "},
+        {std::string("{\"spikeFilterGrowthFactor\":4}\0{", 31), 0, "4 "},
         {"{\"spikeFilterGrowthFactor\":1}", -52005, "3 "},
         {"", -52005, "3 "},
     };

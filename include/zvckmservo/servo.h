@@ -145,25 +145,61 @@ ZVCKMSERVO_API void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t r
 ZVCKMSERVO_API void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* time,
                                        zverr_Status* status);
 
-/* Sets parameters from a JSON document.
- *   configJson  the document, zero-terminated; borrowed for the call; not null
- * Returns: 0 on success, 1 on failure or if the status was negative on entry.
- * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
+/* Sets parameters from a configuration document: one JSON object of numbers, any of
+ *
+ *     key                       bounds, inclusive    default  what it is
+ *     "frequencyLockGain"       1e-9 to 10           1        share of the measured rate corrected
+ *     "phaseLockGain"           1e-9 to 10           0.55     the control law:
+ *     "phaseLockCoefficientA"   -10 to 10            2          weight of this pair's error
+ *     "phaseLockCoefficientB"   -10 to 10            1          weight of the last pair's error
+ *     "phaseLockCoefficientC"   -10 to 10            1          weight of the frequency in force
+ *     "snapTimeThreshold"       1e-8 to 10           1e-6     seconds; an error as large is stepped
+ *     "spikeFilterEnabled"      1, or anything else  0        1 turns the filter on
+ *     "spikeFilterHistorySize"  2 to 100             5        pairs that it looks back
+ *     "spikeFilterMaxThreshold" 1e-9 to 10           1        seconds per second: its limit's ...
+ *     "spikeFilterMinThreshold" 1e-9 to 10           2.5e-8     ... highest and lowest value
+ *     "spikeFilterGrowthFactor" 1.001 to 100         3        limit over the mean of the past
+ *
+ * Values are applied in this order, whatever their order in the text; a key that is missing leaves
+ * its parameter alone, and other members are ignored. Keys are found without regard to case (as the
+ * process's LC_CTYPE folds it), the first match counts, and so does a key up to an escaped zero.
+ * Flag and size are cut toward zero first. Text behind the object is ignored, and a text that is
+ * JSON but no object sets nothing. configJson  the document, zero-terminated; borrowed for the
+ * call. Null fails with zvplaterr_softwareFaultPLATInternalUseOnly Returns: 0 on success, 1 on
+ * failure or if the status was negative on entry. Errors:  zvplaterr_invalidParameter for text that
+ * is not JSON (or nested deeper than 1000 levels, or no memory to parse it), and then nothing is
+ * set; for a value that is no number or out of its bounds, and then what stands above it in the
+ * order is set and the rest is not. */
 ZVCKMSERVO_API int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host,
                                                    const char* configJson, zverr_Status* status);
 
-/* Gives the parameters in force as a JSON document.
- *   buffer      out: the first bufferSize characters of the document, without a terminating zero;
- *               null only if bufferSize is 0; untouched on failure
+/* Gives the parameters in force as a configuration document: all eleven keys in the order above, a
+ * line each, numbers with a decimal point whatever the locale, long enough to read back as the very
+ * same double. Less than 1024 characters.
+ *   buffer      out: the first bufferSize characters of the document, without a terminating zero:
+ *               give a zeroed one, larger than the text; null only if bufferSize is 0; untouched on
+ *               failure
  *   bufferSize  bytes in buffer; a longer document is cut without an error
  * Returns: 0 on success, 1 on failure or if the status was negative on entry.
- * Not given yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and writes nothing. */
+ * Errors:  zvplaterr_memoryFull, or zvplaterr_softwareFaultPLATInternalUseOnly for no memory to
+ *          print it. */
 ZVCKMSERVO_API int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, char* buffer,
                                                   size_t bufferSize, zverr_Status* status);
 
-/* Takes metadata of the selected time reference.
- *   metaDataJson  the metadata, zero-terminated; borrowed for the call; not null
- * Not taken yet: fails with zvplaterr_softwareFaultPLATInternalUseOnly and changes nothing. */
+/* Takes metadata of the selected time reference and, if its type is another than the one told last,
+ * applies the default document of that type, if there is one:
+ *
+ *     {"selectedTRInstID": "a", "TRs": {"a": {"type": "IEEE 1588-2008 BC"}}}
+ *
+ * Keys, the identifier ("a" here) included, are found without regard to case; types are compared
+ * exactly. Whatever is missing, null for a text included, means no type. Documents are there for
+ * "IEEE 802.1AS-2011 TAB" and "IEEE 1588-2008 BC", in files whose places are settled when the
+ * library is loaded. A file that cannot be opened is told in the system log (LOG_INFO) and is no
+ * failure. A type counts as told even if its file fails, and is then not tried again.
+ *   metaDataJson  the metadata, zero-terminated; borrowed for the call; null does nothing
+ * Errors:  jsonErrorsInvalidJSON for text that is not JSON; jsonErrorsNotAnObject and
+ *          jsonErrorsTypeMismatch (one code) for a member of another type; both leave the type told
+ *          last as it was. A document in a file fails as in zvckmservo_writeServoConfigJson. */
 ZVCKMSERVO_API void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
                                              zverr_Status* status);
 

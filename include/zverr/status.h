@@ -66,7 +66,7 @@ struct zverr_Status {
  * Details never change an outcome: what there is no room for is left out from that member on, and
  * the code stands. A failure of a host operation keeps the payload that the host gave it. */
 
-/* The codes that the plug-in raises, now or in a later minor version. Two failures of the same kind
+/* The codes that the plug-in raises. Two failures of the same kind
  * share a code. */
 enum {
     zvplaterr_memoryFull = -52000,                       /* the allocator is exhausted */
