@@ -225,7 +225,7 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
 TEST(Document, ReadsBackAsTheVerySameNumbers)
 {
     const char* const asked = std::getenv("DRAVIK_ROUND_TRIPS");
-    const long rounds = asked != nullptr ? std::atol(asked) : 5000;
+    const long rounds = asked != nullptr ? std::strtol(asked, nullptr, 10) : 5000;
     using tSetter = void (iServoConfig::*)(double);
     struct Row {
         tSetter set;
@@ -327,6 +327,64 @@ TEST(ConfigFile, IsJoinedToOneLineAndApplied)
               refusalOf([&] { servo.readConfigFile("/"); }))
         << "a folder opens, and has no text";
     EXPECT_EQ(1U, takeSystemLog().size());
+}
+
+// Notes which files it is told to load.
+struct tLoadingServo : tOpenServo {
+    using tOpenServo::tOpenServo;
+    void readConfigFile(const std::string& path) override
+    {
+        loaded = path.substr(path.rfind('/') + 1);
+        if (fails) throw std::runtime_error("unusable");
+    }
+    std::string loaded;
+    bool fails = false;
+};
+
+TEST(MetaData, LoadsTheDefaultFileOncePerChangeOfType)
+{
+    const std::string tab = "IEEE 802.1AS-2011 TAB";
+    const std::string bc = "IEEE 1588-2008 BC";
+    struct Row {
+        const char* name;
+        std::string type; // "-": metadata that is refused
+        const char* loaded;
+        bool fails = false;
+    };
+    const Row rows[] = {
+        {"none at first", "", ""},
+        {"new", bc, "dravik_tr_ptp4l_bc.json"},
+        {"the same", bc, ""},
+        {"another", tab, "dravik_tr_ptp4l_tab.json"},
+        {"refused", "-", ""},
+        {"still the same", tab, ""},
+        {"unknown is remembered", "ieee 1588-2008 bc", ""},
+        {"back again", tab, "dravik_tr_ptp4l_tab.json"},
+        {"none is remembered", "", ""},
+        {"a failing file", tab, "dravik_tr_ptp4l_tab.json", true},
+        {"is not tried again", tab, "", true},
+    };
+    tFakeHost host;
+    auto* const servo = new tLoadingServo(&host.table);
+    host.table.servoHandle = static_cast<zvckmDravik::tServo*>(servo);
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        const std::string metaData =
+            R"({"selectedTRInstID":"a","TRs":{"A":{"type":")" + row.type + R"("}}})";
+        servo->loaded = "";
+        servo->fails = row.fails;
+        host.status.reset();
+        zvckmservo_applyMetaData(&host.table, row.type == "-" ? "{" : metaData.c_str(),
+                                 &host.status.record);
+        EXPECT_EQ(row.loaded, servo->loaded);
+        EXPECT_EQ(row.type == "-"                       ? -52005
+                  : !servo->loaded.empty() && row.fails ? -52003
+                                                        : 0,
+                  host.code());
+    }
+    host.status.reset();
+    zvckmservo_applyMetaData(&host.table, nullptr, &host.status.record);
+    EXPECT_EQ(0, host.code());
 }
 
 } // namespace

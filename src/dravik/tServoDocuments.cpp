@@ -1,3 +1,4 @@
+#include "dravik/defaultConfigFiles.h"
 #include "dravik/tJsonConfig.h"
 #include "dravik/tServo.h"
 #include "dravik/timeReferenceMetaData.h"
@@ -93,6 +94,8 @@ void tServo::applyMetaData(const std::string& metaDataJson)
     const std::string type = getSelectedTimeReferenceType(metaDataJson);
     if (type == timeReferenceType) return;
     timeReferenceType = type; // whatever becomes of the file
+    const auto file = defaultConfigFiles.find(type);
+    if (file != defaultConfigFiles.end()) readConfigFile(file->second);
 }
 
 } // namespace zvckmDravik

@@ -66,6 +66,12 @@ constexpr auto kAtAllocator = memoryFullAt("zvktl/err/Allocator", 32);
 constexpr auto kAtLoad = invalidParameterAt("zvdynlib/dynload", 110);
 constexpr auto kAtSymbol = invalidParameterAt("zvdynlib/dynload", 185);
 
+// The reader of whole files.
+constexpr const char* kStdpathUtilFile = "zvhostq/stdpath_util";
+constexpr auto kAtOpenFile = resourceNotFoundAt(kStdpathUtilFile, 224);
+constexpr zverr_RaisingSite kAtReadFile = {
+    zvplaterr_osFault, "zvplaterr_osFault", {kStdpathUtilFile, 249, kComponent}};
+
 // The accessor of the configuration document.
 constexpr const char* kJsonConfigFile = "dravik/tJsonConfig";
 constexpr auto kAtNewDocument = memoryFullAt(kJsonConfigFile, 16);

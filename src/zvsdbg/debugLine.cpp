@@ -76,6 +76,7 @@ void writeToSyslog(const char* text) { syslog(kPriority, "%s", text); }
 
 } // namespace
 
+// NOLINTNEXTLINE(cert-dcl50-cpp): takes what printf takes, checked by the compiler
 void zvsdbg_line(int32_t level, const tDebugLocation* location, const char* format, ...)
 {
     if (level < kLayout.minimumLevel) return;

@@ -1,0 +1,89 @@
+#include "zvhostq/stdpath_util.h"
+
+#include "zverr/payload.h"
+
+#include <cerrno>
+#include <climits>
+#include <cstdio>
+#include <cstring>
+#include <memory>
+
+namespace zvhostq {
+
+namespace {
+
+struct tFileCloser {
+    void operator()(FILE* file) const { (void)std::fclose(file); }
+};
+using tFile = std::unique_ptr<FILE, tFileCloser>;
+
+void addErrno(zverr_JsonWriter& writer, int error)
+{
+    char buffer[256] = "";
+    const char* const returned = strerror_r(error, buffer, sizeof buffer);
+    const char* const text = buffer[0] != 0 ? buffer : returned;
+    writer.addObject("internal_error").addString("api", "errno").addInt("code", error);
+    if (text != nullptr) writer.addString("string", text);
+    writer.endObject();
+}
+
+void reportNotOpened(const char* filename, int error, zverr_Status* status)
+{
+    zverr_JsonWriter writer = zverr_setFailure(status, zverr::kAtOpenFile);
+    addErrno(writer, error);
+    writer.addObject("zvhostq_debug")
+        .addString("desc", "error opening file")
+        .addString("filename", filename)
+        .endObject();
+}
+
+void reportNotRead(const char* filename, long fileSize, size_t count, zverr_Status* status)
+{
+    const int error = errno;
+    zverr_JsonWriter writer = zverr_setFailure(status, zverr::kAtReadFile);
+    addErrno(writer, error);
+    writer.addObject("zvhostq_debug")
+        .addString("desc", "didn't read full content of file")
+        .addUInt("fileSize", static_cast<uint32_t>(fileSize))
+        .addUInt("fread_return", static_cast<uint32_t>(count))
+        .addString("filename", filename)
+        .endObject();
+}
+
+long sizeOf(FILE* file)
+{
+    (void)std::fseek(file, 0, SEEK_END);
+    const long size = std::ftell(file);
+    std::rewind(file);
+    return size;
+}
+
+void resize(zvktl::err::vector<char>* content, size_t size, zverr_Status* status)
+{
+    if (size > content->size) {
+        content->insert(content->size, size - content->size, 0, status);
+    } else {
+        content->size = size;
+    }
+}
+
+} // namespace
+
+void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zverr_Status* status)
+{
+    const tFile file(std::fopen(filename, "rb"));
+    if (file == nullptr) reportNotOpened(filename, errno, status);
+    if (status->code < 0) return;
+
+    const long fileSize = sizeOf(file.get());
+    // A pipe has no size, and a folder says so or claims the largest there is.
+    if (fileSize < 0 || fileSize == LONG_MAX) return reportNotRead(filename, fileSize, 0, status);
+    const size_t size = static_cast<size_t>(fileSize);
+    resize(content, size + 1, status);
+    if (status->code < 0) return;
+    const size_t count = std::fread(content->data, 1, size, file.get());
+    if (count != size) reportNotRead(filename, fileSize, count, status);
+    content->data[size] = 0;
+}
+
+} // namespace zvhostq
