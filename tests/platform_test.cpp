@@ -8,6 +8,7 @@
 #include "zverr/errStatus.h"
 #include "zverr/jsonzLookup.h"
 #include "zverr/tools/exception_errStatus.h"
+#include "zvhostq/stdpath_util.h"
 #include "zvktl/err/string.h"
 #include "zvktl/err/vector.h"
 #include "zvplat/protons/cppNewDelete/memoryAllocation.h"
@@ -19,12 +20,14 @@
 #include <atomic>
 #include <cstring>
 #include <dlfcn.h>
+#include <fstream>
 #include <functional>
 #include <gtest/gtest.h>
 #include <memory>
 #include <stdexcept>
 #include <string>
 #include <thread>
+#include <unistd.h>
 
 namespace {
 
@@ -467,6 +470,49 @@ TEST(Details, AreAllThatExhaustedMemoryCosts)
         EXPECT_EQ(row.allocations, n - 2);
         EXPECT_EQ(before, allocator::liveBlocks());
     }
+}
+
+TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
+{
+    const std::string path = testing::TempDir() + "dravik_" + std::to_string(getpid());
+    std::ofstream(path) << "abc";
+    struct Row {
+        const char* name;
+        std::string path;
+        int32_t before;
+        std::string content; // "old content" before
+        int32_t code;
+        std::string text;
+    };
+    const Row rows[] = {
+        {"shorter than before", path, 0, std::string("abc\0", 4), 0, "(none)"},
+        {"under a failure", path, -1, "old content", -1, "(none)"},
+        {"missing", "/none", 0, "old content", -52006,
+         R"({"error_constant":"zvplaterr_resourceNotFound","file":"zvhostq/stdpath_util","line":224,)"
+         R"("component":"dravik","internal_error":{"api":"errno","code":2,)"
+         R"("string":"No such file or directory"},)"
+         R"("zvhostq_debug":{"desc":"error opening file","filename":"/none"}})"},
+        {"missing under a failure", "/none", -1, "old content", -1, "(none)"},
+        {"a folder", "/", 0, "old content", -52008,
+         R"({"error_constant":"zvplaterr_osFault","file":"zvhostq/stdpath_util","line":249,)"
+         R"("component":"dravik","internal_error":{"api":"errno","code":75,)"
+         R"("string":"Value too large for defined data type"},)"
+         R"("zvhostq_debug":{"desc":"didn't read full content of file","fileSize":4294967295,)"
+         R"("fread_return":0,"filename":"/"}})"},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        tHostStatus status(row.before);
+        tBytes content;
+        tHostStatus good;
+        content.insert(0, 11, 0, &good.record);
+        std::string("old content").copy(content.data, 11);
+        zvhostq::read_whole_file(row.path.c_str(), &content, &status.record);
+        EXPECT_EQ(row.code, status.code());
+        EXPECT_EQ(row.text, status.text());
+        EXPECT_EQ(row.content, textOf(content));
+    }
+    (void)std::remove(path.c_str());
 }
 
 TEST(DebugLine, KeepsItsFormHoweverLongItsParts)

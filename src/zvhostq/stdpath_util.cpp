@@ -37,9 +37,9 @@ void reportNotOpened(const char* filename, int error, zverr_Status* status)
         .endObject();
 }
 
-void reportNotRead(const char* filename, long fileSize, size_t count, zverr_Status* status)
+void reportNotRead(const char* filename, int error, long fileSize, size_t count,
+                   zverr_Status* status)
 {
-    const int error = errno;
     zverr_JsonWriter writer = zverr_setFailure(status, zverr::kAtReadFile);
     addErrno(writer, error);
     writer.addObject("zvhostq_debug")
@@ -48,14 +48,6 @@ void reportNotRead(const char* filename, long fileSize, size_t count, zverr_Stat
         .addUInt("fread_return", static_cast<uint32_t>(count))
         .addString("filename", filename)
         .endObject();
-}
-
-long sizeOf(FILE* file)
-{
-    (void)std::fseek(file, 0, SEEK_END);
-    const long size = std::ftell(file);
-    std::rewind(file);
-    return size;
 }
 
 void resize(zvktl::err::vector<char>* content, size_t size, zverr_Status* status)
@@ -75,14 +67,19 @@ void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zv
     if (file == nullptr) reportNotOpened(filename, errno, status);
     if (status->code < 0) return;
 
-    const long fileSize = sizeOf(file.get());
-    // A pipe has no size, and a folder says so or claims the largest there is.
-    if (fileSize < 0 || fileSize == LONG_MAX) return reportNotRead(filename, fileSize, 0, status);
+    (void)std::fseek(file.get(), 0, SEEK_END);
+    const long fileSize = std::ftell(file.get());
+    // A pipe has no size; a folder has none either, or one that is too large to be true.
+    if (fileSize < 0 || fileSize == LONG_MAX) {
+        const int error = fileSize < 0 ? errno : EOVERFLOW;
+        return reportNotRead(filename, error, fileSize, 0, status);
+    }
+    std::rewind(file.get());
     const size_t size = static_cast<size_t>(fileSize);
     resize(content, size + 1, status);
     if (status->code < 0) return;
     const size_t count = std::fread(content->data, 1, size, file.get());
-    if (count != size) reportNotRead(filename, fileSize, count, status);
+    if (count != size) reportNotRead(filename, errno, fileSize, count, status);
     content->data[size] = 0;
 }
 
