@@ -35,6 +35,7 @@ void addCommonOptions(CLI::App& app, tCommonOptions& options, const char* initia
     app.add_option("--csv", options.csv, "Every pair and host call; - is stdout")
         ->type_name("FILE");
     app.add_option("--library", options.library,
-                   "The plug-in; else $DRAVIK_LIBRARY, else\nlibdravik.so.1 beside this program")
+                   "The plug-in; else $DRAVIK_LIBRARY, else\nlibdravik.so.1 beside this program or "
+                   "as installed")
         ->type_name("FILE");
 }

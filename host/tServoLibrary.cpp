@@ -7,12 +7,25 @@
 #include <filesystem>
 #include <stdexcept>
 
+namespace fs = std::filesystem;
+
+namespace {
+
+constexpr const char* kFileName = "libdravik.so.1";
+constexpr const char* kInstalledFolder = "../" DRAVIK_LIBDIR; // seen from the installed program
+
+} // namespace
+
 std::string tServoLibrary::find(const std::string& asked)
 {
     if (!asked.empty()) return asked;
     const char* named = std::getenv("DRAVIK_LIBRARY"); // NOLINT(concurrency-mt-unsafe)
     if (named != nullptr && *named != '\0') return named;
-    return std::filesystem::read_symlink("/proc/self/exe").replace_filename("libdravik.so.1");
+    const fs::path folder = fs::read_symlink("/proc/self/exe").parent_path();
+    for (const fs::path& candidate : {folder / kFileName, folder / kInstalledFolder / kFileName}) {
+        if (fs::exists(candidate)) return candidate;
+    }
+    return kFileName; // wherever the loader finds it
 }
 
 tServoLibrary::tServoLibrary(const std::string& file)

@@ -10,7 +10,7 @@ class tServoLibrary
 {
 public:
     // The file asked for, or else the one named by DRAVIK_LIBRARY, or else libdravik.so.1 beside
-    // this program.
+    // this program, or where it is installed, or where the loader finds it.
     static std::string find(const std::string& asked);
 
     // Throws std::runtime_error if the file cannot be loaded or lacks one of the nine functions.

@@ -1,0 +1,29 @@
+# What an installation has: the library, its two headers, a pkg-config file and a CMake package for
+# hosts, the default documents, and the reference host. All of it follows DESTDIR.
+include(GNUInstallDirs)
+include(CMakePackageConfigHelpers)
+
+# Where the plug-in looks for its default documents in the standard layout. The place is settled by
+# the running system, not by the prefix.
+set(DRAVIK_SERVOS_DIR /usr/lib/arm-linux-gnueabi/zv-chronel/servos CACHE PATH
+    "Directory of the default documents")
+
+set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/dravik)
+
+install(TARGETS dravik EXPORT dravikTargets
+    LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+install(DIRECTORY include/zvckmservo include/zverr DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+install(FILES config/dravik_tr_ptp4l_tab.json config/dravik_tr_ptp4l_bc.json
+    DESTINATION ${DRAVIK_SERVOS_DIR})
+
+install(EXPORT dravikTargets NAMESPACE dravik:: DESTINATION ${package_dir})
+configure_package_config_file(cmake/dravikConfig.cmake.in dravikConfig.cmake
+    INSTALL_DESTINATION ${package_dir})
+write_basic_package_version_file(dravikConfigVersion.cmake COMPATIBILITY SameMajorVersion)
+file(RELATIVE_PATH prefix_from_pkgconfig /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
+configure_file(cmake/dravik.pc.in dravik.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/dravikConfig.cmake ${PROJECT_BINARY_DIR}/dravikConfigVersion.cmake
+    DESTINATION ${package_dir})
+install(FILES ${PROJECT_BINARY_DIR}/dravik.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)

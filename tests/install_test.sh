@@ -1,0 +1,60 @@
+#!/usr/bin/env bash
+# An installation as an integrator has it: its files, and hosts built against nothing else.
+# Usage: install_test.sh BUILD EXAMPLES CC CMAKE READELF
+set -euo pipefail
+build=$1 examples=$2 cc=$3 cmake=$4 readelf=$5
+scratch=$(mktemp -d)
+trap 'rm -rf "$scratch"' EXIT
+failures=0
+
+expect() { # NAME EXPECTED FOUND
+    [ "$2" == "$3" ] && return
+    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
+    failures=$((failures + 1))
+}
+
+root=$scratch/root
+DESTDIR=$root "$cmake" --install "$build" --prefix "$scratch/usr" > /dev/null
+usr=$root$scratch/usr
+libdir=$(dirname "$(find "$usr" -name libdravik.so.1)")
+lib=${libdir#"$usr/"}
+expect "files" "$(sort << END
+$scratch/usr/bin/dravik-host
+$scratch/usr/include/zvckmservo/servo.h
+$scratch/usr/include/zverr/status.h
+$scratch/usr/$lib/cmake/dravik/dravikConfig.cmake
+$scratch/usr/$lib/cmake/dravik/dravikConfigVersion.cmake
+$scratch/usr/$lib/cmake/dravik/dravikTargets.cmake
+$scratch/usr/$lib/libdravik.so
+$scratch/usr/$lib/libdravik.so.1
+$scratch/usr/$lib/libdravik.so.1.0.0
+$scratch/usr/$lib/pkgconfig/dravik.pc
+/usr/lib/arm-linux-gnueabi/zv-chronel/servos/dravik_tr_ptp4l_bc.json
+/usr/lib/arm-linux-gnueabi/zv-chronel/servos/dravik_tr_ptp4l_tab.json
+END
+)" "$(find "$root" -not -type d -not -name 'dravikTargets-*.cmake' | sed "s|^$root||" | sort)"
+expect "soname link" libdravik.so.1.0.0 "$(readlink "$libdir/libdravik.so.1")"
+for file in "$libdir/libdravik.so.1" "$usr/bin/dravik-host"; do
+    expect "run path of ${file##*/}" 0 "$("$readelf" --dynamic "$file" | grep -cE 'RPATH|RUNPATH' || true)"
+done
+expect "the host finds the library" 1 "$(env -u DRAVIK_LIBRARY "$usr/bin/dravik-host" simulate --duration 10s | grep -c '^lock  *after')"
+
+# The example, by pkg-config and by CMake.
+export PKG_CONFIG_PATH=$libdir/pkgconfig
+# shellcheck disable=SC2046  # flags are words
+"$cc" -std=gnu11 -Wall -Wextra -Werror $(pkg-config --cflags dravik) "$examples/minimal_host.c" -o "$scratch/by_pkg_config"
+cat > "$scratch/CMakeLists.txt" << END
+cmake_minimum_required(VERSION 3.25)
+project(example C)
+find_package(dravik 1.0 REQUIRED)
+add_executable(by_cmake $examples/minimal_host.c)
+target_link_libraries(by_cmake PRIVATE dravik::dravik)
+END
+"$cmake" -S "$scratch" -B "$scratch" -D CMAKE_PREFIX_PATH="$usr" -D CMAKE_C_COMPILER="$cc" > /dev/null
+"$cmake" --build "$scratch" > /dev/null
+for host in by_pkg_config by_cmake; do
+    LD_LIBRARY_PATH=$libdir "$scratch/$host" > "$scratch/out"
+    expect "$host: far off at first" "5000000.0" "$(awk 'NR == 1 {print $4}' "$scratch/out")"
+    expect "$host: near in the end" 1 "$(awk 'END {print ($4 < 100 && $4 > -100)}' "$scratch/out")"
+done
+exit $((failures > 0))
