@@ -10,6 +10,11 @@ constexpr double kLimitPpb = 500000.0;
 
 } // namespace
 
+tTextbookController::tTextbookController(double intervalSeconds, double offsetPpb)
+    : proportionalGain(kProportionalGain / intervalSeconds),
+      integralGain(kIntegralGain / intervalSeconds), integral(offsetPpb)
+{}
+
 void tTextbookController::adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime,
                                      uint64_t clockTime, zverr_Status* status)
 {
@@ -19,7 +24,7 @@ void tTextbookController::adjustTime(zvckmservo_HostTable* host, uint64_t refere
 int32_t tTextbookController::nextOffsetPpb(uint64_t referenceTime, uint64_t clockTime)
 {
     const double errorNs = static_cast<double>(static_cast<int64_t>(referenceTime - clockTime));
-    integral = std::clamp(integral + kIntegralGain * errorNs, -kLimitPpb, kLimitPpb);
-    const double offset = kProportionalGain * errorNs + integral;
+    integral = std::clamp(integral + integralGain * errorNs, -kLimitPpb, kLimitPpb);
+    const double offset = proportionalGain * errorNs + integral;
     return static_cast<int32_t>(std::clamp(offset, -kLimitPpb, kLimitPpb));
 }
