@@ -25,17 +25,18 @@ void adjust(tServoHost& host, const tPair& pair, tTrace& trace)
 } // namespace
 
 void discipline(const tServoLibrary& library, iClock& clock, iPairSource& source,
-                const std::string& scenario, const std::string& csvPath)
+                const std::string& scenario, const tCommonOptions& options)
 {
-    tTrace trace(csvPath);
-    tReport report(csvPath == "-");
+    tTrace trace(options.csv);
+    tReport report(options.csv == "-");
     tSummary summary;
     tServoHost host(library, clock);
     tLockObserver observer(clock.minOffsetPpb(), clock.maxOffsetPpb());
 
-    report.print(scenario + "\n");
     trace.addCalls(0, host.calls());
     summary.addCalls(host.calls());
+    tune(host, options.tuning);
+    report.print(scenario + "\n");
     while (const auto pair = source.next()) {
         adjust(host, *pair, trace);
         const tLockEvent event = observer.observe(host.calls());

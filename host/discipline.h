@@ -2,14 +2,14 @@
 
 #include "iClock.h"
 #include "iPairSource.h"
+#include "options.h"
 #include "tServoLibrary.h"
 
 #include <string>
 
-// The loop that every verb shares: hands each pair of the source to the plug-in, which disciplines
-// the clock, and reports what happens. Throws std::runtime_error at the first failure, once all
-// that led to it is in the CSV file.
+// The loop that such verbs share: tunes the servo and hands each pair of the source to the plug-in,
+// which disciplines the clock, and reports what happens. Throws std::runtime_error at the first
+// failure, once all that led to it is in the CSV file.
 //   scenario  one line for people, without its end
-//   csvPath   "" for no file, "-" for stdout
 void discipline(const tServoLibrary& library, iClock& clock, iPairSource& source,
-                const std::string& scenario, const std::string& csvPath);
+                const std::string& scenario, const tCommonOptions& options);

@@ -1,7 +1,9 @@
 // dravik-host: loads the clock servo plug-in as any other host would, and lets it discipline a
-// clock. A verb chooses a clock and a source of pairs; the loop is the same for all.
+// clock. simulate and run choose a clock and a source of pairs, and share the loop; show
+// prints the configuration.
 
 #include "run.h"
+#include "show.h"
 #include "simulate.h"
 
 #include <cstdio>
@@ -13,7 +15,9 @@ enum tExitStatus { kGood = 0, kFailure = 1, kUsage = 2 };
 
 constexpr const char* kFooter =
     "Values have units: ns us ms s min h, ppb ppm, %.\n"
-    "Exit status: 0 good; 1 a failure of the plug-in or of a file; 2 wrong usage.";
+    "Files may be -, the standard input or output.\n"
+    "Exit status: 0 good; 1 a failure of the plug-in or of a file, such as a\n"
+    "refused document; 2 wrong usage.";
 
 std::string errorLine(const CLI::App* /*app*/, const CLI::Error& error)
 {
@@ -28,10 +32,11 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addRun(app)};
+    const tVerb verbs[] = {addSimulate(app), addRun(app), addShow(app)};
     try {
         app.parse(argc, argv);
-        if (app.get_subcommands().empty()) throw CLI::RequiredError("A verb, simulate or run,");
+        if (app.get_subcommands().empty())
+            throw CLI::RequiredError("A verb, simulate, run or show,");
     } catch (const CLI::ParseError& outcome) { // help and version come this way too
         return app.exit(outcome) == 0 ? kGood : kUsage;
     }

@@ -34,7 +34,13 @@ void addCommonOptions(CLI::App& app, tCommonOptions& options, const char* initia
                  "How far its rate can be changed"});
     app.add_option("--csv", options.csv, "Every pair and host call; - is stdout")
         ->type_name("FILE");
-    app.add_option("--library", options.library,
+    addTuningOptions(app, options.tuning);
+    addLibraryOption(app, options.library);
+}
+
+void addLibraryOption(CLI::App& app, std::string& library)
+{
+    app.add_option("--library", library,
                    "The plug-in; else $DRAVIK_LIBRARY, else\nlibdravik.so.1 beside this program or "
                    "as installed")
         ->type_name("FILE");

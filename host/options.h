@@ -1,6 +1,7 @@
 #pragma once
 
 #include "quantity.h"
+#include "tuning.h"
 
 #include <CLI/CLI.hpp>
 
@@ -47,13 +48,17 @@ void addQuantity(CLI::App& app, Number& value, const tQuantityOption& option)
     }
 }
 
-// What every verb has.
+// What every verb that disciplines a clock has.
 struct tCommonOptions {
     int64_t initialOffsetNs = 0;
     double frequencyErrorPpb = 0;
     int32_t maxFrequencyOffsetPpb = 0;
-    std::string csv;
+    std::string csv; // "": none; "-": stdout
+    tTuning tuning;
     std::string library;
 };
 
 void addCommonOptions(CLI::App& app, tCommonOptions& options, const char* initialOffset);
+
+// The name stays empty if the option is not given.
+void addLibraryOption(CLI::App& app, std::string& library);

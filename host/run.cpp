@@ -28,7 +28,7 @@ void run(const tOptions& options)
         fmt::format("run: clock {} and {} off; {}",
                     signedDurationText(static_cast<double>(options.initialOffsetNs)),
                     offsetText(options.frequencyErrorPpb), library.path);
-    discipline(library, clock, source, scenario, options.csv);
+    discipline(library, clock, source, scenario, options);
 }
 
 } // namespace

@@ -70,7 +70,7 @@ void simulate(const tOptions& options)
         fmt::format("simulate: clock {} and {} off, seed {}; {}",
                     signedDurationText(static_cast<double>(options.initialOffsetNs)),
                     offsetText(options.frequencyErrorPpb), options.seed, library.path);
-    discipline(library, clock, source, scenario, options.csv);
+    discipline(library, clock, source, scenario, options);
 }
 
 } // namespace

@@ -109,3 +109,34 @@ void tServoHost::adjustTime(uint64_t referenceNs, uint64_t clockNs)
     library.adjustTime(&table, referenceNs, clockNs, &status);
     status.check("adjustTime");
 }
+
+void tServoHost::writeConfig(const std::string& document)
+{
+    tStatus status;
+    const tCurrentScope scope(subject);
+    library.writeServoConfigJson(&table, document.c_str(), &status);
+    status.check("writeServoConfigJson");
+}
+
+// The plug-in tells no length and cuts without a word: a text that leaves some of its zeros in the
+// buffer is whole.
+std::string tServoHost::readConfig()
+{
+    const tCurrentScope scope(subject);
+    for (size_t size = 1024;; size *= 2) {
+        tStatus status;
+        std::string text(size, '\0');
+        library.readServoConfigJson(&table, text.data(), size, &status);
+        status.check("readServoConfigJson");
+        const size_t length = text.find('\0');
+        if (length != std::string::npos) return text.substr(0, length);
+    }
+}
+
+void tServoHost::applyMetaData(const std::string& metaData)
+{
+    tStatus status;
+    const tCurrentScope scope(subject);
+    library.applyMetaData(&table, metaData.c_str(), &status);
+    status.check("applyMetaData");
+}

@@ -4,6 +4,8 @@
 #include "tHostCall.h"
 #include "tServoLibrary.h"
 
+#include <string>
+
 // One clock under the plug-in's discipline: initialised with the scope, finalised at its end.
 class tServoHost
 {
@@ -17,7 +19,12 @@ public:
     // Throws std::runtime_error with code and payload; the calls made until then are kept.
     void adjustTime(uint64_t referenceNs, uint64_t clockNs);
 
-    // What the plug-in asked of the clock during the last call, or during initialisation.
+    // The texts of the plug-in. Throw std::runtime_error with code and payload.
+    void writeConfig(const std::string& document);
+    std::string readConfig();
+    void applyMetaData(const std::string& metaData);
+
+    // What the plug-in asked of the clock during the last pair, or during initialisation.
     const tHostCalls& calls() const { return subject.calls; }
 
     // What the operations work on, as they are told nothing about it.

@@ -59,11 +59,12 @@ tStatus::tStatus() : zverr_Status{0, 0, hostReallocJson, nullptr} {}
 
 tStatus::~tStatus() { hostReallocJson(this, 0); }
 
+std::string tStatus::details() const { return json != nullptr ? json : "no details"; }
+
 void tStatus::check(const char* what) const
 {
     if (code >= 0) return;
-    throw std::runtime_error(
-        fmt::format("{} failed with {}: {}", what, code, json != nullptr ? json : "no details"));
+    throw std::runtime_error(fmt::format("{} failed with {}: {}", what, code, details()));
 }
 
 void setFailure(zverr_Status* status, int32_t code, const char* message) noexcept

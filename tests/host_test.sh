@@ -3,7 +3,8 @@
 # Usage: host_test.sh FOLDER, with dravik-host and libdravik.so.1 in it
 set -uo pipefail
 host=$1/dravik-host
-include=$(cd "$(dirname "$0")/../include" && pwd)
+root=$(cd "$(dirname "$0")/.." && pwd)
+include=$root/include config=$root/config
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
@@ -35,6 +36,7 @@ table() { # rows of NAME|STATUS|PATTERN|ARGUMENTS on stdin
     done
 }
 
+echo '{"snapTimeThreshold": 10}' > "$scratch/blunt.json"
 bad="simulate --outlier-rate 1% --outlier-size 5us"
 table << END
 frequency measured  |0|^ +1\.000 s  frequency measured: \+12\.0.. ppm off|simulate
@@ -50,13 +52,19 @@ losses counted      |0|lost 2 times|$bad
 out of reach        |0|^ +3\.000 s  frequency at its limit, -500\.000 ppm$|simulate --frequency-error 600ppm
 real time           |0|^pairs       [1-8] in 0\.[0-9]+ s$|run --duration 1s
 version             |0|^dravik-host [0-9]+\.[0-9]+\.[0-9]+$|--version
-help                |0|^Exit status: 0 good; 1 .*; 2 wrong usage|simulate --help
+help                |0|^Exit status: 0 good; 1 .*, such as a$|simulate --help
+tuned before pair 1 |0|^ +2\.000 s  no step needed, error \+1\.012 ms|simulate --config $scratch/blunt.json
+a new servo         |0|"snapTimeThreshold":.1e-06,$|show
+of an unknown type  |0|"snapTimeThreshold":.1e-06,$|show --reference-type none
+tuned               |0|"snapTimeThreshold":.10,$|show --config $scratch/blunt.json
+default, bridges    |0|"spikeFilterEnabled":.1,$|show --config $config/dravik_tr_ptp4l_tab.json
+default, boundary   |0|"spikeFilterEnabled":.1,$|show --config $config/dravik_tr_ptp4l_bc.json
 END
 check "never locked" 0 "^lock        never$" simulate --frequency-error 600ppm
 expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
 
 table << END
-no verb             |2|^dravik-host: A verb, simulate or run, is required|
+no verb             |2|^dravik-host: A verb, simulate, run or show, is required|
 unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 unit of another kind|2|--noise: '1ppm' has an unknown unit 'ppm'|simulate --noise 1ppm
@@ -68,6 +76,11 @@ trailing text       |2|--interval: '1s1' has an unknown unit|run --interval 1s1
 negative seed       |2|--seed: '-1'|simulate --seed -1
 no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
 another library     |1|libm.* has no zvckmservo_initialize|run --library $(ldd "$host" | awk '/libm\.so/ {print $3}')
+no such file        |1|^dravik-host: cannot read $scratch/none: No such|run --config $scratch/none
+not a file          |1|^dravik-host: cannot read /: Is a directory|show --config /
+bad metadata        |1|^dravik-host: $scratch/err: applyMetaData failed with -52005: \{|simulate --metadata $scratch/err
+two kinds of it     |2|--metadata excludes --reference-type|show --metadata f --reference-type x
+one input twice     |2|standard input is taken by --metadata|show --metadata - --config -
 full disk           |1|^dravik-host: cannot write /dev/full: No space|simulate --csv /dev/full --duration 2s
 no such folder      |1|^dravik-host: cannot write $scratch/no/file|simulate --csv $scratch/no/file
 END
@@ -138,6 +151,38 @@ if cc -shared -fPIC -I "$include" -o "$scratch/bad.so" "$scratch/bad.c" "$scratc
     check "refused by the clock" 1 \
         'adjustTime failed with -1: \{"message":"an offset of 2000000000 ppb is beyond the clock.s 500000 ppb"\}$' \
         simulate --library "$scratch/bad.so"
+fi
+
+# A plug-in that gives back all that it was told, in one document of any length.
+cat > "$scratch/echo.c" << 'END'
+#include "zvckmservo/servo.h"
+#include <string.h>
+static char told[8192];
+void zvckmservo_applyMetaData(zvckmservo_HostTable* h, const char* t, zverr_Status* s)
+{
+    (void)h, (void)s, strcat(told, t);
+}
+int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* h, const char* t, zverr_Status* s)
+{
+    return (void)h, (void)s, strcat(told, t), 0;
+}
+int zvckmservo_readServoConfigJson(zvckmservo_HostTable* h, char* b, size_t n, zverr_Status* s)
+{
+    (void)h, (void)s, memcpy(b, told, strlen(told) < n ? strlen(told) : n);
+    return 0;
+}
+void zvckmservo_initialize(zvckmservo_HostTable* h, zverr_Status* s) { (void)h, (void)s; }
+void zvckmservo_finalize(zvckmservo_HostTable* h) { (void)h; }
+END
+printf 'int zvckmservo_%s;\n' isSeeded clearHistory getTime adjustTime > "$scratch/rest.c"
+if cc -shared -fPIC -I "$include" -o "$scratch/echo.so" "$scratch/echo.c" "$scratch/rest.c" 2> /dev/null; then
+    show() { "$host" show --library "$scratch/echo.so" "$@"; }
+    expect "metadata made of a type" \
+        '{"selectedTRInstID":"selected","TRs":{"selected":{"type":"a \"b\" \\ \n"}}}' \
+        "$(show --reference-type $'a "b" \\ \n')"
+    printf '%5000s' end > "$scratch/long"
+    expect "metadata first, and no limit of length" "meta$(cat "$scratch/long")" \
+        "$(printf meta | show --config "$scratch/long" --metadata -)"
 fi
 
 echo "$checks checks, $failures failures"

@@ -1,0 +1,10 @@
+#include "printConfig.h"
+
+#include "tOutputFile.h"
+
+void printConfig(tServoHost& host)
+{
+    tOutputFile output(stdout, "the standard output");
+    output.write(host.readConfig() + "\n");
+    output.flush();
+}
