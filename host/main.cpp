@@ -1,7 +1,8 @@
 // dravik-host: loads the clock servo plug-in as any other host would, and lets it discipline a
-// clock. simulate and run choose a clock and a source of pairs, and share the loop; show
-// prints the configuration.
+// clock. simulate and run choose a clock and a source of pairs, and share the loop; check and show
+// work on the configuration.
 
+#include "check.h"
 #include "run.h"
 #include "show.h"
 #include "simulate.h"
@@ -32,11 +33,11 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addRun(app), addShow(app)};
+    const tVerb verbs[] = {addSimulate(app), addRun(app), addCheck(app), addShow(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())
-            throw CLI::RequiredError("A verb, simulate, run or show,");
+            throw CLI::RequiredError("A verb, simulate, run, check or show,");
     } catch (const CLI::ParseError& outcome) { // help and version come this way too
         return app.exit(outcome) == 0 ? kGood : kUsage;
     }

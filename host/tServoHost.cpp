@@ -1,8 +1,12 @@
 #include "tServoHost.h"
 
+#include "configDocument.h"
 #include "tStatus.h"
 
+#include <fmt/format.h>
+
 #include <exception>
+#include <stdexcept>
 
 namespace {
 
@@ -115,7 +119,9 @@ void tServoHost::writeConfig(const std::string& document)
     tStatus status;
     const tCurrentScope scope(subject);
     library.writeServoConfigJson(&table, document.c_str(), &status);
-    status.check("writeServoConfigJson");
+    if (status.code >= 0) return;
+    throw std::runtime_error(
+        fmt::format("refused with {}: {}", status.code, refusalText(document, status.details())));
 }
 
 // The plug-in tells no length and cuts without a word: a text that leaves some of its zeros in the

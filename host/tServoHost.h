@@ -19,7 +19,7 @@ public:
     // Throws std::runtime_error with code and payload; the calls made until then are kept.
     void adjustTime(uint64_t referenceNs, uint64_t clockNs);
 
-    // The texts of the plug-in. Throw std::runtime_error with code and payload.
+    // The texts of the plug-in. Throw std::runtime_error; of a refused document it says why.
     void writeConfig(const std::string& document);
     std::string readConfig();
     void applyMetaData(const std::string& metaData);

@@ -52,19 +52,20 @@ losses counted      |0|lost 2 times|$bad
 out of reach        |0|^ +3\.000 s  frequency at its limit, -500\.000 ppm$|simulate --frequency-error 600ppm
 real time           |0|^pairs       [1-8] in 0\.[0-9]+ s$|run --duration 1s
 version             |0|^dravik-host [0-9]+\.[0-9]+\.[0-9]+$|--version
-help                |0|^Exit status: 0 good; 1 .*, such as a$|simulate --help
+help                |0|^refused document; 2 wrong usage\.$|simulate --help
 tuned before pair 1 |0|^ +2\.000 s  no step needed, error \+1\.012 ms|simulate --config $scratch/blunt.json
 a new servo         |0|"snapTimeThreshold":.1e-06,$|show
 of an unknown type  |0|"snapTimeThreshold":.1e-06,$|show --reference-type none
 tuned               |0|"snapTimeThreshold":.10,$|show --config $scratch/blunt.json
-default, bridges    |0|"spikeFilterEnabled":.1,$|show --config $config/dravik_tr_ptp4l_tab.json
-default, boundary   |0|"spikeFilterEnabled":.1,$|show --config $config/dravik_tr_ptp4l_bc.json
+document taken      |0|"snapTimeThreshold":.10,$|check $scratch/blunt.json
+default, bridges    |0|"spikeFilterEnabled":.1,$|check $config/dravik_tr_ptp4l_tab.json
+default, boundary   |0|"spikeFilterEnabled":.1,$|check $config/dravik_tr_ptp4l_bc.json
 END
 check "never locked" 0 "^lock        never$" simulate --frequency-error 600ppm
 expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
 
 table << END
-no verb             |2|^dravik-host: A verb, simulate, run or show, is required|
+no verb             |2|^dravik-host: A verb, simulate, run, check or show, is required|
 unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 unit of another kind|2|--noise: '1ppm' has an unknown unit 'ppm'|simulate --noise 1ppm
@@ -77,10 +78,11 @@ negative seed       |2|--seed: '-1'|simulate --seed -1
 no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
 another library     |1|libm.* has no zvckmservo_initialize|run --library $(ldd "$host" | awk '/libm\.so/ {print $3}')
 no such file        |1|^dravik-host: cannot read $scratch/none: No such|run --config $scratch/none
-not a file          |1|^dravik-host: cannot read /: Is a directory|show --config /
+not a file          |1|^dravik-host: cannot read /: Is a directory|check /
 bad metadata        |1|^dravik-host: $scratch/err: applyMetaData failed with -52005: \{|simulate --metadata $scratch/err
 two kinds of it     |2|--metadata excludes --reference-type|show --metadata f --reference-type x
 one input twice     |2|standard input is taken by --metadata|show --metadata - --config -
+nothing to check    |2|document is required|check
 full disk           |1|^dravik-host: cannot write /dev/full: No space|simulate --csv /dev/full --duration 2s
 no such folder      |1|^dravik-host: cannot write $scratch/no/file|simulate --csv $scratch/no/file
 END
@@ -89,6 +91,32 @@ export DRAVIK_LIBRARY=$scratch/named
 check "library of the environment" 1 "$scratch/named" simulate
 check "the option goes first" 0 "lost 0 times" simulate --library "$1/libdravik.so.1"
 unset DRAVIK_LIBRARY
+
+# A refused document: which key, why, and what had been applied. Rows of PATTERN|DOCUMENT on stdin.
+while IFS='|' read -r pattern document; do
+    printf '%b' "$document" > "$scratch/document"
+    check "refused: $document" 1 "^dravik-host: $scratch/document: refused with -52005: $pattern\$" \
+        check "$scratch/document"
+done << 'END'
+it is not JSON, as of line 1|
+it is not JSON, as of line 3|{\n"phaseLockGain": 1,\n}
+frequencyLockGain is 0, not within 1e-9 to 10; applied before it: nothing|{"PHASELOCKGAIN": 1, "frequencyLockGain": 0}
+phaseLockGain is 10.5, not within 1e-9 to 10; applied before it: frequencyLockGain|{"phaseLockGain": 10.5, "frequencyLockGain": 1}
+phaseLockCoefficientA is -11, not within -10 to 10; applied before it: nothing|{"phaseLockCoefficientA": -11}
+phaseLockCoefficientB is 11, not within -10 to 10; applied before it: nothing|{"phaseLockCoefficientB": 11}
+phaseLockCoefficientC is inf, not within -10 to 10; applied before it: nothing|{"phaseLockCoefficientC": 1e999}
+snapTimeThreshold is 9e-09, not within 1e-8 to 10 s; applied before it: phaseLockGain|{"SnapTimeThreshold": 9e-9, "phaseLockGain": 1}
+spikeFilterEnabled is true, which is no number; applied before it: snapTimeThreshold|{"spikeFilterEnabled": true, "snapTimeThreshold": 1, "spikeFilterHistorySize": ""}
+spikeFilterHistorySize is 1.9, not within 2 to 100; applied before it: spikeFilterEnabled|{"spikeFilterHistorySize": 1.9, "spikeFilterEnabled": 1}
+spikeFilterMaxThreshold is \["a"\], which is no number; applied before it: nothing|{"spikeFilterMaxThreshold": ["a"], "spikeFilterMinThreshold": null}
+spikeFilterMaxThreshold is 11, not within 1e-9 to 10 s/s; applied before it: nothing|{"spikeFilterMaxThreshold": 11}
+spikeFilterMinThreshold is 0, not within 1e-9 to 10 s/s; applied before it: nothing|{"spikeFilterMinThreshold": 0}
+spikeFilterGrowthFactor is 1, not within 1.001 to 100; applied before it: nothing|{"spikeFilterGrowthFactor": 1}
+END
+note() { echo "$1" | "$host" check - 2>&1 > /dev/null | cut -d' ' -f3-; }
+expect "misspelt and repeated" "ignored: phaselockgain, gain" \
+    "$(note '{"phaseLockGain": 1, "phaselockgain": 2, "gain": 3, "snapTimeThreshold": 1}')"
+expect "no object" "no JSON object, so nothing is set" "$(note '[1]')"
 
 # The CSV file: every pair, every call, exact figures, the same bytes for the same seed.
 n=0

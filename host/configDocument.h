@@ -1,0 +1,13 @@
+#pragma once
+
+#include <string>
+
+// What a person is told of a configuration document that the plug-in took or refused.
+
+// Why it was refused: the key, its value, what is wrong with it, and which keys had been applied
+// before it. The payload of the failure names the place in the plug-in, which says what was wrong;
+// of a failure that is not the document's the payload itself is the answer.
+std::string refusalText(const std::string& document, const std::string& payload);
+
+// The members that set nothing, as they are misspelt or repeat a key; "" if there are none.
+std::string ignoredText(const std::string& document);
