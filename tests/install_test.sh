@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
 # An installation as an integrator has it: its files, and hosts built against nothing else.
-# Usage: install_test.sh BUILD EXAMPLES CC CMAKE READELF
+# Usage: install_test.sh BUILD EXAMPLES RELOCATIONS CC CMAKE READELF, with a relocation library in the
+# folder RELOCATIONS
 set -euo pipefail
-build=$1 examples=$2 cc=$3 cmake=$4 readelf=$5
+build=$1 examples=$2 relocations=$3 cc=$4 cmake=$5 readelf=$6
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 failures=0
@@ -38,6 +39,14 @@ for file in "$libdir/libdravik.so.1" "$usr/bin/dravik-host"; do
     expect "run path of ${file##*/}" 0 "$("$readelf" --dynamic "$file" | grep -cE 'RPATH|RUNPATH' || true)"
 done
 expect "the host finds the library" 1 "$(env -u DRAVIK_LIBRARY "$usr/bin/dravik-host" simulate --duration 10s | grep -c '^lock  *after')"
+
+# The default documents are found where they were installed, seen through a relocation.
+servos=$root/usr/lib/arm-linux-gnueabi/zv-chronel/servos
+for type in 'tab IEEE 802.1AS-2011 TAB' 'bc IEEE 1588-2008 BC'; do
+    expect "document of ${type#* }" "$("$usr/bin/dravik-host" show --config "$servos/dravik_tr_ptp4l_${type%% *}.json")" \
+        "$(LD_LIBRARY_PATH=$relocations RELOCATIONS=multiarchlibdir=$root/usr/lib/arm-linux-gnueabi \
+            "$usr/bin/dravik-host" show --reference-type "${type#* }")"
+done
 
 # The example, by pkg-config and by CMake.
 export PKG_CONFIG_PATH=$libdir/pkgconfig
