@@ -284,6 +284,7 @@ TEST(Boundary, SurvivesTheFailureOfEachAllocation)
         {"pair",
          [&](auto* h, auto* s) { zvckmservo_adjustTime(h, 5 * kSecond, 5 * kSecond, s); },
          {-52000}},
+        {"clear", [](auto* h, auto* s) { zvckmservo_clearHistory(h, s); }, {}},
         {"time",
          [&](auto* h, auto* s) {
              uint64_t t = 0;

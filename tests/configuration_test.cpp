@@ -1,5 +1,6 @@
 // The tuning parameters, and the document and the file that carry them.
 
+#include "support/allocator.h"
 #include "support/systemLog.h"
 #include "support/tFakeHost.h"
 #include "zverr/Exception.h"
@@ -327,6 +328,31 @@ TEST(ConfigFile, IsJoinedToOneLineAndApplied)
               refusalOf([&] { servo.readConfigFile("/"); }))
         << "a folder opens, and has no text";
     EXPECT_EQ(1U, takeSystemLog().size());
+}
+
+TEST(ConfigFile, IsNeverAppliedInPartForALackOfMemory)
+{
+    const tScratchFile file("{\"phaseLockGain\":2}" + std::string(300, ' ') + "\n" +
+                            std::string(3000, ' ') + "behind");
+    long n = 1;
+    for (bool fired = true; fired; ++n) {
+        const long before = allocator::liveBlocks();
+        {
+            tFakeHost host;
+            tOpenServo& servo = host.open();
+            try {
+                const allocator::tFailNth failing(n);
+                servo.readConfigFile(file.path);
+                fired = failing.fired();
+            } catch (const std::bad_alloc&) {
+                EXPECT_EQ(0.55, servo.config().getPhaseLockGain()) << "allocation " << n;
+            }
+            EXPECT_EQ(fired ? 0.55 : 2.0, servo.config().getPhaseLockGain()) << "allocation " << n;
+            takeSystemLog();
+        }
+        EXPECT_EQ(before, allocator::liveBlocks());
+    }
+    EXPECT_GT(n, 5);
 }
 
 // Notes which files it is told to load.
