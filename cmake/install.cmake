@@ -22,7 +22,9 @@ install(EXPORT dravikTargets NAMESPACE dravik:: DESTINATION ${package_dir})
 configure_package_config_file(cmake/dravikConfig.cmake.in dravikConfig.cmake
     INSTALL_DESTINATION ${package_dir})
 write_basic_package_version_file(dravikConfigVersion.cmake COMPATIBILITY SameMajorVersion)
-file(RELATIVE_PATH prefix_from_pkgconfig /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
+# Relative, so that an installation can be moved; the full names, as a folder may be an absolute one.
+file(RELATIVE_PATH include_from_pkgconfig
+    ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_FULL_INCLUDEDIR})
 configure_file(cmake/dravik.pc.in dravik.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/dravikConfig.cmake ${PROJECT_BINARY_DIR}/dravikConfigVersion.cmake
     DESTINATION ${package_dir})

@@ -12,7 +12,7 @@ namespace fs = std::filesystem;
 namespace {
 
 constexpr const char* kFileName = "libdravik.so.1";
-constexpr const char* kInstalledFolder = "../" DRAVIK_LIBDIR; // seen from the installed program
+constexpr const char* kInstalledFolder = DRAVIK_LIB_FROM_BIN; // seen from the installed program
 
 } // namespace
 
