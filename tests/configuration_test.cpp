@@ -1,9 +1,9 @@
 // The tuning parameters, and the document and the file that carry them.
 
 #include "support/allocator.h"
+#include "support/raisedBy.h"
 #include "support/systemLog.h"
 #include "support/tFakeHost.h"
-#include "zverr/Exception.h"
 
 #include <algorithm>
 #include <clocale>
@@ -18,18 +18,6 @@
 namespace {
 
 using zvckmDravik::iServoConfig;
-
-// What a setter raises: code and payload; "" for nothing.
-std::string refusalOf(const std::function<void()>& call)
-{
-    try {
-        call();
-    } catch (const zverr::Exception& failure) {
-        expectBufferForm(failure.status);
-        return std::to_string(failure.status.code) + " " + failure.what();
-    }
-    return "";
-}
 
 std::string refusalAt(int line)
 {
@@ -69,18 +57,18 @@ TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
         SCOPED_TRACE(row.name);
         EXPECT_EQ(row.initial, (config.*row.get)());
         for (const double good : {row.lowest, row.highest}) {
-            EXPECT_EQ("", refusalOf([&] { (config.*row.set)(good); }));
+            EXPECT_EQ("", raisedBy([&] { (config.*row.set)(good); }));
             EXPECT_EQ(good, (config.*row.get)());
         }
         for (const double bad :
              {std::nextafter(row.lowest, -infinity), std::nextafter(row.highest, infinity),
               -infinity, infinity, std::nan("")}) {
-            EXPECT_EQ(refusalAt(row.line), refusalOf([&] { (config.*row.set)(bad); })) << bad;
+            EXPECT_EQ(refusalAt(row.line), raisedBy([&] { (config.*row.set)(bad); })) << bad;
             EXPECT_EQ(row.highest, (config.*row.get)()) << "a refused value changes nothing";
         }
     }
-    EXPECT_EQ("", refusalOf([&] { config.setPhaseLockCoefficientB(0.0); }));
-    EXPECT_EQ(refusalAt(77), refusalOf([&] { config.setFrequencyLockGain(0.0); }));
+    EXPECT_EQ("", raisedBy([&] { config.setPhaseLockCoefficientB(0.0); }));
+    EXPECT_EQ(refusalAt(77), raisedBy([&] { config.setFrequencyLockGain(0.0); }));
 }
 
 TEST(Parameters, FilterSwitchAndHistorySize)
@@ -92,10 +80,10 @@ TEST(Parameters, FilterSwitchAndHistorySize)
     EXPECT_TRUE(config.getSpikeFilterEnabled());
     EXPECT_EQ(5U, config.getSpikeFilterHistorySize());
     for (const uint32_t good : {2U, 100U}) {
-        EXPECT_EQ("", refusalOf([&] { config.setSpikeFilterHistorySize(good); }));
+        EXPECT_EQ("", raisedBy([&] { config.setSpikeFilterHistorySize(good); }));
     }
     for (const uint32_t bad : {0U, 1U, 101U, static_cast<uint32_t>(-5)}) {
-        EXPECT_EQ(refusalAt(235), refusalOf([&] { config.setSpikeFilterHistorySize(bad); })) << bad;
+        EXPECT_EQ(refusalAt(235), raisedBy([&] { config.setSpikeFilterHistorySize(bad); })) << bad;
     }
     EXPECT_EQ(100U, config.getSpikeFilterHistorySize());
 }
@@ -306,7 +294,7 @@ TEST(ConfigFile, IsJoinedToOneLineAndApplied)
         tFakeHost host;
         tOpenServo& servo = host.open();
         takeSystemLog();
-        const std::string refusal = refusalOf([&] { servo.readConfigFile(file.path); });
+        const std::string refusal = raisedBy([&] { servo.readConfigFile(file.path); });
         EXPECT_EQ(row.code == 0 ? "" : "-52005", refusal.substr(0, refusal.find(' ')));
         EXPECT_EQ(
             std::vector<std::string>{
@@ -319,13 +307,13 @@ TEST(ConfigFile, IsJoinedToOneLineAndApplied)
     }
     tFakeHost host;
     tOpenServo& servo = host.open();
-    EXPECT_EQ("", refusalOf([&] { servo.readConfigFile("/none/%n"); }));
+    EXPECT_EQ("", raisedBy([&] { servo.readConfigFile("/none/%n"); }));
     EXPECT_EQ(
         std::vector<std::string>{"6 [    dravik|                   dravik/tServo|0444] Unable "
                                  "to read configuration from: /none/%n\n"},
         takeSystemLog());
-    EXPECT_EQ(refusalOf([&] { servo.writeServoConfigJson(""); }),
-              refusalOf([&] { servo.readConfigFile("/"); }))
+    EXPECT_EQ(raisedBy([&] { servo.writeServoConfigJson(""); }),
+              raisedBy([&] { servo.readConfigFile("/"); }))
         << "a folder opens, and has no text";
     EXPECT_EQ(1U, takeSystemLog().size());
 }

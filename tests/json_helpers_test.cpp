@@ -2,11 +2,9 @@
 
 #include "dravik/tJsonConfig.h"
 #include "dravik/timeReferenceMetaData.h"
-#include "support/tHostStatus.h"
-#include "zverr/Exception.h"
+#include "support/raisedBy.h"
 #include "zvsynctools_cjson/jsonHelperFunctions.h"
 
-#include <functional>
 #include <gtest/gtest.h>
 
 namespace {
@@ -14,18 +12,6 @@ namespace {
 using zvckmDravik::tJsonConfig;
 using zvsynctools_cjson::getOptionalObjectText;
 using zvsynctools_cjson::getOptionalString;
-
-// Code and payload of what is raised; "" for nothing.
-std::string raisedBy(const std::function<void()>& call)
-{
-    try {
-        call();
-    } catch (const zverr::Exception& failure) {
-        expectBufferForm(failure.status);
-        return std::to_string(failure.status.code) + " " + failure.what();
-    }
-    return "";
-}
 
 std::string payload(const std::string& code, const char* constant, const char* file, int line)
 {
