@@ -82,6 +82,7 @@ TEST(JsonConfig, WritesNumbersInTheirPlace)
               "\t\"unsigned\":\t4294967295,\n\t\"flag\":\t1,\n\t\"minus\":\t-0\n}",
               config.toString());
     EXPECT_EQ(0.55, config.getDouble("first")) << "printing changes nothing";
+    EXPECT_EQ("{\n\t\"x\":\tnull\n}", tJsonConfig(R"({"x":1e999})").toString());
     EXPECT_EQ("{\n}", tJsonConfig().toString());
 }
 

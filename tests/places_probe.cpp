@@ -39,6 +39,8 @@ void printGetter(const char* name, void (*get)(std::string&))
         print(name, path);
     } catch (const zverr::Exception& failure) {
         print(name, path + std::to_string(failure.status.code) + " " + failure.what());
+    } catch (const std::exception& failure) {
+        print(name, path + failure.what());
     }
 }
 

@@ -113,6 +113,9 @@ once="multiarchlibdir bindir runstatedir sysconfdir sharedstatedir runstatedir b
 warnings=$(for name in $once $once; do echo "4 zvhostq::get_$name() failed"; done)
 expect "warnings, shared layout" "$warnings" "$(value log)"
 expect "usual places after all" "/var/run/zvcorp/Chronel" "$(value runtimeDir)"
+settle LD_LIBRARY_PATH="$libraries/relocations_throwing"
+expect "warnings after an exception" "$warnings" "$(value log)"
+expect "a getter after an exception" "oldthe relocation library threw" "$(value bindir)"
 
 # The shared directory's file.
 shared() { # NAME EXPECTED

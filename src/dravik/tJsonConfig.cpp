@@ -3,6 +3,7 @@
 #include "dravik/numberText.h"
 #include "zverr/Exception.h"
 
+#include <cmath>
 #include <cstring>
 #include <memory>
 #include <stdexcept>
@@ -45,7 +46,7 @@ template <class Buffer> Buffer* require(Buffer* buffer)
 // needed to read back the same.
 void spellNumbers(cJSON* item)
 {
-    if (isNumber(item)) {
+    if (isNumber(item) && std::isfinite(item->valuedouble)) {
         const std::string text = numberText(item->valuedouble);
         item->valuestring = static_cast<char*>(require(cJSON_malloc(text.size() + 1)));
         std::memcpy(item->valuestring, text.c_str(), text.size() + 1);

@@ -9,7 +9,8 @@ namespace zvckmDravik {
 
 // Typed access to the numbers of one JSON object. A key is found among the direct members without
 // regard to case (by the process's LC_CTYPE), and the first match counts; a document that is no
-// object has no keys. Every failure is raised, and a failed setter changes nothing.
+// object has no keys. Every failure is raised, and a failed setter changes nothing. In a locale
+// whose decimal point takes several bytes the parser refuses fractions.
 class tJsonConfig
 {
 public:

@@ -8,6 +8,7 @@
 #include <cstring>
 #include <dlfcn.h>
 #include <memory>
+#include <stdexcept>
 
 namespace zvhostq {
 
@@ -48,6 +49,16 @@ struct tLibraryCloser {
     void operator()(void* handle) const { zvdynlib_close(handle); }
 };
 using tLibrary = std::unique_ptr<void, tLibraryCloser>;
+
+// An exception of the library's must not outlive it: its code would be gone where it is destroyed.
+int ask(tRelocate relocate, const char* name, char* answer)
+{
+    try {
+        return relocate(name, answer, kAnswerSize);
+    } catch (...) { // NOLINT(bugprone-empty-catch): it ends here, and one of ours goes on
+    }
+    throw std::runtime_error("the relocation library threw");
+}
 
 // What went wrong in building the table, for the life of the process.
 zverr_Status& initialisationStatus()
@@ -114,7 +125,8 @@ void stdpath_table::relocateOne(const char* name, zverr_Status* status)
     const std::unique_ptr<char[]> answer(
         zvplat::newArray(kAnswerSize, zvplat::tFixedStatusAdapter(status).get()));
     if (status->code < 0) return;
-    const int result = relocate(name, answer.get(), kAnswerSize);
+    answer[0] = 0;
+    const int result = ask(relocate, name, answer.get());
     if (result == 0) return; // whatever is in the buffer
     if (result < 0) {
         zverr_setCode(status, zvplaterr_resourceNotFound);

@@ -7,6 +7,7 @@
 #include <cstdio>
 #include <cstring>
 #include <memory>
+#include <sys/stat.h>
 
 namespace zvhostq {
 
@@ -50,6 +51,12 @@ void reportNotRead(const char* filename, int error, long fileSize, size_t count,
         .endObject();
 }
 
+bool isFolder(FILE* file)
+{
+    struct stat information;
+    return fstat(fileno(file), &information) == 0 && S_ISDIR(information.st_mode);
+}
+
 void resize(zvktl::err::vector<char>* content, size_t size, zverr_Status* status)
 {
     if (size > content->size) {
@@ -67,9 +74,11 @@ void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zv
     if (file == nullptr) reportNotOpened(filename, errno, status);
     if (status->code < 0) return;
 
+    // Some file systems would give it as an empty file.
+    if (isFolder(file.get())) return reportNotRead(filename, EISDIR, 0, 0, status);
     (void)std::fseek(file.get(), 0, SEEK_END);
     const long fileSize = std::ftell(file.get());
-    // A pipe has no size; a folder has none either, or one that is too large to be true.
+    // A pipe has none, and one that is too large to be true leaves no room for the zero byte.
     if (fileSize < 0 || fileSize == LONG_MAX) {
         const int error = fileSize < 0 ? errno : EOVERFLOW;
         return reportNotRead(filename, error, fileSize, 0, status);
@@ -78,6 +87,7 @@ void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zv
     const size_t size = static_cast<size_t>(fileSize);
     resize(content, size + 1, status);
     if (status->code < 0) return;
+    errno = 0; // a file that has shrunk is no fault of the system's
     const size_t count = std::fread(content->data, 1, size, file.get());
     if (count != size) reportNotRead(filename, errno, fileSize, count, status);
     content->data[size] = 0;
