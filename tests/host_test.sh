@@ -8,14 +8,7 @@ include=$root/include config=$root/config
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
-checks=0 failures=0
-
-expect() { # NAME EXPECTED FOUND
-    checks=$((checks + 1))
-    [ "$2" == "$3" ] && return
-    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
-    failures=$((failures + 1))
-}
+source "$(dirname "$0")/support/expect.sh"
 
 # A failure has one line on stderr, anything else none; and the pattern is found in the output.
 check() { # NAME STATUS PATTERN ARGUMENTS...

@@ -6,13 +6,7 @@ set -euo pipefail
 build=$1 examples=$2 relocations=$3 cc=$4 cmake=$5 readelf=$6
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
-failures=0
-
-expect() { # NAME EXPECTED FOUND
-    [ "$2" == "$3" ] && return
-    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
-    failures=$((failures + 1))
-}
+source "$(dirname "$0")/support/expect.sh"
 
 root=$scratch/root
 DESTDIR=$root "$cmake" --install "$build" --prefix "$scratch/usr" > /dev/null

@@ -3,13 +3,7 @@
 # Usage: library_test.sh LIBRARY MAP NM READELF
 set -euo pipefail
 library=$1 map=$2 nm=$3 readelf=$4
-failures=0
-
-expect() { # NAME EXPECTED FOUND
-    [ "$2" == "$3" ] && return
-    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
-    failures=$((failures + 1))
-}
+source "$(dirname "$0")/support/expect.sh"
 
 dynamic=$("$readelf" --wide --dynamic "$library")
 expect "exported names" \

@@ -5,14 +5,7 @@ set -uo pipefail
 probe=$1 libraries=$2
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
-checks=0 failures=0
-
-expect() { # NAME EXPECTED FOUND
-    checks=$((checks + 1))
-    [ "$2" == "$3" ] && return
-    printf '%s:\n  expected: %s\n  found:    %s\n' "$1" "$2" "$3"
-    failures=$((failures + 1))
-}
+source "$(dirname "$0")/support/expect.sh"
 
 settle() { # VARIABLE=VALUE...: runs the probe with the relocation library
     env LD_LIBRARY_PATH="$libraries/relocations" SHARE_DIR_FILE="$scratch/none" "$@" \
