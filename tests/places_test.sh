@@ -108,7 +108,7 @@ expect "warnings, shared layout" "$warnings" "$(value log)"
 expect "usual places after all" "/var/run/zvcorp/Chronel" "$(value runtimeDir)"
 settle LD_LIBRARY_PATH="$libraries/relocations_throwing"
 expect "warnings after an exception" "$warnings" "$(value log)"
-expect "a getter after an exception" "oldthe relocation library threw" "$(value bindir)"
+expect "a getter after an exception" "the relocation library threw" "$(value bindir)"
 
 # The shared directory's file.
 shared() { # NAME EXPECTED

@@ -29,6 +29,7 @@ constexpr const char* kSharedDirFallback = "/usr/local/zvcorp/share";
 
 void getDirectory(const char* name, std::string& path)
 {
+    path.clear(); // and stays so, however it fails
     zverr::tStatusGuard status;
     const zvktl::err::string row(name, &status);
     zvktl::err::string value;
