@@ -1,9 +1,10 @@
 #!/usr/bin/env bash
 # An installation as an integrator has it: its files, and hosts built against nothing else.
-# Usage: install_test.sh BUILD EXAMPLES RELOCATIONS CC CMAKE READELF, with a relocation library in the
-# folder RELOCATIONS
+# Usage: install_test.sh BUILD EXAMPLES RELOCATIONS CC CMAKE READELF [TOOLCHAIN], with a relocation
+# library in the folder RELOCATIONS
 set -euo pipefail
-build=$1 examples=$2 relocations=$3 cc=$4 cmake=$5 readelf=$6
+build=$1 examples=$2 relocations=$3 cc=$4 cmake=$5 readelf=$6 toolchain=${7:-}
+emulator=(${EMULATOR:+"$EMULATOR"})
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 source "$(dirname "$0")/support/expect.sh"
@@ -32,14 +33,14 @@ expect "soname link" libdravik.so.1.0.0 "$(readlink "$libdir/libdravik.so.1")"
 for file in "$libdir/libdravik.so.1" "$usr/bin/dravik-host"; do
     expect "run path of ${file##*/}" 0 "$("$readelf" --dynamic "$file" | grep -cE 'RPATH|RUNPATH' || true)"
 done
-expect "the host finds the library" 1 "$(env -u DRAVIK_LIBRARY "$usr/bin/dravik-host" simulate --duration 10s | grep -c '^lock  *after')"
+expect "the host finds the library" 1 "$(env -u DRAVIK_LIBRARY "${emulator[@]}" "$usr/bin/dravik-host" simulate --duration 10s | grep -c '^lock  *after')"
 
 # The default documents are found where they were installed, seen through a relocation.
 servos=$root/usr/lib/arm-linux-gnueabi/zv-chronel/servos
 for type in 'tab IEEE 802.1AS-2011 TAB' 'bc IEEE 1588-2008 BC'; do
-    expect "document of ${type#* }" "$("$usr/bin/dravik-host" show --config "$servos/dravik_tr_ptp4l_${type%% *}.json")" \
+    expect "document of ${type#* }" "$("${emulator[@]}" "$usr/bin/dravik-host" show --config "$servos/dravik_tr_ptp4l_${type%% *}.json")" \
         "$(LD_LIBRARY_PATH=$relocations RELOCATIONS=multiarchlibdir=$root/usr/lib/arm-linux-gnueabi \
-            "$usr/bin/dravik-host" show --reference-type "${type#* }")"
+            "${emulator[@]}" "$usr/bin/dravik-host" show --reference-type "${type#* }")"
 done
 
 # The example, by pkg-config and by CMake.
@@ -53,10 +54,12 @@ find_package(dravik 1.0 REQUIRED)
 add_executable(by_cmake $examples/minimal_host.c)
 target_link_libraries(by_cmake PRIVATE dravik::dravik)
 END
-"$cmake" -S "$scratch" -B "$scratch" -D CMAKE_PREFIX_PATH="$usr" -D CMAKE_C_COMPILER="$cc" > /dev/null
+"$cmake" -S "$scratch" -B "$scratch" -D CMAKE_FIND_ROOT_PATH="$root" \
+    -D CMAKE_PREFIX_PATH="$scratch/usr" -D CMAKE_C_COMPILER="$cc" \
+    ${toolchain:+-D CMAKE_TOOLCHAIN_FILE="$toolchain"} > /dev/null
 "$cmake" --build "$scratch" > /dev/null
 for host in by_pkg_config by_cmake; do
-    LD_LIBRARY_PATH=$libdir "$scratch/$host" > "$scratch/out"
+    LD_LIBRARY_PATH=$libdir "${emulator[@]}" "$scratch/$host" > "$scratch/out"
     expect "$host: far off at first" "5000000.0" "$(awk 'NR == 1 {print $4}' "$scratch/out")"
     expect "$host: near in the end" 1 "$(awk 'END {print ($4 < 100 && $4 > -100)}' "$scratch/out")"
 done

@@ -2,14 +2,14 @@
 # Where the plug-in looks for directories and files, and that nothing met there ends the host.
 # Usage: places_test.sh PROBE FOLDER, with the relocation libraries in folders of FOLDER
 set -uo pipefail
-probe=$1 libraries=$2
+probe=(${EMULATOR:+"$EMULATOR"} "$1") libraries=$2
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 source "$(dirname "$0")/support/expect.sh"
 
 settle() { # VARIABLE=VALUE...: runs the probe with the relocation library
     env LD_LIBRARY_PATH="$libraries/relocations" SHARE_DIR_FILE="$scratch/none" "$@" \
-        "$probe" > "$scratch/out" || expect "exit status with $*" 0 $?
+        "${probe[@]}" > "$scratch/out" || expect "exit status with $*" 0 $?
 }
 
 value() { sed -n "s/^$1 //p" "$scratch/out"; } # NAME
