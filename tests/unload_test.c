@@ -1,18 +1,22 @@
-/* A host in C: loads the library, uses it, closes it, and finds it gone from the process. */
+/* A host in C: loads the library, uses it, closes it, and finds it gone from the process; from a
+ * thread, too, that has been told to end. */
 
 #include "zvckmservo/servo.h"
 
 #include <dlfcn.h>
+#include <pthread.h>
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
 
 static int32_t offsetPpb = 0;
 static int32_t failure = 0;
+static int finished = 0;
 
 static void readClock(uint64_t* timeNs, zverr_Status* status)
 {
     (void)status;
+    pthread_testcancel();
     *timeNs = 4000000000U;
 }
 
@@ -24,6 +28,7 @@ static void stepTime(int64_t deltaNs, zverr_Status* status)
 
 static void getFrequency(int32_t* ppb, zverr_Status* status)
 {
+    pthread_testcancel();
     status->code =
         failure; /* makes the plug-in throw and catch: unwinding must not pin it either */
     *ppb = offsetPpb;
@@ -70,6 +75,8 @@ static void useAndClose(const char* path)
     __extension__ __typeof__(&zvckmservo_adjustTime) adjustTime =
         bind(library, "zvckmservo_adjustTime");
     __extension__ __typeof__(&zvckmservo_getTime) getTime = bind(library, "zvckmservo_getTime");
+    __extension__ __typeof__(&zvckmservo_applyMetaData) applyMetaData =
+        bind(library, "zvckmservo_applyMetaData");
     __extension__ __typeof__(&zvckmservo_finalize) finalize = bind(library, "zvckmservo_finalize");
 
     zvckmservo_HostTable host;
@@ -92,11 +99,25 @@ static void useAndClose(const char* path)
     status.code = 0;
     getTime(&host, &now, &status);
     check(status.code == 0 && now == 4000000000U, "the clock's time did not arrive");
+    applyMetaData(&host, /* looks for a file and logs */
+                  "{\"selectedTRInstID\":\"a\",\"TRs\":{\"a\":{\"type\":\"IEEE 1588-2008 BC\"}}}",
+                  &status);
+    check(status.code == 0, "the metadata was not taken");
     finalize(&host);
     check(host.servoHandle == NULL, "the servo is still there");
 
     check(dlclose(library) == 0, "dlclose failed");
     check(dlopen(path, RTLD_NOW | RTLD_NOLOAD) == NULL, "still loaded after dlclose");
+}
+
+/* Ends at the first cancellation point behind the library: none inside takes effect. */
+static void* useCancelled(void* path)
+{
+    pthread_cancel(pthread_self());
+    useAndClose(path);
+    finished = 1;
+    pthread_testcancel();
+    return NULL;
 }
 
 int main(int argc, char** argv)
@@ -105,5 +126,11 @@ int main(int argc, char** argv)
     for (int round = 0; round < 3; ++round) {
         useAndClose(argv[1]);
     }
+    pthread_t thread = 0;
+    void* result = NULL;
+    check(pthread_create(&thread, NULL, useCancelled, argv[1]) == 0, "no thread");
+    pthread_join(thread, &result);
+    check(finished && result == PTHREAD_CANCELED,
+          "the cancelled thread did not end where it should");
     return 0;
 }

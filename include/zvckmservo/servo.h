@@ -4,8 +4,9 @@
  * for each clock fills a zvckmservo_HostTable (words 13 to 18), calls zvckmservo_initialize, then
  * the other functions as often as it likes, and at last zvckmservo_finalize.
  *
- * The plug-in starts no thread and no timer, and reads no file. It acts only inside these calls, on
- * the caller's thread. No exception leaves any of them. Needs C11 or C++11.
+ * The plug-in starts no thread and no timer. It acts only inside these calls, on the caller's
+ * thread, and while it is loaded, when it settles where its default documents lie. Of the calls,
+ * zvckmservo_applyMetaData alone reads a file. No exception leaves any of them. Needs C11 or C++11.
  *
  * Signs: the clock is ahead when its time is greater than the reference's; a positive frequency
  * offset makes the clock run faster; a positive step moves it forward. */
@@ -41,8 +42,8 @@ extern "C" {
  * thread, but for zvckmservo_finalize. The pair that led there then goes on where it was: what a
  * zvckmservo_clearHistory inside it cleared, the rest of that pair may set again. Words 17 and 18
  * are called while there is no servo yet and may not call the plug-in.
- * An operation must return or throw; a thread that ends inside one (pthread_exit, cancellation)
- * ends the process. */
+ * An operation must return or throw; a thread that ends itself inside one (pthread_exit) ends the
+ * process. */
 typedef struct zvckmservo_HostTable {
     /* word 0: the servo; opaque to the host. Written by zvckmservo_initialize, set to null by
      * zvckmservo_finalize. Null before the first initialisation, so that finalize is harmless. */
@@ -105,7 +106,10 @@ static_assert(sizeof(zvckmservo_HostTable) == 19 * sizeof(void*), "nineteen word
  *           not report the failure of a host operation: make none there.
  * Threads:  any, also at the same time: one lock per servo serialises the calls on a table, and is
  *           held across its host operations. Servos of different tables share nothing. No call may
- *           overlap zvckmservo_initialize or zvckmservo_finalize of the same table. */
+ *           overlap zvckmservo_initialize or zvckmservo_finalize of the same table.
+ *           A thread may be cancelled inside a call, if its cancelability type is the deferred one:
+ *           the request takes effect behind the call, also where a host operation has a
+ *           cancellation point. */
 
 /* Makes a servo for the clock, with default parameters, ready for the first pair. Calls
  * getMaxFrequencyOffset and getMinFrequencyOffset; the clock is not touched.

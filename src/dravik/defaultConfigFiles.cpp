@@ -1,6 +1,7 @@
 #include "dravik/defaultConfigFiles.h"
 
 #include "locations/tManagerFileLocations.h"
+#include "zvplat/quarks/cancellation.h"
 
 #include <syslog.h>
 
@@ -27,6 +28,7 @@ void addRow(std::map<std::string, std::string>& table, const char* type, const s
 
 std::map<std::string, std::string> buildTable() noexcept
 {
+    const tCancellationPause pause; // it looks at files and may log
     const std::string tabPath = pathOrNone(getTabConfigPath, kTabType);
     const std::string bcPath = pathOrNone(getBcConfigPath, kBcType);
     std::map<std::string, std::string> table;

@@ -2,11 +2,13 @@
 
 #include "dravik/tServo.h"
 #include "zverr/tools/exception_errStatus.h"
+#include "zvplat/quarks/cancellation.h"
 
 #include <stdexcept>
 
-// The boundary. Each function checks the status that came in, calls one operation of the servo and
-// turns whatever is thrown into the status; nothing else happens here.
+// The boundary. Each function checks the status that came in, holds thread cancellation off, calls
+// one operation of the servo and turns whatever is thrown into the status; nothing else happens
+// here.
 
 using zvckmDravik::tServo;
 using zvckmDravik::tTimeSpan;
@@ -23,6 +25,7 @@ tServo& servoOf(const zvckmservo_HostTable* host)
 void zvckmservo_initialize(zvckmservo_HostTable* host, zverr_Status* status)
 {
     if (status->code < 0) return;
+    const tCancellationPause pause;
     try {
         tServo* const servo = new tServo(host);
         host->servoHandle = servo; // only once there is one
@@ -43,6 +46,7 @@ int32_t zvckmservo_isSeeded(zvckmservo_HostTable* /*host*/) { return 0; }
 void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_Status* status)
 {
     if (status->code < 0) return;
+    const tCancellationPause pause;
     try {
         servoOf(host).clearHistory();
     } catch (...) {
@@ -54,6 +58,7 @@ void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime, u
                            zverr_Status* status)
 {
     if (status->code < 0) return;
+    const tCancellationPause pause;
     try {
         servoOf(host).adjustTime(tTimeSpan(referenceTime), tTimeSpan(clockTime));
     } catch (...) {
@@ -64,6 +69,7 @@ void zvckmservo_adjustTime(zvckmservo_HostTable* host, uint64_t referenceTime, u
 void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* time, zverr_Status* status)
 {
     if (status->code < 0) return;
+    const tCancellationPause pause;
     try {
         *time = servoOf(host).getTime().getMagnitude();
     } catch (...) {
@@ -75,6 +81,7 @@ int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host, const char* conf
                                     zverr_Status* status)
 {
     if (status->code < 0) return 1;
+    const tCancellationPause pause;
     try {
         if (configJson == nullptr) throw std::logic_error("no configuration text");
         servoOf(host).writeServoConfigJson(configJson);
@@ -88,6 +95,7 @@ int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, char* buffer, siz
                                    zverr_Status* status)
 {
     if (status->code < 0) return 1;
+    const tCancellationPause pause;
     try {
         servoOf(host).readServoConfigJson().copy(buffer, bufferSize);
     } catch (...) {
@@ -100,6 +108,7 @@ void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJs
                               zverr_Status* status)
 {
     if (status->code < 0 || metaDataJson == nullptr) return;
+    const tCancellationPause pause;
     try {
         servoOf(host).applyMetaData(metaDataJson);
     } catch (...) {
