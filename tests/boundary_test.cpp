@@ -4,11 +4,9 @@
 #include "support/tFakeHost.h"
 
 #include <cerrno>
-#include <cjson/cJSON.h>
 #include <cstdlib>
 #include <gtest/gtest.h>
 #include <pthread.h>
-#include <set>
 #include <stdexcept>
 #include <thread>
 
@@ -111,35 +109,6 @@ TEST(Initialize, DuringAnUnwindingAMissingMutexIsReplaced)
     EXPECT_EQ(0, host.code()) << "no guard raises during an unwinding";
     lockIn(host);
     expectLockFree(host);
-}
-
-TEST(Initialize, SurvivesTheFailureOfEachAllocation)
-{
-    long n = 1;
-    for (bool fired = true; fired; ++n) {
-        SCOPED_TRACE(testing::Message() << "allocation " << n);
-        const long before = allocator::liveBlocks();
-        {
-            tFakeHost host;
-            host.initialize(); // whatever the test itself keeps is allocated by now
-            zvckmservo_finalize(&host.table);
-            host.takeCalls();
-            {
-                const allocator::tFailNth failing(n);
-                zvckmservo_initialize(&host.table, &host.status.record);
-                fired = failing.fired();
-            }
-            EXPECT_EQ(fired ? -52000 : 0, host.code());
-            EXPECT_EQ(fired ? R"({"error_constant":"zvplaterr_memoryFull",)"
-                              R"("file":"zverr/tools/exception_errStatus","line":62,)"
-                              R"("component":"dravik","std_exception_what":"std::bad_alloc"})"
-                            : "(none)",
-                      host.status.text());
-            EXPECT_EQ(fired, host.table.servoHandle == nullptr);
-        }
-        EXPECT_EQ(before, allocator::liveBlocks());
-    }
-    EXPECT_GT(n, 2) << "the sweep did reach the servo";
 }
 
 TEST(Boundary, ANegativeStatusStopsEveryCall)
@@ -249,75 +218,6 @@ TEST(Boundary, AFailingOperationArrivesWholeAndFreesTheLock)
         }
         EXPECT_EQ(before, allocator::liveBlocks());
     }
-}
-
-TEST(Boundary, SurvivesTheFailureOfEachAllocation)
-{
-    cJSON_Hooks hooks = {[](size_t size) { return malloc(size); },
-                         [](void* block) { free(block); }};
-    cJSON_InitHooks(&hooks); // so that cJSON's allocations fail as well
-    const char* const document = R"({"phaseLockGain":2})";
-    const char* const metaData =
-        R"({"selectedTRInstID":"a","TRs":{"a":{"type":"long enough for memory"}}})";
-    char buffer[512];
-    struct Row {
-        const char* name;
-        std::function<void(zvckmservo_HostTable*, zverr_Status*)> call;
-        std::set<int32_t> codes; // with and without memory for the call's own texts
-    };
-    const Row rows[] = {
-        {"write",
-         [&](auto* h, auto* s) { zvckmservo_writeServoConfigJson(h, document, s); },
-         {-52000, -52005}},
-        {"refused",
-         [&](auto* h, auto* s) { zvckmservo_writeServoConfigJson(h, "{", s); },
-         {-52000, -52005}},
-        {"read",
-         [&](auto* h, auto* s) { zvckmservo_readServoConfigJson(h, buffer, sizeof buffer, s); },
-         {-52000, -52003}},
-        {"metadata",
-         [&](auto* h, auto* s) { zvckmservo_applyMetaData(h, metaData, s); },
-         {-52000, -52005}},
-        {"type error",
-         [&](auto* h, auto* s) { zvckmservo_applyMetaData(h, R"({"selectedTRInstID":1})", s); },
-         {-52000, -52004, -52005}},
-        {"pair",
-         [&](auto* h, auto* s) { zvckmservo_adjustTime(h, 5 * kSecond, 5 * kSecond, s); },
-         {-52000}},
-        {"clear", [](auto* h, auto* s) { zvckmservo_clearHistory(h, s); }, {}},
-        {"time",
-         [&](auto* h, auto* s) {
-             uint64_t t = 0;
-             zvckmservo_getTime(h, &t, s);
-         },
-         {}},
-    };
-    for (const Row& row : rows) {
-        long n = 1;
-        for (bool fired = true; fired; ++n) {
-            SCOPED_TRACE(testing::Message() << row.name << ", allocation " << n);
-            const long before = allocator::liveBlocks();
-            {
-                tFakeHost host;
-                host.open().config().setSpikeFilterEnabled(true);
-                lockIn(host);
-                host.takeCalls();
-                host.status.reset();
-                {
-                    const allocator::tFailNth failing(n);
-                    row.call(&host.table, &host.status.record);
-                    fired = failing.fired();
-                }
-                EXPECT_TRUE(!fired || row.codes.count(host.code()) == 1) << host.code();
-                host.status.reset();
-                row.call(&host.table, &host.status.record);
-                EXPECT_NE(-52000, host.code()) << "works again";
-                expectLockFree(host);
-            }
-            EXPECT_EQ(before, allocator::liveBlocks());
-        }
-    }
-    cJSON_InitHooks(nullptr);
 }
 
 } // namespace

@@ -3,7 +3,6 @@
 #include <atomic>
 #include <cstddef>
 #include <cstdlib>
-#include <new>
 
 // The linker sends malloc and free of this program's own objects here (--wrap).
 extern "C" {
@@ -35,33 +34,6 @@ void __wrap_free(void* block) noexcept
     if (block != nullptr) ++freeCount;
     __real_free(block);
 }
-
-void* operator new(size_t size)
-{
-    void* const block = __wrap_malloc(size);
-    if (block == nullptr) throw std::bad_alloc();
-    return block;
-}
-
-void* operator new[](size_t size) { return operator new(size); }
-
-void* operator new(size_t size, const std::nothrow_t& /*tag*/) noexcept
-{
-    return __wrap_malloc(size);
-}
-
-void* operator new[](size_t size, const std::nothrow_t& /*tag*/) noexcept
-{
-    return __wrap_malloc(size);
-}
-
-void operator delete(void* block) noexcept { __wrap_free(block); }
-
-void operator delete[](void* block) noexcept { __wrap_free(block); }
-
-void operator delete(void* block, size_t /*size*/) noexcept { __wrap_free(block); }
-
-void operator delete[](void* block, size_t /*size*/) noexcept { __wrap_free(block); }
 
 namespace allocator {
 
