@@ -476,6 +476,59 @@ TEST(StateMachine, AHostMayCallBackAndThePairGoesOnWhereItWas)
     play(host, kLockIn + "4 100 get set -110 | 5 0");
 }
 
+TEST(StateMachine, AHostMayCallBackFromEveryOperation)
+{
+    using tCall = void (*)(zvckmservo_HostTable*, zverr_Status*);
+    const tCall calls[] = {
+        [](auto* h, auto* s) { zvckmservo_clearHistory(h, s); },
+        [](auto* h, auto* s) { zvckmservo_adjustTime(h, 9 * kSecond, 9 * kSecond, s); },
+        [](auto* h, auto* s) { zvckmservo_adjustTime(h, 9 * kSecond, 12 * kSecond, s); },
+        [](auto* h, auto* s) {
+            const char* const fewer = R"({"spikeFilterHistorySize":2,"spikeFilterEnabled":1})";
+            zvckmservo_writeServoConfigJson(h, fewer, s);
+        },
+        [](auto* h, auto* s) {
+            char buffer[512];
+            zvckmservo_readServoConfigJson(h, buffer, sizeof buffer, s);
+        },
+        [](auto* h, auto* s) { zvckmservo_applyMetaData(h, "{}", s); },
+        [](auto* h, auto* s) {
+            uint64_t time = 0;
+            zvckmservo_getTime(h, &time, s);
+        },
+    };
+    for (const std::string operation : {"getTime", "stepTime", "getFrequency", "setFrequency"}) {
+        for (const tCall call : calls) {
+            tFakeHost host;
+            host.open().config().setSpikeFilterEnabled(true);
+            bool inside = false;
+            int times = 0;
+            host.inOperation = [&](const std::string& present, zverr_Status*) {
+                if (inside || present != operation) return;
+                inside = true;
+                ++times;
+                tHostStatus inner;
+                call(&host.table, &inner.record);
+                EXPECT_EQ(0, inner.code());
+                inside = false;
+            };
+            uint64_t time = 0;
+            for (uint64_t seconds = 1; seconds < 20; ++seconds) {
+                const uint64_t aheadNs = seconds == 3 ? 5000 : seconds % 7 * 100;
+                host.pair(seconds * kSecond, seconds * kSecond + aheadNs);
+                EXPECT_EQ(0, host.code());
+                zvckmservo_getTime(&host.table, &time, &host.status.record);
+            }
+            EXPECT_GT(times, 0) << operation;
+            host.inOperation = nullptr;
+            host.clearHistory();
+            host.takeCalls();
+            host.offsetPpb = 0;
+            play(host, kLockIn);
+        }
+    }
+}
+
 TEST(PhaseLock, ALockedPairAllocatesNothingOnceTheHistoryIsFull)
 {
     for (const uint32_t historySize : {5U, 100U}) {
