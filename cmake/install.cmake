@@ -12,13 +12,15 @@ set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/dravik)
 
 install(TARGETS dravik EXPORT dravikTargets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
+    COMPONENT library NAMELINK_COMPONENT development
     INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
-install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-install(DIRECTORY include/zvckmservo include/zverr DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(FILES config/dravik_tr_ptp4l_tab.json config/dravik_tr_ptp4l_bc.json
-    DESTINATION ${DRAVIK_SERVOS_DIR})
+    DESTINATION ${DRAVIK_SERVOS_DIR} COMPONENT library)
+install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT host)
 
-install(EXPORT dravikTargets NAMESPACE dravik:: DESTINATION ${package_dir})
+install(DIRECTORY include/zvckmservo include/zverr DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
+    COMPONENT development)
+install(EXPORT dravikTargets NAMESPACE dravik:: DESTINATION ${package_dir} COMPONENT development)
 configure_package_config_file(cmake/dravikConfig.cmake.in dravikConfig.cmake
     INSTALL_DESTINATION ${package_dir})
 write_basic_package_version_file(dravikConfigVersion.cmake COMPATIBILITY SameMajorVersion)
@@ -27,5 +29,6 @@ file(RELATIVE_PATH include_from_pkgconfig
     ${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig ${CMAKE_INSTALL_FULL_INCLUDEDIR})
 configure_file(cmake/dravik.pc.in dravik.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/dravikConfig.cmake ${PROJECT_BINARY_DIR}/dravikConfigVersion.cmake
-    DESTINATION ${package_dir})
-install(FILES ${PROJECT_BINARY_DIR}/dravik.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+    DESTINATION ${package_dir} COMPONENT development)
+install(FILES ${PROJECT_BINARY_DIR}/dravik.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig
+    COMPONENT development)
