@@ -1,13 +1,16 @@
-/* A host in C: loads the library, uses it, closes it, and finds it gone from the process; from a
- * thread, too, that has been told to end. */
+/* A host in C: loads the library, uses it, closes it, and finds it gone from the process, time
+ * after time without growing; from a thread, too, that has been told to end. Usage: unload_test
+ * LIBRARY ROUNDS */
 
 #include "zvckmservo/servo.h"
 
 #include <dlfcn.h>
+#include <malloc.h>
 #include <pthread.h>
 #include <stdio.h>
 #include <stdlib.h>
 #include <string.h>
+#include <sys/resource.h>
 
 static int32_t offsetPpb = 0;
 static int32_t failure = 0;
@@ -120,12 +123,35 @@ static void* useCancelled(void* path)
     return NULL;
 }
 
+/* Bytes in allocated blocks. */
+static size_t allocated(void) { return mallinfo2().uordblks; }
+
+/* The most memory that was resident so far, in KiB. */
+static long resident(void)
+{
+    struct rusage usage;
+    check(getrusage(RUSAGE_SELF, &usage) == 0, "no resource usage");
+    return usage.ru_maxrss;
+}
+
 int main(int argc, char** argv)
 {
-    check(argc == 2, "usage: unload_test LIBRARY");
-    for (int round = 0; round < 3; ++round) {
+    check(argc == 3 || argc == 4, "usage: unload_test LIBRARY ROUNDS [KIB]");
+    const long rounds = strtol(argv[2], NULL, 10);
+    size_t bytes = 0;
+    long kib = 0;
+    for (long round = 0; round < rounds; ++round) {
         useAndClose(argv[1]);
+        if (round > rounds / 10) continue; /* what is allocated only once is there by then */
+        bytes = allocated();
+        kib = resident();
     }
+    const long moreBytes = (long)(allocated() - bytes);
+    const long moreKib = resident() - kib;
+    printf("%ld rounds: %ld bytes and %ld KiB more\n", rounds, moreBytes, moreKib);
+    check(moreBytes < 4096, "allocated memory grows"); /* the loader's own lists come and go */
+    check(argc == 3 || moreKib <= strtol(argv[3], NULL, 10), "resident memory grows");
+
     pthread_t thread = 0;
     void* result = NULL;
     check(pthread_create(&thread, NULL, useCancelled, argv[1]) == 0, "no thread");
