@@ -125,7 +125,8 @@ TEST(Boundary, ANegativeStatusStopsEveryCall)
         zvckmservo_clearHistory(&host.table, &failed.record);
         zvckmservo_adjustTime(&host.table, 4 * kSecond, 4 * kSecond, &failed.record);
         zvckmservo_getTime(&host.table, &time, &failed.record);
-        EXPECT_EQ(1, zvckmservo_writeServoConfigJson(&host.table, "{}", &failed.record));
+        EXPECT_EQ(1, zvckmservo_writeServoConfigJson(&host.table, R"({"phaseLockGain":2})",
+                                                     &failed.record));
         EXPECT_EQ(1, zvckmservo_readServoConfigJson(&host.table, buffer, 3, &failed.record));
         zvckmservo_applyMetaData(&host.table, "{}", &failed.record);
         EXPECT_EQ(handle, host.table.servoHandle);
@@ -135,8 +136,8 @@ TEST(Boundary, ANegativeStatusStopsEveryCall)
         EXPECT_EQ(R"({"first":"failure"})", failed.text());
         EXPECT_EQ("", host.takeCalls());
     }
-    host.pair(4 * kSecond, 4 * kSecond);
-    EXPECT_EQ("get set 0", host.takeCalls()) << "still in phase lock";
+    host.pair(4 * kSecond, 4 * kSecond + 100);
+    EXPECT_EQ("get set -110", host.takeCalls()) << "still in phase lock, as it was";
 }
 
 TEST(Boundary, AWarningStopsNothingAndStays)

@@ -147,11 +147,11 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
         {"nothing", "{}", "", defaults},
         {"no object", "[1]", "", defaults},
         {"all",
-         R"({"frequencyLockGain":2,"phaseLockGain":3,"phaseLockCoefficientA":4,)"
+         R"({"frequencyLockGain":2,"phaseLockGain":8.2,"phaseLockCoefficientA":4,)"
          R"("phaseLockCoefficientB":5,"phaseLockCoefficientC":6,"snapTimeThreshold":7,)"
          R"("spikeFilterEnabled":1,"spikeFilterHistorySize":8,"spikeFilterMaxThreshold":9,)"
          R"("spikeFilterMinThreshold":1.5,"spikeFilterGrowthFactor":10} behind)",
-         "", "2 3 4 5 6 7 1 8 9 1.5 10 "},
+         "", "2 8.2 4 5 6 7 1 8 9 1.5 10 "},
         {"any case, others ignored", R"({"x":{},"SNAPTIMETHRESHOLD":0.001})", "",
          "1 0.55 2 1 1 0.001 0 5 1 2.5e-08 3 "},
         {"first match", R"({"PhaseLockGain":2,"phaseLockGain":3})", "",
@@ -208,6 +208,33 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
               R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
               R"("std_exception_what":"no configuration text"})",
               host.status.text());
+}
+
+TEST(Document, RefusesTheFirstBadMemberInItsOrder)
+{
+    struct Row {
+        const char* key;
+        int line; // of the refusal, in the accessor for the flag
+    };
+    const Row rows[] = {
+        {"frequencyLockGain", 77},        {"phaseLockGain", 98},
+        {"phaseLockCoefficientA", 119},   {"phaseLockCoefficientB", 140},
+        {"phaseLockCoefficientC", 161},   {"snapTimeThreshold", 182},
+        {"spikeFilterEnabled", 61},       {"spikeFilterHistorySize", 235},
+        {"spikeFilterMaxThreshold", 256}, {"spikeFilterMinThreshold", 277},
+        {"spikeFilterGrowthFactor", 298},
+    };
+    tFakeHost host;
+    iServoConfig& config = host.open().config();
+    std::string bad; // from the last one on
+    for (size_t i = std::size(rows); i-- > 0;) {
+        bad.insert(0, std::string("\"") + rows[i].key +
+                          (rows[i].line == 61 ? "\":\"\"" : "\":999") + (bad.empty() ? "" : ","));
+        EXPECT_NE(std::string::npos, raisedBy([&] {
+                                         config.writeServoConfigJson("{" + bad + "}");
+                                     }).find(R"("line":)" + std::to_string(rows[i].line)))
+            << rows[i].key;
+    }
 }
 
 // DRAVIK_ROUND_TRIPS in the environment makes it as long as one likes.

@@ -155,7 +155,11 @@ struct tHost {
         status.code = 0;
     }
     void initialize() { library.initialize(&table, &status); }
-    void write(const char* document) { library.writeConfig(&table, document, &status); }
+    void write(const char* document)
+    {
+        const int result = library.writeConfig(&table, document, &status);
+        expect(result == (status.code < 0 ? 1 : 0), "wrong result");
+    }
     void pair()
     {
         library.adjustTime(&table, trueNs, trueNs + static_cast<uint64_t>(std::llround(aheadNs)),
@@ -166,7 +170,11 @@ struct tHost {
         trueNs += 1000000000U;
         aheadNs += 30000.0 + orderedPpb;
     }
-    void read(char (&text)[1024]) { library.readConfig(&table, text, sizeof text, &status); }
+    void read(char (&text)[1024])
+    {
+        const int result = library.readConfig(&table, text, sizeof text, &status);
+        expect(result == (status.code < 0 ? 1 : 0), "wrong result");
+    }
     std::string config()
     {
         char text[1024] = {};

@@ -133,10 +133,12 @@ expect "a warning each" "4 no default configuration for IEEE 802.1AS-2011 TAB: i
 for ((n = 1; ; ++n)); do
     settle FAIL_ALLOCATION=$n RELOCATIONS="multiarchlibdir=$scratch/lib"
     [ "$(value allocationFailed)" == 1 ] || break
+    [[ "$(value log)" == *"no memory for the default configurations"* ]] && warned=1
     code=$(value bindir)
     expect "bindir after allocation $n" 1 "$(grep -cE '^(/usr/bin|-52000 .*"line":(32|346),.*)$' <<< "$code")"
 done
 expect "the load did allocate" 1 $((n > 50))
+expect "a table that finds no memory is told" 1 "${warned:-0}"
 
 echo "$checks checks, $failures failures, $((n - 1)) allocations"
 exit $((failures > 0))

@@ -8,6 +8,8 @@
 #include "zverr/errStatus.h"
 #include "zverr/jsonzLookup.h"
 #include "zverr/tools/exception_errStatus.h"
+#include "zvhostq/stdpath.h"
+#include "zvhostq/stdpath_table.h"
 #include "zvhostq/stdpath_util.h"
 #include "zvktl/err/string.h"
 #include "zvktl/err/vector.h"
@@ -212,8 +214,13 @@ TEST(Memory, ArraysAreNullAfterAFailureAndWithoutMemory)
     EXPECT_EQ(nullptr, arrayFor(&failed.record));
     EXPECT_EQ(R"({"b":2})", failed.text());
     tHostStatus warned(2, R"({"component":"old"})");
-    const allocator::tFailNth failing(1);
-    EXPECT_EQ(nullptr, arrayFor(&warned.record));
+    tHostStatus throwing;
+    throwing.mode = tHostStatus::kThrow;
+    for (tHostStatus* const status : {&throwing, &warned}) {
+        const allocator::tFailNth failing(1);
+        EXPECT_EQ(nullptr, arrayFor(&status->record));
+    }
+    EXPECT_EQ(-52000, throwing.code());
     EXPECT_EQ(-52000, warned.code());
     EXPECT_EQ(R"({"file":"zvplat/protons/cppNewDelete/memoryAllocation","line":346,)"
               R"("component":"dravik"})",
@@ -476,10 +483,15 @@ TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
 {
     const std::string path = testing::TempDir() + "dravik_" + std::to_string(getpid());
     std::ofstream(path) << "abc";
-    const std::string folder =
+    int pipeEnds[2];
+    ASSERT_EQ(0, pipe(pipeEnds));
+    const std::string pipePath = "/proc/self/fd/" + std::to_string(pipeEnds[0]);
+    const std::string notRead =
         R"({"error_constant":"zvplaterr_osFault","file":"zvhostq/stdpath_util","line":249,)"
-        R"("component":"dravik","internal_error":{"api":"errno","code":21,)"
-        R"("string":"Is a directory"},"zvhostq_debug":{)"
+        R"("component":"dravik","internal_error":{"api":"errno","code":)";
+    const std::string folder =
+        notRead +
+        R"(21,"string":"Is a directory"},"zvhostq_debug":{)"
         R"("desc":"didn't read full content of file","fileSize":0,"fread_return":0,"filename":)";
     struct Row {
         const char* name;
@@ -501,6 +513,12 @@ TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
         {"a folder", "/", 0, "old content", -52008, folder + R"("/"}})"},
         {"a folder that looks empty", "/proc/self", 0, "old content", -52008,
          folder + R"("/proc/self"}})"},
+        {"a pipe", pipePath, 0, "old content", -52008,
+         notRead +
+             R"(29,"string":"Illegal seek"},"zvhostq_debug":{)"
+             R"("desc":"didn't read full content of file","fileSize":4294967295,"fread_return":0,)"
+             R"("filename":")" +
+             pipePath + R"("}})"},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
@@ -514,7 +532,29 @@ TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
         EXPECT_EQ(row.text, status.text());
         EXPECT_EQ(row.content, textOf(content));
     }
+    close(pipeEnds[0]);
+    close(pipeEnds[1]);
+    tHostStatus status;
+    tBytes content;
+    {
+        const allocator::tFailNth failing(1);
+        zvhostq::read_whole_file(path.c_str(), &content, &status.record);
+    }
+    EXPECT_EQ(-52000, status.code());
+    EXPECT_EQ(0U, content.size);
     (void)std::remove(path.c_str());
+    std::string shared = "old";
+    zvhostq::read_shared_dir(shared, &status.record);
+    EXPECT_EQ("old", shared) << "under a failure";
+}
+
+TEST(StandardDirectories, AreNotThereUnderAnotherName)
+{
+    tHostStatus status;
+    string value;
+    zvhostq::stdpath_table::instance(&status.record)
+        .get(string("bin", &status.record), &value, &status.record);
+    EXPECT_EQ(-52008, status.code());
 }
 
 TEST(DebugLine, KeepsItsFormHoweverLongItsParts)

@@ -75,6 +75,7 @@ TEST(TimeSpan, DifferencesWrapAndComparisonsLookAtTheSignFirst)
         {tTimeSpan(uint64_t{7}), tTimeSpan(uint64_t{7}), 0, false, true},
         {tTimeSpan(3U, -1), tTimeSpan(5U, -1), 2, true, true},
         {tTimeSpan(5U, -1), tTimeSpan(3U, -1), -2, false, false},
+        {tTimeSpan(5U, -1), tTimeSpan(5U, -1), 0, false, true},
         {tTimeSpan(uint64_t{1}), tTimeSpan(9U, -1), 10, true, true},
         {tTimeSpan(9U, -1), tTimeSpan(uint64_t{1}), -10, false, false},
         {tTimeSpan(1U, -1), tTimeSpan(uint64_t{9}), -10, false, false},
@@ -226,6 +227,7 @@ TEST(Timekeeper, SendsWholePartsPerBillionAndExactSteps)
     const double half = 1.0 / 1024; // 976562.5 parts per billion, exactly
     const Row rows[] = {
         {1.0, "0"},
+        {1.0 + 0.7e-9, "1"},
         {1.0 + half, "976563"},
         {1.0 - half, "-976563"},
         {4.0, "2147483647"},
@@ -327,6 +329,16 @@ TEST(StateMachine, LeadsPairsThroughTheStates)
         host.initialize();
         host.takeCalls();
         play(host, row.script);
+    }
+}
+
+TEST(StateMachine, IdleAndWhatIsNoStateLeaveTheClockAlone)
+{
+    for (const uint32_t id : {0U, 4U}) {
+        tFakeHost host;
+        host.open().controller().setState(static_cast<zvckmDravik::tServoStateId>(id));
+        host.takeCalls();
+        play(host, "1 0 | 2 0 | 3 1000000 | clear | 4 0 | 5 0 get set 0");
     }
 }
 
@@ -435,13 +447,18 @@ TEST(StateMachine, OneLockCoversAPairAndEveryOtherCall)
 {
     tFakeHost host;
     tOpenServo& servo = host.open();
-    play(host, kLockIn);
     const std::function<void()> others[] = {
         [&] { servo.config().getPhaseLockGain(); },
         [&] { servo.config().setPhaseLockGain(0.55); },
         [&] { servo.controller().setState(zvckmDravik::kStatePhaseLock); },
+        [&] { servo.writeServoConfigJson("{}"); },
+        [&] { servo.readServoConfigJson(); },
+        [&] { servo.readConfigFile("/none"); },
+        [&] { servo.applyMetaData("{}"); },
     };
     for (const std::function<void()>& other : others) {
+        host.takeCalls();
+        play(host, "clear | 1 0"); // the states involved take no lock themselves
         std::atomic<bool> through{false};
         std::thread thread;
         host.inOperation = [&](const std::string& operation, zverr_Status*) {
@@ -454,7 +471,7 @@ TEST(StateMachine, OneLockCoversAPairAndEveryOtherCall)
             std::this_thread::sleep_for(std::chrono::milliseconds(20));
             EXPECT_FALSE(through) << operation; // the pair's second operation included
         };
-        host.pair(4 * kSecond, 4 * kSecond);
+        host.pair(2 * kSecond, 2 * kSecond);
         thread.join();
         through = false;
         uint64_t time = 0;

@@ -94,6 +94,7 @@ TEST(Status, StandardReallocationSizes)
         EXPECT_TRUE(zverr_defaultReallocJson(&status.record, 1)) << "never made smaller";
         EXPECT_EQ(row.capacity, status.record.capacity);
         EXPECT_FALSE(zverr_defaultReallocJson(&status.record, 0x80000000U));
+        EXPECT_FALSE(zverr_defaultReallocJson(&status.record, UINT32_MAX));
         EXPECT_EQ(row.capacity, status.record.capacity);
         const char* const buffer = status.record.json;
         EXPECT_TRUE(zverr_defaultReallocJson(&status.record, row.capacity));
@@ -123,6 +124,8 @@ TEST(Status, TextsGrowTheBufferAtItsEdge)
     const std::string tooLong(2000, 'y');
     const allocator::tFailNth failing(1);
     EXPECT_FALSE(zverr_setJson(&status.record, tooLong.c_str()));
+    const allocator::tFailNth failingAgain(1);
+    EXPECT_FALSE(zverr_defaultReallocJson(&status.record, 2000));
     EXPECT_EQ("xxx", status.text());
 }
 
@@ -150,6 +153,7 @@ TEST(Status, TakingMovesBetweenEqualsAndCopiesOtherwise)
     EXPECT_EQ(0U, source.record.capacity);
     EXPECT_EQ(-7, source.record.code);
     EXPECT_FALSE(zverr_takeStatus(&source.record, &target.record)) << "a failure is not replaced";
+    EXPECT_FALSE(zverr_copyStatus(&source.record, &target.record));
     EXPECT_EQ(buffer, target.record.json);
 
     tHostStatus taker;
@@ -374,8 +378,10 @@ TEST(Payload, GrowsByDoublingAndEndsWithAHostThatGrantsNothing)
         EXPECT_EQ(capacity, own.record.capacity);
         expectBufferForm(own.record);
     }
-    own.record.capacity = 0x80000000U; // the largest there can be
-    EXPECT_EQ(nullptr, zverr_growJson(own.record.json + 1, &own.record));
+    for (const uint32_t capacity : {0x80000000U, 0x80000002U}) { // the largest, and beyond
+        own.record.capacity = capacity;
+        EXPECT_EQ(nullptr, zverr_growJson(own.record.json + 1, &own.record));
+    }
     own.record.capacity = 2048;
 
     tHostStatus host(0, "{}");
@@ -398,6 +404,9 @@ TEST(Payload, WriterStopsAtTheFirstMemberThatDoesNotFit)
     zverr_JsonWriter().addUInt("u", 1).addObject("o").endObject().addSource({"f", 1, "c"});
     zverr_JsonWriter(&host.record).addSource({"f", 7, nullptr});
     EXPECT_EQ(R"({"o":{"i":-1,"s":"v"},"p":{},"file":"f","line":7})", host.text());
+    tHostStatus empty;
+    zverr_JsonWriter(&empty.record).addObject("o").endObject().addUInt("u", 1);
+    EXPECT_EQ(R"({"o":{},"u":1})", empty.text());
 }
 
 TEST(Payload, TakesMegabytesInTimeThatGrowsWithThem)
