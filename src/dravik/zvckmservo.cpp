@@ -49,7 +49,7 @@ void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_Status* status)
     const tCancellationPause pause;
     try {
         servoOf(host).clearHistory();
-    } catch (...) {
+    } catch (...) { // unreached: no state raises when it is left or entered, but they may come to
         zverr_exceptionToStatus(status);
     }
 }

@@ -13,6 +13,7 @@ void addLoadersWord(zverr_JsonWriter& writer)
     const char* const word = dlerror();
     writer.addObject("internal_error")
         .addString("api", "dlerror")
+        // unreached: null for a symbol at address 0, which only a linker script makes
         .addString("string", word != nullptr ? word : "")
         .endObject();
 }

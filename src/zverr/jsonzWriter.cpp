@@ -87,6 +87,7 @@ bool hasRoom(const char* terminator, uint64_t room)
 // As jsonz_openGap, for a length that was counted and may be beyond any buffer's size.
 char* openGapFor(char* position, uint64_t length)
 {
+    // unreached: beyond, as a test would need 4 GB
     return length <= UINT32_MAX ? jsonz_openGap(position, static_cast<uint32_t>(length)) : nullptr;
 }
 

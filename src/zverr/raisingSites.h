@@ -19,6 +19,8 @@ struct zverr_RaisingSite {
 
 namespace zverr {
 
+// unreached: the compiler runs these functions.
+
 // The component of every failure that the plug-in raises.
 constexpr const char* kComponent = "dravik";
 

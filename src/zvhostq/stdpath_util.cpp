@@ -22,6 +22,7 @@ void addErrno(zverr_JsonWriter& writer, int error)
 {
     char buffer[256] = "";
     const char* const returned = strerror_r(error, buffer, sizeof buffer);
+    // unreached: glibc always gives a text, and in the buffer only for numbers that nothing sets
     const char* const text = buffer[0] != 0 ? buffer : returned;
     writer.addObject("internal_error").addString("api", "errno").addInt("code", error);
     if (text != nullptr) writer.addString("string", text);
@@ -54,6 +55,7 @@ void reportNotRead(const char* filename, int error, long fileSize, size_t count,
 bool isFolder(FILE* file)
 {
     struct stat information;
+    // unreached: false, as an open file can be told about
     return fstat(fileno(file), &information) == 0 && S_ISDIR(information.st_mode);
 }
 
@@ -79,6 +81,7 @@ void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zv
     (void)std::fseek(file.get(), 0, SEEK_END);
     const long fileSize = std::ftell(file.get());
     // A pipe has none, and one that is too large to be true leaves no room for the zero byte.
+    // unreached: too large, which few file systems tell and only of folders
     if (fileSize < 0 || fileSize == LONG_MAX) {
         const int error = fileSize < 0 ? errno : EOVERFLOW;
         return reportNotRead(filename, error, fileSize, 0, status);
@@ -89,6 +92,7 @@ void read_whole_file(const char* filename, zvktl::err::vector<char>* content, zv
     if (status->code < 0) return;
     errno = 0; // a file that has shrunk is no fault of the system's
     const size_t count = std::fread(content->data, 1, size, file.get());
+    // unreached: a failing medium, or a file that shrinks between these lines
     if (count != size) reportNotRead(filename, errno, fileSize, count, status);
     content->data[size] = 0;
 }
