@@ -192,6 +192,12 @@ TEST(StatusGuard, RaisesFailuresOnlyAndOnlyOutsideAnUnwinding)
         buffer = nullptr;
     }
     EXPECT_EQ(nullptr, buffer) << "it did throw";
+    EXPECT_THROW(
+        {
+            zverr::tStatusGuard guard;
+            guard.code = -1; // and no payload
+        },
+        zverr::Exception);
 
     EXPECT_NO_THROW({
         zverr::tStatusGuard guard;
