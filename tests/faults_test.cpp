@@ -30,7 +30,8 @@ using faults::tKind;
 constexpr const char* kKindNames[] = {"allocation", "exhaustion", "file", "mutex", "operation"};
 
 int failures = 0;
-std::string where; // of the round at hand
+std::string where;      // of the round at hand
+bool toldPlace = false; // a failure named the line that found no memory for a document
 
 void expect(bool good, const std::string& what)
 {
@@ -282,6 +283,7 @@ void expectForm(const zverr_Status& status)
     expect(text.size() + 2 <= status.capacity && status.json[status.capacity - 1] == 'J',
            "buffer without its end mark");
     expect(text.front() == '{' && text.back() == '}', "payload is no object: " + text);
+    toldPlace |= text.find(R"("file":"dravik/tJsonConfig","line":16,)") != std::string::npos;
     if (status.code == -52000 && text != "{}") {
         expect(text.find(R"({"error_constant":"zvplaterr_memoryFull")") == 0, text);
     }
@@ -475,6 +477,7 @@ int main(int argc, char** argv)
         }
         std::printf("\n");
     }
+    expect(toldPlace, "no memory for a document, and no word where");
     std::printf("%d failures\n", failures);
     return failures > 0 ? 1 : 0;
 }
