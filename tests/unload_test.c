@@ -46,6 +46,7 @@ static void setFrequency(int32_t ppb, zverr_Status* status)
 static int32_t getLimit(zverr_Status* status)
 {
     (void)status;
+    pthread_testcancel();
     return 500000;
 }
 
