@@ -2,10 +2,10 @@
 // clock. simulate and run choose a clock and a source of pairs, and share the loop; check and show
 // work on the configuration.
 
-#include "check.h"
-#include "run.h"
-#include "show.h"
-#include "simulate.h"
+#include "verbs/check.h"
+#include "verbs/run.h"
+#include "verbs/show.h"
+#include "verbs/simulate.h"
 
 #include <cstdio>
 #include <exception>

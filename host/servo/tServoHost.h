@@ -1,0 +1,40 @@
+#pragma once
+
+#include "clocks/iClock.h"
+#include "servo/tHostCall.h"
+#include "servo/tServoLibrary.h"
+
+#include <string>
+
+// One clock under the plug-in's discipline: initialised with the scope, finalised at its end.
+class tServoHost
+{
+public:
+    // Library and clock are borrowed. Throws std::runtime_error with the plug-in's code.
+    tServoHost(const tServoLibrary& plugIn, iClock& clock);
+    tServoHost(const tServoHost&) = delete; // the plug-in keeps the address of the table
+    tServoHost& operator=(const tServoHost&) = delete;
+    ~tServoHost();
+
+    // Throws std::runtime_error with code and payload; the calls made until then are kept.
+    void adjustTime(uint64_t referenceNs, uint64_t clockNs);
+
+    // The texts of the plug-in. Throw std::runtime_error; of a refused document it says why.
+    void writeConfig(const std::string& document);
+    std::string readConfig();
+    void applyMetaData(const std::string& metaData);
+
+    // What the plug-in asked of the clock during the last pair, or during initialisation.
+    const tHostCalls& calls() const { return subject.calls; }
+
+    // What the operations work on, as they are told nothing about it.
+    struct tSubject {
+        iClock& clock;
+        tHostCalls calls;
+    };
+
+private:
+    const tServoLibrary& library;
+    tSubject subject;
+    zvckmservo_HostTable table;
+};

@@ -1,0 +1,30 @@
+#include "sources/tSimulatedSource.h"
+
+#include <cmath>
+
+tSimulatedSource::tSimulatedSource(tSimulatedClock& simulated, const tMeasurementModel& measurement,
+                                   tNoise& randomness)
+    : clock(simulated), model(measurement), noise(randomness), elapsedNs(-measurement.intervalNs)
+{}
+
+std::optional<tPair> tSimulatedSource::next()
+{
+    if (elapsedNs + model.intervalNs >= model.durationNs) return std::nullopt;
+    elapsedNs += model.intervalNs;
+    if (elapsedNs > 0) clock.advance(model.intervalNs);
+
+    const auto cut = [this](uint64_t ns) { return ns - ns % model.granularityNs; };
+    const uint64_t trueNs = kStartNs + static_cast<uint64_t>(elapsedNs);
+    const uint64_t seenNs = trueNs + static_cast<uint64_t>(disturbanceNs());
+    return tPair{elapsedNs, cut(seenNs), cut(clock.timeNs()), clock.aheadOfNs(trueNs)};
+}
+
+// One number decides whether the pair is an outlier, and of which sign.
+int64_t tSimulatedSource::disturbanceNs()
+{
+    double sumNs = model.noiseNs * noise.normal();
+    const double chance = noise.uniform();
+    if (chance < model.outlierRate)
+        sumNs += chance < model.outlierRate / 2 ? -model.outlierSizeNs : model.outlierSizeNs;
+    return static_cast<int64_t>(std::floor(sumNs));
+}

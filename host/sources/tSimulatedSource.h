@@ -1,0 +1,35 @@
+#pragma once
+
+#include "clocks/tSimulatedClock.h"
+#include "sources/iPairSource.h"
+#include "sources/tNoise.h"
+
+struct tMeasurementModel {
+    int64_t intervalNs = 0;
+    int64_t durationNs = 0;
+    double noiseNs = 0;         // white, standard deviation
+    double outlierRate = 0;     // 0 to 1
+    double outlierSizeNs = 0;   // added with either sign
+    uint64_t granularityNs = 1; // of both timestamps
+};
+
+// Pairs in simulated time: a perfect reference, seen through noise, and the simulated clock.
+class tSimulatedSource : public iPairSource
+{
+public:
+    static constexpr uint64_t kStartNs = 1'700'000'000'000'000'000;
+
+    // Clock and noise are borrowed; the clock is moved on from pair to pair.
+    tSimulatedSource(tSimulatedClock& simulated, const tMeasurementModel& measurement,
+                     tNoise& randomness);
+
+    std::optional<tPair> next() override;
+
+private:
+    int64_t disturbanceNs();
+
+    tSimulatedClock& clock;
+    tMeasurementModel model;
+    tNoise& noise;
+    int64_t elapsedNs; // of the pair given last
+};

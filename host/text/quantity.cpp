@@ -1,0 +1,75 @@
+#include "text/quantity.h"
+
+#include <fmt/format.h>
+
+#include <charconv>
+#include <cmath>
+#include <stdexcept>
+
+const tQuantityKind kDuration = {
+    "TIME", {{"ns", 1}, {"us", 1e3}, {"ms", 1e6}, {"s", 1e9}, {"min", 60e9}, {"h", 3600e9}, {}}};
+const tQuantityKind kFrequency = {"OFFSET", {{"ppb", 1}, {"ppm", 1e3}, {}}};
+const tQuantityKind kRatio = {"PERCENT", {{"%", 0.01}, {}}};
+
+namespace {
+
+[[noreturn]] void refuse(std::string_view text, std::string_view why)
+{
+    throw std::invalid_argument(fmt::format("'{}' {}", text, why));
+}
+
+// "ns, us or ms"
+std::string unitList(const tQuantityKind& kind)
+{
+    std::string list = kind.units[0].name;
+    for (const tUnit* unit = kind.units + 1; unit->size != 0; ++unit)
+        list += fmt::format("{}{}", unit[1].size != 0 ? ", " : " or ", unit->name);
+    return list;
+}
+
+// Splits the number off the text.
+double takeNumber(std::string_view& rest)
+{
+    const std::string_view text = rest;
+    if (rest.size() > 1 && rest[0] == '+' && rest[1] != '-') rest.remove_prefix(1);
+    double number = 0;
+    const auto result = std::from_chars(rest.data(), rest.data() + rest.size(), number);
+    if (result.ec == std::errc::result_out_of_range) refuse(text, "is out of range");
+    if (result.ec != std::errc() || !std::isfinite(number))
+        refuse(text, "does not start with a number");
+    rest.remove_prefix(static_cast<size_t>(result.ptr - rest.data()));
+    return number;
+}
+
+std::string inFittingUnit(double ns, bool withSign)
+{
+    const tUnit* unit = kDuration.units;
+    while (unit[1].size <= 1e9 && std::fabs(ns) >= unit[1].size) // up to seconds
+        ++unit;
+    return fmt::format(withSign ? "{:+.4g} {}" : "{:.4g} {}", ns / unit->size, unit->name);
+}
+
+} // namespace
+
+double parseQuantity(std::string_view text, const tQuantityKind& kind)
+{
+    std::string_view rest = text;
+    const double number = takeNumber(rest);
+    if (rest.empty() && number == 0) return 0;
+    if (rest.empty()) refuse(text, fmt::format("has no unit; use {}", unitList(kind)));
+    for (const tUnit* unit = kind.units; unit->size != 0; ++unit)
+        if (rest == unit->name) return number * unit->size;
+    refuse(text, fmt::format("has an unknown unit '{}'; use {}", rest, unitList(kind)));
+}
+
+std::string durationText(double ns) { return inFittingUnit(ns, false); }
+
+std::string signedDurationText(double ns) { return inFittingUnit(ns, true); }
+
+std::string offsetText(double offsetPpb) { return fmt::format("{:+.3f} ppm", offsetPpb / 1e3); }
+
+std::string secondsText(int64_t ns, int digits)
+{
+    const std::string text = fmt::format("{}.{:09}", ns / 1'000'000'000, ns % 1'000'000'000);
+    return text.substr(0, text.size() - static_cast<size_t>(9 - digits));
+}
