@@ -54,6 +54,22 @@ document taken      |0|"snapTimeThreshold":.10,$|check $scratch/blunt.json
 default, bridges    |0|"spikeFilterEnabled":.1,$|check $config/dravik_tr_ptp4l_tab.json
 default, boundary   |0|"spikeFilterEnabled":.1,$|check $config/dravik_tr_ptp4l_bc.json
 END
+echo '{"snapTimeThreshold": 6e-5}' > "$scratch/calm.json"
+echo '{"phaseLockGain": 2}' > "$scratch/wild.json"
+noisy="simulate --noise 10us --measure-over 10s --config $scratch/calm.json"
+table << END
+measured over 10 s  |0|^ +10\.000 s  frequency measured: \+11\.9.. ppm|$noisy
+held back           |0|^pairs       300 in 299\.000 s; 9 held back$|$noisy
+measured once more  |0|^ +2[0-9]\.000 s  frequency measured|simulate --noise 10us --measure-over 10s
+tuned later         |0|^ +22\.000 s  tuned by $scratch/calm.json$|$noisy --then 10s=$scratch/calm.json
+and still later     |0|^ +72\.000 s  tuned by $scratch/wild.json$|$noisy --then 10s=$scratch/calm.json --then 1min=$scratch/wild.json
+first tuning is back|0|s  tuned as at the start$|$noisy --then 10s=$scratch/wild.json
+then what           |2|--then: '10s' is not AFTER=FILE|simulate --then 10s
+then when           |2|--then: '10' has no unit|simulate --then 10=$scratch/calm.json
+then in order       |2|'5s=b' does not come after|simulate --then 10s=a --then 5s=b
+then not there      |1|^dravik-host: cannot read $scratch/none|simulate --then 10s=$scratch/none
+then refused        |1|err: refused with -52005: it is not JSON|simulate --then 10s=$scratch/err
+END
 check "never locked" 0 "^lock        never$" simulate --frequency-error 600ppm
 expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
 

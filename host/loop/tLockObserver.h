@@ -27,6 +27,7 @@ public:
 
     tLockEvent observe(const tHostCalls& callsOfPair);
     bool locked() const { return state == kLocked; }
+    bool measuring() const { return state == kMeasuring; }
 
 private:
     enum tState { kMeasuring, kMeasured, kSnapped, kLocked };

@@ -54,10 +54,12 @@ void tReport::print(const std::string& text)
 
 void tReport::event(const tPair& pair, tLockEvent event, const tHostCalls& calls)
 {
-    if (event == kNothingNew) return;
-    const std::string error = signedDurationText(static_cast<double>(pair.errorNs()));
-    print(fmt::format("{:>10} s  {}\n", secondsText(pair.elapsedNs, 3),
-                      eventText(event, calls, error)));
+    note(pair, eventText(event, calls, signedDurationText(static_cast<double>(pair.errorNs()))));
+}
+
+void tReport::note(const tPair& pair, const std::string& text)
+{
+    if (!text.empty()) print(fmt::format("{:>10} s  {}\n", secondsText(pair.elapsedNs, 3), text));
 }
 
 void tReport::progress(const tPair& pair, bool locked)

@@ -16,6 +16,7 @@ public:
 
     void print(const std::string& text);
     void event(const tPair& pair, tLockEvent event, const tHostCalls& calls);
+    void note(const tPair& pair, const std::string& text); // "": nothing to say
     void progress(const tPair& pair, bool locked);
 
 private:

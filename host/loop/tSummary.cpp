@@ -20,6 +20,13 @@ void tSummary::addCalls(const tHostCalls& calls)
     }
 }
 
+void tSummary::addHeldBack(const tPair& pair)
+{
+    ++pairs;
+    ++heldBack;
+    lastElapsedNs = pair.elapsedNs;
+}
+
 void tSummary::addPair(const tPair& pair, tLockEvent event, bool locked)
 {
     ++pairs;
@@ -35,7 +42,8 @@ void tSummary::addPair(const tPair& pair, tLockEvent event, bool locked)
 
 std::string tSummary::text() const
 {
-    return fmt::format("pairs       {} in {} s\n", pairs, secondsText(lastElapsedNs, 3)) +
+    const std::string held = heldBack > 0 ? fmt::format("; {} held back", heldBack) : "";
+    return fmt::format("pairs       {} in {} s{}\n", pairs, secondsText(lastElapsedNs, 3), held) +
            lockText() + errorText() + frequencyText() + callsText();
 }
 

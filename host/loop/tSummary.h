@@ -13,6 +13,7 @@ class tSummary
 {
 public:
     void addCalls(const tHostCalls& calls);
+    void addHeldBack(const tPair& pair);
     void addPair(const tPair& pair, tLockEvent event, bool locked);
 
     // Aligned lines, each with its end.
@@ -25,6 +26,7 @@ private:
     std::string callsText() const;
 
     int64_t pairs = 0;
+    int64_t heldBack = 0; // of them
     int64_t lastElapsedNs = 0;
     std::array<int64_t, kHostOperationNames.size()> callCounts{};
 

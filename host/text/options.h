@@ -1,6 +1,5 @@
 #pragma once
 
-#include "servo/tuning.h"
 #include "text/quantity.h"
 
 #include <CLI/CLI.hpp>
@@ -47,18 +46,6 @@ void addQuantity(CLI::App& app, Number& value, const tQuantityOption& option)
         added->default_str(option.byDefault);
     }
 }
-
-// What every verb that disciplines a clock has.
-struct tCommonOptions {
-    int64_t initialOffsetNs = 0;
-    double frequencyErrorPpb = 0;
-    int32_t maxFrequencyOffsetPpb = 0;
-    std::string csv; // "": none; "-": stdout
-    tTuning tuning;
-    std::string library;
-};
-
-void addCommonOptions(CLI::App& app, tCommonOptions& options, const char* initialOffset);
 
 // The name stays empty if the option is not given.
 void addLibraryOption(CLI::App& app, std::string& library);

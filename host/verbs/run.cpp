@@ -1,7 +1,7 @@
 #include "verbs/run.h"
 
 #include "clocks/systemTime.h"
-#include "loop/discipline.h"
+#include "loop/tDiscipline.h"
 #include "sources/tLiveSource.h"
 
 #include <fmt/format.h>
@@ -10,7 +10,8 @@
 
 namespace {
 
-struct tOptions : tCommonOptions {
+struct tOptions : tDisciplineOptions {
+    tInitialError initialError;
     int64_t intervalNs = 0;
     int64_t durationNs = 0; // 0: until the signal
 };
@@ -20,15 +21,12 @@ void run(const tOptions& options)
     const tServoLibrary library(tServoLibrary::find(options.library));
     const tStopSignal stop;
     const uint64_t startNs =
-        systemTimeNs(CLOCK_REALTIME) + static_cast<uint64_t>(options.initialOffsetNs);
-    tSoftClock clock(startNs, options.frequencyErrorPpb, options.maxFrequencyOffsetPpb);
+        systemTimeNs(CLOCK_REALTIME) + static_cast<uint64_t>(options.initialError.offsetNs);
+    tSoftClock clock(startNs, options.initialError.frequencyPpb, options.maxFrequencyOffsetPpb);
     const auto duration = options.durationNs > 0 ? std::optional(options.durationNs) : std::nullopt;
     tLiveSource source(clock, stop, options.intervalNs, duration);
-    const std::string scenario =
-        fmt::format("run: clock {} and {} off; {}",
-                    signedDurationText(static_cast<double>(options.initialOffsetNs)),
-                    offsetText(options.frequencyErrorPpb), library.path);
-    discipline(library, clock, source, scenario, options);
+    tDiscipline(library, clock, options)
+        .run(fmt::format("run: clock {}; {}", options.initialError.text(), library.path), source);
 }
 
 } // namespace
@@ -37,7 +35,8 @@ tVerb addRun(CLI::App& app)
 {
     CLI::App* const verb = app.add_subcommand("run", "Discipline a soft clock in real time");
     const auto options = std::make_shared<tOptions>();
-    addCommonOptions(*verb, *options, "3ms");
+    addInitialErrorOptions(*verb, options->initialError, "3ms");
+    addDisciplineOptions(*verb, *options);
     addQuantity(*verb, options->intervalNs,
                 {"--interval", kDuration, "125ms", "1ms", "24h", "Time from pair to pair"});
     addQuantity(*verb, options->durationNs,

@@ -1,6 +1,6 @@
 #include "verbs/simulate.h"
 
-#include "loop/discipline.h"
+#include "loop/tDiscipline.h"
 #include "sources/tSimulatedSource.h"
 
 #include <fmt/format.h>
@@ -10,7 +10,8 @@
 
 namespace {
 
-struct tOptions : tCommonOptions {
+struct tOptions : tDisciplineOptions {
+    tInitialError initialError;
     tOscillatorModel oscillator;
     tMeasurementModel measurement;
     uint64_t seed = 1;
@@ -60,17 +61,16 @@ void simulate(const tOptions& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
     tOscillatorModel oscillator = options.oscillator;
-    oscillator.frequencyErrorPpb = options.frequencyErrorPpb;
+    oscillator.frequencyErrorPpb = options.initialError.frequencyPpb;
     tNoise noise(options.seed);
     tSimulatedClock clock(tSimulatedSource::kStartNs +
-                              static_cast<uint64_t>(options.initialOffsetNs),
+                              static_cast<uint64_t>(options.initialError.offsetNs),
                           oscillator, options.maxFrequencyOffsetPpb, noise);
     tSimulatedSource source(clock, options.measurement, noise);
-    const std::string scenario =
-        fmt::format("simulate: clock {} and {} off, seed {}; {}",
-                    signedDurationText(static_cast<double>(options.initialOffsetNs)),
-                    offsetText(options.frequencyErrorPpb), options.seed, library.path);
-    discipline(library, clock, source, scenario, options);
+    tDiscipline(library, clock, options)
+        .run(fmt::format("simulate: clock {}, seed {}; {}", options.initialError.text(),
+                         options.seed, library.path),
+             source);
 }
 
 } // namespace
@@ -79,7 +79,8 @@ tVerb addSimulate(CLI::App& app)
 {
     CLI::App* const verb = app.add_subcommand("simulate", "Discipline a simulated clock");
     const auto options = std::make_shared<tOptions>();
-    addCommonOptions(*verb, *options, "1ms");
+    addInitialErrorOptions(*verb, options->initialError, "1ms");
+    addDisciplineOptions(*verb, *options);
     addMeasurementOptions(*verb, options->measurement);
     addOscillatorOptions(*verb, options->oscillator);
     addSeed(*verb, options->seed);
