@@ -3,6 +3,7 @@
 // work on the configuration.
 
 #include "verbs/check.h"
+#include "verbs/replay.h"
 #include "verbs/run.h"
 #include "verbs/show.h"
 #include "verbs/simulate.h"
@@ -33,11 +34,12 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addRun(app), addCheck(app), addShow(app)};
+    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app), addCheck(app),
+                           addShow(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())
-            throw CLI::RequiredError("A verb, simulate, run, check or show,");
+            throw CLI::RequiredError("A verb, such as simulate or run,");
     } catch (const CLI::ParseError& outcome) { // help and version come this way too
         return app.exit(outcome) == 0 ? kGood : kUsage;
     }

@@ -74,7 +74,7 @@ check "never locked" 0 "^lock        never$" simulate --frequency-error 600ppm
 expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
 
 table << END
-no verb             |2|^dravik-host: A verb, simulate, run, check or show, is required|
+no verb             |2|^dravik-host: A verb, such as simulate or run, is required|
 unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 unit of another kind|2|--noise: '1ppm' has an unknown unit 'ppm'|simulate --noise 1ppm

@@ -1,0 +1,26 @@
+#pragma once
+
+#include "clocks/iClock.h"
+
+// A clock of the past, which no order reaches any more: it shows what was recorded. What it is
+// ordered counts only where the recording does not say what it ran at.
+class tRecordedClock : public iClock
+{
+public:
+    explicit tRecordedClock(int32_t maximumPpb) : limitPpb(maximumPpb) {}
+
+    void showTime(uint64_t recordedNs) { shownNs = recordedNs; }
+    void showOffset(double recordedPpb); // of its rate
+
+    uint64_t timeNs() override { return shownNs; }
+    void step(int64_t /*deltaNs*/) override {}
+    int32_t offsetPpb() override { return shownPpb; }
+    void setOffsetPpb(int32_t orderedPpb) override { shownPpb = orderedPpb; }
+    int32_t maxOffsetPpb() override { return limitPpb; }
+    int32_t minOffsetPpb() override { return -limitPpb; }
+
+private:
+    uint64_t shownNs = 0;
+    int32_t shownPpb = 0;
+    int32_t limitPpb;
+};

@@ -1,0 +1,27 @@
+#pragma once
+
+#include <charconv>
+#include <cstdint>
+#include <optional>
+#include <string_view>
+
+// Pieces of a line.
+
+// Splits the next word off the text; "" at its end.
+std::string_view takeWord(std::string_view& text);
+
+// Splits a field off, up to the next comma.
+std::string_view takeField(std::string_view& text);
+
+// The whole text as a number, a leading + included.
+template <typename Number> std::optional<Number> numberIn(std::string_view text)
+{
+    if (text.size() > 1 && text[0] == '+' && text[1] != '-') text.remove_prefix(1);
+    Number number{};
+    const auto result = std::from_chars(text.data(), text.data() + text.size(), number);
+    if (result.ec != std::errc() || result.ptr != text.data() + text.size()) return std::nullopt;
+    return number;
+}
+
+// Seconds with a decimal point, not negative, to the nanosecond.
+std::optional<int64_t> secondsIn(std::string_view text);

@@ -1,0 +1,136 @@
+#include "traces/tCsvFormat.h"
+
+#include "traces/fields.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+
+namespace {
+
+constexpr std::array<std::string_view, 9> kTitles = {"reference_ns",  "clock_ns",      "elapsed_s",
+                                                     "true_error_ns", "frequency_ppb", "step_ns",
+                                                     "kind",          "call",          "value"};
+
+} // namespace
+
+int tCsvFormat::columnOf(std::string_view title)
+{
+    const auto found = std::find(kTitles.begin(), kTitles.end(), title);
+    return found == kTitles.end() ? -1 : static_cast<int>(found - kTitles.begin());
+}
+
+bool tCsvFormat::recognises(std::string_view line) const
+{
+    bool reference = false;
+    bool clock = false;
+    while (!line.empty()) {
+        const int column = columnOf(takeField(line));
+        reference = reference || column == kReference;
+        clock = clock || column == kClock;
+    }
+    return reference && clock;
+}
+
+std::string tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
+{
+    if (columns.empty()) {
+        readHeader(line);
+        return "";
+    }
+    const tFields fields = split(line);
+    if (fields[kKind].empty() || fields[kKind] == "pair") return readPair(fields, builder);
+    if (fields[kKind] == "call") return readCall(fields, builder);
+    return fmt::format("a row of the unknown kind '{}'", fields[kKind]);
+}
+
+void tCsvFormat::readHeader(std::string_view line)
+{
+    while (!line.empty())
+        columns.push_back(columnOf(takeField(line)));
+}
+
+tCsvFormat::tFields tCsvFormat::split(std::string_view line) const
+{
+    tFields fields;
+    for (const int column : columns) {
+        const std::string_view field = takeField(line);
+        if (column >= 0) fields[static_cast<size_t>(column)] = field;
+    }
+    return fields;
+}
+
+std::string tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
+{
+    const auto referenceNs = numberIn<uint64_t>(fields[kReference]);
+    const auto clockNs = numberIn<uint64_t>(fields[kClock]);
+    if (!referenceNs || !clockNs) return "no whole number in reference_ns or in clock_ns";
+    const auto elapsedNs = fields[kElapsed].empty()
+                               ? std::optional(static_cast<int64_t>(*referenceNs))
+                               : secondsIn(fields[kElapsed]);
+    if (!elapsedNs) return "elapsed_s is no time";
+    endPair(builder);
+    tRecordedPair pair{};
+    pair.elapsedNs = *elapsedNs;
+    pair.referenceNs = *referenceNs;
+    pair.clockNs = *clockNs;
+    pair.errorNs = static_cast<double>(static_cast<int64_t>(*clockNs - *referenceNs));
+    pair.trueErrorNs = numberIn<double>(fields[kTrueError]);
+    pair.stepNs = numberIn<int64_t>(fields[kStep]).value_or(0);
+    pair.orderedPpb =
+        fields[kFrequency].empty() ? orderedPpb : numberIn<double>(fields[kFrequency]);
+    return builder.add("", pair);
+}
+
+// Calls in front of the first pair tell the limits of the clock.
+std::string tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
+{
+    const auto operation =
+        std::find(kHostOperationNames.begin(), kHostOperationNames.end(), fields[kCall]);
+    const auto value = numberIn<int64_t>(fields[kValue]);
+    if (operation == kHostOperationNames.end() || !value) return "no call that is known";
+    hasCalls = true;
+    const auto ppb = static_cast<double>(*value);
+    switch (static_cast<tHostOperation>(operation - kHostOperationNames.begin())) {
+    case kGetMaxFrequencyOffset:
+        highestPpb = static_cast<int32_t>(*value);
+        break;
+    case kGetMinFrequencyOffset:
+        lowestPpb = static_cast<int32_t>(*value);
+        break;
+    case kGetFrequency:
+        if (!initialPpb) initialPpb = ppb;
+        break;
+    case kSetFrequency:
+        orderedPpb = ppb;
+        if (builder.last() != nullptr) builder.last()->orderedPpb = ppb;
+        break;
+    case kStepTime:
+        if (builder.last() != nullptr) builder.last()->stepNs = *value;
+        break;
+    case kGetTime:
+        break;
+    }
+    calls.push_back({static_cast<tHostOperation>(operation - kHostOperationNames.begin()), *value});
+    return "";
+}
+
+// What the calls of the pair before say of its state.
+void tCsvFormat::endPair(tRecordingBuilder& builder)
+{
+    if (builder.last() != nullptr) {
+        if (!observer) observer.emplace(lowestPpb, highestPpb);
+        observer->observe(calls);
+        if (hasCalls) builder.last()->locked = observer->locked();
+    }
+    calls.clear();
+}
+
+void tCsvFormat::finish(tRecordingBuilder& builder)
+{
+    endPair(builder);
+    for (tRecordedPair& pair : builder.all()) { // those before the first order
+        if (pair.orderedPpb) break;
+        pair.orderedPpb = initialPpb;
+    }
+}

@@ -1,0 +1,96 @@
+#include "traces/tDaemonLogFormat.h"
+
+#include "traces/fields.h"
+#include "traces/madeUpStart.h"
+
+#include <array>
+
+namespace {
+
+struct tMeasurement {
+    int64_t timeNs;
+    int64_t offsetNs;
+    int state;
+    int64_t freqPpb;
+    std::string source; // the program, and the clock if it names one
+};
+
+constexpr std::array<std::string_view, 3> kPrograms = {"ptp4l", "phc2sys", "ts2phc"};
+
+std::string_view programIn(std::string_view text)
+{
+    for (const std::string_view program : kPrograms)
+        if (text.find(program) != std::string_view::npos) return program;
+    return "";
+}
+
+// Splits off everything up to the monotonic time, the first bracket that has a decimal point: a
+// system log writes the number of the process the same way.
+std::optional<int64_t> takeTime(std::string_view& text)
+{
+    for (size_t open = text.find('['); open != std::string_view::npos;
+         open = text.find('[', open + 1)) {
+        const size_t close = text.find(']', open);
+        if (close == std::string_view::npos) return std::nullopt;
+        const std::string_view inside = text.substr(open + 1, close - open - 1);
+        const auto timeNs = secondsIn(inside);
+        if (!timeNs || inside.find('.') == std::string_view::npos) continue;
+        text.remove_prefix(close + 1);
+        return timeNs;
+    }
+    return std::nullopt;
+}
+
+// A clock is named by a word that is neither a tag nor one of the words in front of "offset".
+bool namesClock(std::string_view word)
+{
+    return word != ":" && word.front() != '[' && word != "master" && word != "phc" && word != "sys";
+}
+
+std::optional<tMeasurement> parse(std::string_view line)
+{
+    tMeasurement found{};
+    std::string_view rest = line;
+    const auto timeNs = takeTime(rest);
+    if (!timeNs) return std::nullopt;
+    const std::string_view program = programIn(line.substr(0, line.size() - rest.size()));
+    if (program.empty()) return std::nullopt;
+    found.source = program;
+    std::string_view word = takeWord(rest);
+    for (; word != "offset"; word = takeWord(rest)) {
+        if (word.empty()) return std::nullopt;
+        if (namesClock(word)) found.source.append(" ").append(word);
+    }
+    const auto offsetNs = numberIn<int64_t>(takeWord(rest));
+    const std::string_view state = takeWord(rest);
+    const bool hasFreq = takeWord(rest) == "freq";
+    const auto freqPpb = numberIn<int64_t>(takeWord(rest));
+    if (!offsetNs || state.size() != 2 || state[0] != 's' || !hasFreq || !freqPpb)
+        return std::nullopt;
+    found.timeNs = *timeNs;
+    found.offsetNs = *offsetNs;
+    found.state = state[1] - '0';
+    found.freqPpb = *freqPpb;
+    return found;
+}
+
+} // namespace
+
+bool tDaemonLogFormat::recognises(std::string_view line) const { return parse(line).has_value(); }
+
+std::string tDaemonLogFormat::read(std::string_view line, tRecordingBuilder& builder)
+{
+    constexpr int kJump = 1;
+    constexpr int kLocked = 2;
+    const auto measurement = parse(line);
+    if (!measurement) return "no measurement";
+    tRecordedPair pair{};
+    pair.elapsedNs = measurement->timeNs;
+    pair.referenceNs = kMadeUpStartNs + static_cast<uint64_t>(measurement->timeNs);
+    pair.clockNs = pair.referenceNs + static_cast<uint64_t>(measurement->offsetNs);
+    pair.errorNs = static_cast<double>(measurement->offsetNs);
+    pair.orderedPpb = -static_cast<double>(measurement->freqPpb);
+    pair.stepNs = measurement->state == kJump ? -measurement->offsetNs : 0;
+    pair.locked = measurement->state >= kLocked;
+    return builder.add(measurement->source, pair);
+}

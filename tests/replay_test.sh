@@ -1,0 +1,109 @@
+#!/usr/bin/env bash
+# Recorded traces: every format to the digit, what is not read, and both ways of running on them.
+# Usage: replay_test.sh FOLDER CC, with dravik-host and libdravik.so.1 in the folder
+set -uo pipefail
+host=(${EMULATOR:+"$EMULATOR"} "$1/dravik-host")
+scratch=$(mktemp -d)
+trap 'rm -rf "$scratch"' EXIT
+unset DRAVIK_LIBRARY
+source "$(dirname "$0")/support/expect.sh"
+
+replay() { "${host[@]}" replay "$@"; }
+pairs() { replay - --csv - "$@" 2> /dev/null | grep '^pair' | cut -d, -f2-6; }
+messages() { replay - "$@" 2>&1 > /dev/null; }
+
+# Formats. Each trace has the same two measurements, 8 ns apart in 1.5 s, and lines to be left out.
+wanted="0.000000000,1700003531420000000,1700003531419999977,-23,
+1.500000000,1700003532920000000,1700003532919999985,-15,"
+daemon() { # PREFIX CLOCK WORDS
+    cat << END
+$1[3531.420]: $2offset        -23 s2 freq  +12345 $3
+$1[3531.900]: port 1: LISTENING to UNCALIBRATED on RS_SLAVE
+$1[3532.000]: rms 23 max 45 freq -1234 +/- 12 delay 500 +/- 3
+$1[3532.100]: ${2}offset          1 s2 freq
+$1[3532.200]: ${2}offset 1e3 s2 freq +1 $3
+$1[3531.420]: ${2}offset         77 s2 freq  +12345 $3
+$1[3533.20]: ${2}offset        77 s2 freq  +12345x
+$1[3532.920]: ${2}offset        -15 s3 freq      +7 $3
+END
+}
+expect "ptp4l" "$wanted" "$(daemon ptp4l 'master ' 'path delay 500' | pairs)"
+expect "its newer words" "$wanted" "$(daemon ptp4l '[ptp4l.0.config] ' 'path delay 500' | pairs)"
+expect "phc2sys" "$wanted" "$(daemon phc2sys 'CLOCK_REALTIME phc ' 'delay 1234' | pairs)"
+expect "ts2phc" "$wanted" "$(daemon ts2phc '/dev/ptp0 master ' '' | pairs)"
+expect "through a system log" "$wanted" \
+    "$(daemon ptp4l 'master ' 'path delay 500' | sed -E 's/^ptp4l(.*\]):/Nov 23 08:35:26 host ptp4l[812]: \1/' | pairs)"
+expect "its lines not used" "dravik-host: the standard input: 6 lines are not used, the first are lines 2 (no measurement), 3 (no measurement), 4 (no measurement)" \
+    "$(daemon ptp4l 'master ' '' | messages)"
+expect "several clocks" "dravik-host: the standard input has several sources, choose one by --source: 'ptp4l', 'phc2sys CLOCK_REALTIME'" \
+    "$( (daemon ptp4l 'master ' ''; daemon phc2sys 'CLOCK_REALTIME phc ' '') | messages | tail -n 1)"
+expect "one of several" "$wanted" \
+    "$( (daemon phc2sys 'eth1 sys ' ''; daemon phc2sys 'CLOCK_REALTIME phc ' '') | pairs --source REALTIME)"
+expect "none of them" "dravik-host: the standard input has no source 'eth2', but 'ptp4l'" \
+    "$(daemon ptp4l 'master ' '' | messages --source eth2 | tail -n 1)"
+
+refclocks() {
+    cat << END
+====================================================================
+   Date (UTC) Time         Refid  DP L P  Raw offset   Cooked offset
+2026-02-28 23:59:59.250000 PPS0    0 N 1  4.900000e-07  2.300000e-08  1.000e-06
+2026-02-28 23:59:59.250000 PPS0    - N -       -       -6.741777e-07  1.000e-06
+2026-03-01 00:00:00.750000 PPS0    1 N 1  4.900000e-07  1.500000e-08  1.000e-06
+2026-03-01 00:00:01.750000 PPS0    1 N 1  4.900000e-07
+END
+}
+expect "refclocks.log" "0.000000000,1772323199250000000,1772323199249999977,-23,
+1.500000000,1772323200750000000,1772323200749999985,-15," "$(refclocks | pairs)"
+expect "its corrections" "dravik-host: the standard input does not tell what frequency the clock was given, so its corrections cannot be undone" \
+    "$(refclocks | messages --re-discipline | tail -n 1)"
+expect "columns in any order" "$wanted" "$(pairs << 'END'
+comment,clock_ns,reference_ns
+a,1700003531419999977,1700003531420000000
+b,-1,1700003531420000000
+c,1700003531419999977,1700003531420000000
+
+d,1700003532919999985,1700003532920000000
+END
+)"
+expect "no trace" "dravik-host: the standard input is no trace: neither CSV with reference_ns and clock_ns, nor lines of ptp4l, phc2sys, ts2phc or refclocks.log" \
+    "$(echo "reference_ns,clock" | messages)"
+expect "no measurement" "dravik-host: the standard input has no measurement" \
+    "$(echo "reference_ns,clock_ns" | messages)"
+
+# Verbatim, the plug-in orders what it ordered when the trace was made, bit by bit; re-disciplined,
+# the same document leads to the same errors, and another one to its own.
+echo '{"phaseLockGain": 0.1, "snapTimeThreshold": 1e-3}' > "$scratch/slow.json"
+simulate=("${host[@]}" simulate --duration 1h --seed 3)
+"${simulate[@]}" --csv "$scratch/quick.csv" > "$scratch/out"
+"${simulate[@]}" --csv "$scratch/slow.csv" --config "$scratch/slow.json" > "$scratch/out"
+replay "$scratch/quick.csv" --csv "$scratch/again.csv" > "$scratch/out"
+expect "verbatim" "" "$(cmp "$scratch/quick.csv" "$scratch/again.csv")"
+expect "verbatim says so" 1 "$(grep -c "verbatim: errors as recorded" "$scratch/out")"
+furthest() { # ONE OTHER: the largest distance between their errors, once both are locked
+    paste -d, "$1" "$2" | awk -F, '/^pair/ && $2 > 9 {d = $5 - $13; m = d > m ? d : -d > m ? -d : m} END {print m}'
+}
+for document in quick slow; do
+    config=()
+    [ $document == slow ] && config=(--config "$scratch/slow.json")
+    replay "$scratch/quick.csv" --re-discipline --csv "$scratch/freed.csv" "${config[@]}" > "$scratch/out"
+    grep '^pair' "$scratch/freed.csv" > "$scratch/freed"
+    grep '^pair' "$scratch/$document.csv" > "$scratch/made"
+    expect "re-disciplined, $document" yes \
+        "$([ "$(furthest "$scratch/freed" "$scratch/made")" -le 10 ] && echo yes)"
+done
+expect "re-disciplined says so" 1 "$(grep -c "re-disciplined: recorded corrections undone" "$scratch/out")"
+
+# A daemon's own loop, with the step of its state s1, undone: what is left is the oscillator.
+expect "a daemon's corrections undone" "0.000000000 1000
+1.000000000 13000
+2.000000000 25000
+3.000000000 27000" "$(replay - --re-discipline --max-frequency-offset 1ppb --csv - << 'END' 2> /dev/null |
+ptp4l[10.000]: master offset       1000 s0 freq       +0 path delay 1
+ptp4l[11.000]: master offset      13000 s1 freq   +12000 path delay 1
+ptp4l[12.000]: master offset          0 s2 freq   +12000 path delay 1
+ptp4l[13.000]: master offset     -10000 s2 freq   +12000 path delay 1
+END
+    awk -F, '/^pair/ {e = $5 + u; print $2, 100 * int(e / 100 + 0.5)} /setFrequency/ {u -= $8} /stepTime/ {u -= $8}')"
+
+echo "$checks checks, $failures failures"
+exit $((failures > 0))
