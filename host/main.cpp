@@ -7,6 +7,7 @@
 #include "verbs/run.h"
 #include "verbs/show.h"
 #include "verbs/simulate.h"
+#include "verbs/tune.h"
 
 #include <cstdio>
 #include <exception>
@@ -34,8 +35,8 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app), addCheck(app),
-                           addShow(app)};
+    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app),
+                           addCheck(app),    addShow(app),   addTune(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())

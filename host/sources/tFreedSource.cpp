@@ -1,31 +1,11 @@
 #include "sources/tFreedSource.h"
 
-#include <fmt/format.h>
-
-#include <stdexcept>
-
-namespace {
-
-// By how much the oscillator and the noise, without the corrections, changed the error.
-double ownErrorNs(const tRecordedPair& from, const tRecordedPair& to)
-{
-    const double seconds = static_cast<double>(to.elapsedNs - from.elapsedNs) * 1e-9;
-    const double correctedNs = static_cast<double>(from.stepNs) + *from.orderedPpb * seconds;
-    return to.errorNs - from.errorNs - correctedNs;
-}
-
-} // namespace
+#include "traces/ownError.h"
 
 tFreedSource::tFreedSource(const tRecording& recorded, tFreedClock& freedClock)
     : recording(recorded), clock(freedClock)
 {
-    for (const tRecordedPair& pair : recording.pairs) {
-        if (pair.orderedPpb) continue;
-        throw std::runtime_error(
-            fmt::format("{} does not tell what frequency the clock was given, so its corrections "
-                        "cannot be undone",
-                        recording.name));
-    }
+    requireCorrections(recording);
 }
 
 std::optional<tPair> tFreedSource::next()

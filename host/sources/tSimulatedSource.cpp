@@ -2,6 +2,16 @@
 
 #include <cmath>
 
+// One number decides whether the measurement is an outlier, and of which sign.
+double measurementErrorNs(const tMeasurementModel& model, tNoise& noise)
+{
+    double sumNs = model.noiseNs * noise.normal();
+    const double chance = noise.uniform();
+    if (chance < model.outlierRate)
+        sumNs += chance < model.outlierRate / 2 ? -model.outlierSizeNs : model.outlierSizeNs;
+    return sumNs;
+}
+
 tSimulatedSource::tSimulatedSource(tSimulatedClock& simulated, const tMeasurementModel& measurement,
                                    tNoise& randomness)
     : clock(simulated), model(measurement), noise(randomness), elapsedNs(-measurement.intervalNs)
@@ -15,16 +25,7 @@ std::optional<tPair> tSimulatedSource::next()
 
     const auto cut = [this](uint64_t ns) { return ns - ns % model.granularityNs; };
     const uint64_t trueNs = kStartNs + static_cast<uint64_t>(elapsedNs);
-    const uint64_t seenNs = trueNs + static_cast<uint64_t>(disturbanceNs());
+    const double errorNs = std::floor(measurementErrorNs(model, noise));
+    const uint64_t seenNs = trueNs + static_cast<uint64_t>(static_cast<int64_t>(errorNs));
     return tPair{elapsedNs, cut(seenNs), cut(clock.timeNs()), clock.aheadOfNs(trueNs)};
-}
-
-// One number decides whether the pair is an outlier, and of which sign.
-int64_t tSimulatedSource::disturbanceNs()
-{
-    double sumNs = model.noiseNs * noise.normal();
-    const double chance = noise.uniform();
-    if (chance < model.outlierRate)
-        sumNs += chance < model.outlierRate / 2 ? -model.outlierSizeNs : model.outlierSizeNs;
-    return static_cast<int64_t>(std::floor(sumNs));
 }

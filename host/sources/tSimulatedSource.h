@@ -13,6 +13,9 @@ struct tMeasurementModel {
     uint64_t granularityNs = 1; // of both timestamps
 };
 
+// What one measurement is off by, in ns.
+double measurementErrorNs(const tMeasurementModel& model, tNoise& noise);
+
 // Pairs in simulated time: a perfect reference, seen through noise, and the simulated clock.
 class tSimulatedSource : public iPairSource
 {
@@ -26,8 +29,6 @@ public:
     std::optional<tPair> next() override;
 
 private:
-    int64_t disturbanceNs();
-
     tSimulatedClock& clock;
     tMeasurementModel model;
     tNoise& noise;

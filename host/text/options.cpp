@@ -27,13 +27,3 @@ void addLibraryOption(CLI::App& app, std::string& library)
                    "as installed")
         ->type_name("FILE");
 }
-
-void addTraceOptions(CLI::App& app, std::string& trace, std::string& source)
-{
-    app.add_option("trace", trace,
-                   "CSV, lines of ptp4l, phc2sys or ts2phc,\nor chrony's refclocks.log; - is stdin")
-        ->type_name("FILE")
-        ->required();
-    app.add_option("--source", source, "Which one, if the trace has several; a part of its name")
-        ->type_name("NAME");
-}

@@ -49,6 +49,3 @@ void addQuantity(CLI::App& app, Number& value, const tQuantityOption& option)
 
 // The name stays empty if the option is not given.
 void addLibraryOption(CLI::App& app, std::string& library);
-
-// The trace that a verb reads, and which source in it.
-void addTraceOptions(CLI::App& app, std::string& trace, std::string& source);

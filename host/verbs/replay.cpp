@@ -3,7 +3,7 @@
 #include "loop/tDiscipline.h"
 #include "sources/tFreedSource.h"
 #include "sources/tRecordedSource.h"
-#include "traces/printUnread.h"
+#include "traces/traceOptions.h"
 
 #include <fmt/format.h>
 
@@ -12,8 +12,7 @@
 namespace {
 
 struct tOptions : tDisciplineOptions {
-    std::string trace;
-    std::string source;
+    tTraceOptions trace;
     bool reDiscipline = false;
 };
 
@@ -45,8 +44,7 @@ void replayReDisciplined(const tServoLibrary& library, const tRecording& recordi
 void replay(const tOptions& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
-    const tRecording recording = readRecording(options.trace, options.source);
-    printUnread(recording);
+    const tRecording recording = readTrace(options.trace);
     if (options.reDiscipline) {
         replayReDisciplined(library, recording, options);
     } else {
@@ -60,10 +58,11 @@ tVerb addReplay(CLI::App& app)
 {
     CLI::App* const verb = app.add_subcommand("replay", "Run the plug-in on a recorded trace");
     const auto options = std::make_shared<tOptions>();
-    addTraceOptions(*verb, options->trace, options->source);
+    addTraceOptions(*verb, options->trace)->required();
     verb->add_flag("--re-discipline", options->reDiscipline,
                    "Undo the recorded corrections and close the\n"
                    "loop; else pairs as recorded, verbatim");
+    addFreeRunningOption(*verb, options->trace);
     addDisciplineOptions(*verb, *options);
     return {verb, [options] { replay(*options); }};
 }

@@ -1,0 +1,25 @@
+#pragma once
+
+#include "servo/tServoParameters.h"
+
+#include <optional>
+
+// The closed loop of the law at an interval of T seconds, the spike filter apart. With phase x and
+// frequency offset u,
+//
+//     x(n+1) = x(n) + T u(n)
+//     u(n+1) = C u(n) - g (A x(n+1) - B x(n))
+//
+// whose poles are those of z^2 - (1 + C - g A T) z + (C - g B T).
+struct tLoopAnalysis {
+    tLoopAnalysis(const tServoParameters& parameters, double interval);
+
+    bool stable;
+    double stableBelow; // s; the interval from which on it is not; 0: at none, or C is not 1
+
+    // Of a stable loop.
+    std::optional<double> damping; // none if its poles are no decaying oscillation or slope
+    double settling = 0;           // s, to one per cent
+    double overshoot = 0;          // of a step in phase: share by which it goes beyond
+    double noiseGain = 0;          // deviation of the clock per deviation of white measurements
+};

@@ -1,0 +1,32 @@
+#include "design/tLoopGains.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <stdexcept>
+
+// With B = 1 the gain is kp, and A - 1 is ki / kp. The bound of A, or that of the gain, may need
+// another B.
+void tLoopGains::putInto(tServoParameters& parameters) const
+{
+    constexpr double kLargest = 10; // gain and coefficients alike
+    constexpr double kLeastGain = 1e-9;
+    const double sum = kp + ki;
+    const double gain = std::clamp(std::max(kp, sum / kLargest), kLeastGain, kLargest);
+    if (!(sum <= kLargest * gain)) {
+        throw std::runtime_error(
+            fmt::format("no document can have kp {:.4g} and ki {:.4g} per second", kp, ki));
+    }
+    parameters.phaseLockGain = gain;
+    parameters.phaseLockCoefficientA = sum / gain;
+    parameters.phaseLockCoefficientB = kp / gain;
+    parameters.phaseLockCoefficientC = 1;
+}
+
+tLoopGains tLoopGains::of(const tServoParameters& parameters)
+{
+    const double g = parameters.phaseLockGain;
+    const double a = parameters.phaseLockCoefficientA;
+    const double b = parameters.phaseLockCoefficientB;
+    return {g * b, g * (a - b)};
+}

@@ -1,0 +1,244 @@
+#include "verbs/tune.h"
+
+#include "clocks/tSteeredClock.h"
+#include "design/designDocuments.h"
+#include "design/estimateNoise.h"
+#include "design/tLoopAnalysis.h"
+#include "servo/tServoHost.h"
+#include "text/tOutputFile.h"
+#include "traces/fields.h"
+#include "traces/traceOptions.h"
+
+#include <fmt/format.h>
+
+#include <memory>
+
+// From the noise, given in numbers or found in a trace, to the document that suits it.
+
+namespace {
+
+// What is given wins over what is found.
+struct tGivenNoise {
+    std::optional<double> intervalNs;
+    std::optional<double> noiseNs;
+    std::optional<double> frequencyNoisePpb;
+    std::optional<double> wanderPpb;
+    std::optional<double> outlierRate;
+    std::optional<double> outlierSizeNs;
+};
+
+struct tOptions {
+    tTraceOptions trace;
+    tGivenNoise given;
+    std::optional<tLoopGains> controller;
+    std::string output;
+    std::string quickOutput;
+    std::string library;
+};
+
+void addGivenNoise(CLI::App& app, tGivenNoise& given)
+{
+    addQuantity(app, given.intervalNs,
+                {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair"});
+    addQuantity(app, given.noiseNs,
+                {"--noise", kDuration, "", "0ns", "1s", "White, of measurements; deviation"});
+    addQuantity(app, given.wanderPpb,
+                {"--wander", kFrequency, "", "0ppb", "1000ppm",
+                 "Random walk of the frequency, per root second"});
+    addQuantity(app, given.frequencyNoisePpb,
+                {"--frequency-noise", kFrequency, "", "0ppb", "1000ppm",
+                 "White; Allan deviation at 1 s; else 0.1ppb"});
+    addQuantity(app, given.outlierRate,
+                {"--outlier-rate", kRatio, "", "0%", "100%", "Share of measurements far off"});
+    addQuantity(app, given.outlierSizeNs,
+                {"--outlier-size", kDuration, "", "0ns", "1s", "How far they are off"});
+}
+
+tLoopGains parseController(const std::string& text)
+{
+    std::string_view rest = text;
+    const auto kp = numberIn<double>(takeField(rest));
+    const auto ki = numberIn<double>(takeField(rest));
+    if (!kp || !ki || !(*kp > 0) || !(*ki > 0) || !rest.empty()) {
+        throw CLI::ValidationError("--from-pi",
+                                   "'" + text + "' is not KP,KI, two positive numbers");
+    }
+    return {*kp, *ki};
+}
+
+void requireEnough(const tOptions& options)
+{
+    const tGivenNoise& given = options.given;
+    if (options.controller || !options.trace.file.empty()) return;
+    if (given.noiseNs && given.wanderPpb && given.intervalNs) return;
+    throw CLI::RequiredError("A trace, or --noise, --wander and --interval, or --from-pi");
+}
+
+tNoiseModel noiseModel(const tOptions& options)
+{
+    constexpr double kUsualFrequencyNoisePpb = 0.1;
+    tNoiseModel model;
+    model.frequencyNoisePpb = kUsualFrequencyNoisePpb;
+    if (!options.trace.file.empty()) model = estimateNoise(readTrace(options.trace));
+    const tGivenNoise& given = options.given;
+    const auto replace = [](auto& value, const std::optional<double>& by) {
+        if (by) value = static_cast<std::remove_reference_t<decltype(value)>>(*by);
+    };
+    replace(model.intervalNs, given.intervalNs);
+    replace(model.noiseNs, given.noiseNs);
+    replace(model.frequencyNoisePpb, given.frequencyNoisePpb);
+    replace(model.wanderPpb, given.wanderPpb);
+    replace(model.outlierRate, given.outlierRate);
+    replace(model.outlierSizeNs, given.outlierSizeNs);
+    return model;
+}
+
+std::string noiseText(const tNoiseModel& model)
+{
+    const std::string outliers =
+        model.outlierRate > 0 ? fmt::format(", {:.3g} % of outliers of {}", model.outlierRate * 100,
+                                            durationText(model.outlierSizeNs))
+                              : "";
+    return fmt::format(
+        "measurements of {} every {}{};\n"
+        "oscillator with {:.3g} ppb of white noise at 1 s and {:.3g} ppb of wander per "
+        "root second\n",
+        durationText(model.noiseNs), durationText(model.interval() * 1e9), outliers,
+        model.frequencyNoisePpb, model.wanderPpb);
+}
+
+// Two documents side by side, as simulations through the plug-in show them.
+class tComparison
+{
+public:
+    tComparison(const tServoLibrary& library, const tNoiseModel& model,
+                const tServoParameters& builtIn, const tServoParameters& tuned)
+        : interval(model.interval()), columns{builtIn, tuned}
+    {
+        const tTrialOptions trial = trialFor(tLoopGains::of(tuned), model);
+        for (size_t i = 0; i < columns.size(); ++i)
+            results[i] = runTrial(library, columns[i].documentText(), model, trial);
+    }
+
+    std::string text() const
+    {
+        const auto gains = [](const tServoParameters& p) { return tLoopGains::of(p); };
+        const auto loop = [this](const tServoParameters& p) { return tLoopAnalysis(p, interval); };
+        return fmt::format("{:<24}{:>12}{:>12}\n", "", "built-in", "this one") +
+               row("error, RMS", [](const tTrialResult& r) { return durationText(r.rmsNs); }) +
+               row("error, peak", [](const tTrialResult& r) { return durationText(r.peakNs); }) +
+               row("locks lost per hour",
+                   [](const tTrialResult& r) { return fmt::format("{:.3g}", r.lostPerHour); }) +
+               rowOf("kp, 1/s", [&](auto& p) { return fmt::format("{:.4g}", gains(p).kp); }) +
+               rowOf("ki, 1/s per pair",
+                     [&](auto& p) { return fmt::format("{:.4g}", gains(p).ki); }) +
+               rowOf("damping",
+                     [&](auto& p) {
+                         const auto damping = loop(p).damping;
+                         return damping ? fmt::format("{:.2f}", *damping) : std::string("-");
+                     }) +
+               rowOf("settles within",
+                     [&](auto& p) {
+                         return loop(p).stable ? durationText(loop(p).settling * 1e9) : "never";
+                     }) +
+               rowOf("noise that passes", [&](auto& p) {
+                   return loop(p).stable ? fmt::format("{:.0f} %", loop(p).noiseGain * 100) : "-";
+               });
+    }
+
+private:
+    template <typename Text> std::string row(const char* title, Text text) const
+    {
+        return fmt::format("{:<24}{:>12}{:>12}\n", title, text(results[0]), text(results[1]));
+    }
+    template <typename Text> std::string rowOf(const char* title, Text text) const
+    {
+        return fmt::format("{:<24}{:>12}{:>12}\n", title, text(columns[0]), text(columns[1]));
+    }
+
+    double interval;
+    std::array<tServoParameters, 2> columns;
+    std::array<tTrialResult, 2> results;
+};
+
+std::string quickText(const tDesign& design, const tOptions& options)
+{
+    if (design.quickNs == 0) return "";
+    const auto name = [](const std::string& file, const char* otherwise) {
+        return file.empty() || file == "-" ? otherwise : file.c_str();
+    };
+    return fmt::format(
+        "slow to acquire; with a quick document{}:\n"
+        "    --measure-over {}s --config {} --then {}s={}\n",
+        options.quickOutput.empty() ? ", which --quick writes" : "",
+        static_cast<double>(design.measureOverNs) * 1e-9, name(options.quickOutput, "QUICK"),
+        static_cast<double>(design.quickNs) * 1e-9, name(options.output, "DOCUMENT"));
+}
+
+void writeDocument(const std::string& file, const tServoParameters& parameters)
+{
+    tOutputFile output = file.empty() || file == "-" ? tOutputFile(stdout, "the standard output")
+                                                     : tOutputFile(file);
+    output.write(parameters.documentText());
+    output.flush();
+}
+
+// Without a noise the filter stays off and the threshold as it is.
+tServoParameters convertedDocument(const tOptions& options, const tServoParameters& builtIn)
+{
+    tServoParameters parameters = builtIn;
+    options.controller->putInto(parameters);
+    if (!options.given.noiseNs || !options.given.intervalNs) return parameters;
+    const tNoiseModel model = noiseModel(options);
+    parameters.snapTimeThreshold = snapThresholdFor(model);
+    setSpikeFilter(parameters, model);
+    return parameters;
+}
+
+void tune(const tOptions& options)
+{
+    const tServoLibrary library(tServoLibrary::find(options.library));
+    tSteeredClock clock(0, 0, 0); // stands still: there are no pairs
+    tServoHost host(library, clock);
+    const auto builtIn = tServoParameters::of(host.readConfig());
+    if (options.controller) {
+        writeDocument(options.output, convertedDocument(options, builtIn));
+        return;
+    }
+    const tNoiseModel model = noiseModel(options);
+    const tDesign design = designDocuments(library, model);
+    const bool toStdout = options.output.empty() || options.output == "-";
+    tOutputFile report(toStdout ? stderr : stdout, "the report");
+    report.write(noiseText(model));
+    report.write(tComparison(library, model, builtIn, design.quiet).text());
+    report.write(
+        fmt::format("{:<24}{:>24}\n", "theory: error, RMS", durationText(design.theoreticalRmsNs)));
+    report.write(quickText(design, options));
+    report.flush();
+    writeDocument(options.output, design.quiet);
+    if (options.quickOutput.empty()) return;
+    writeDocument(options.quickOutput, design.quickNs > 0 ? design.quick : design.quiet);
+}
+
+} // namespace
+
+tVerb addTune(CLI::App& app)
+{
+    CLI::App* const verb = app.add_subcommand("tune", "Write the document that suits a noise");
+    const auto options = std::make_shared<tOptions>();
+    addTraceOptions(*verb, options->trace);
+    addFreeRunningOption(*verb, options->trace);
+    addGivenNoise(*verb, options->given);
+    verb->add_option_function<std::string>(
+            "--from-pi",
+            [options](const std::string& text) { options->controller = parseController(text); },
+            "Convert a proportional-integral controller,\nwhose constants are per second and pair")
+        ->type_name("KP,KI");
+    verb->add_option("-o,--output", options->output, "The document; else it goes to stdout")
+        ->type_name("FILE");
+    verb->add_option("--quick", options->quickOutput, "Also one to acquire the lock with")
+        ->type_name("FILE");
+    addLibraryOption(*verb, options->library);
+    verb->final_callback([options] { requireEnough(*options); });
+    return {verb, [options] { tune(*options); }};
+}
