@@ -122,10 +122,40 @@ spikeFilterMaxThreshold is 11, not within 1e-9 to 10 s/s; applied before it: not
 spikeFilterMinThreshold is 0, not within 1e-9 to 10 s/s; applied before it: nothing|{"spikeFilterMinThreshold": 0}
 spikeFilterGrowthFactor is 1, not within 1.001 to 100; applied before it: nothing|{"spikeFilterGrowthFactor": 1}
 END
-note() { echo "$1" | "${host[@]}" check - 2>&1 > /dev/null | cut -d' ' -f3-; }
-expect "misspelt and repeated" "ignored: phaselockgain, gain" \
-    "$(note '{"phaseLockGain": 1, "phaselockgain": 2, "gain": 3, "snapTimeThreshold": 1}')"
-expect "no object" "no JSON object, so nothing is set" "$(note '[1]')"
+notes() { echo "$1" | "${host[@]}" check - 2>&1 > /dev/null | cut -d' ' -f3-; }
+expect "misspelt, repeated, read otherwise" "phaseLockGain stands there twice, and the first one counts
+gain is no key and sets nothing
+snaptimethreshhold is no key and sets nothing; snapTimeThreshold is meant?
+spikeFilterEnabled is 2 and read as off
+spikeFilterHistorySize is 5.7 and read as 5" "$(notes '{"PHASELOCKGAIN": 1, "phaseLockGain": 2, "gain": 3,
+    "snaptimethreshhold": 1, "spikeFilterEnabled": 2, "spikeFilterHistorySize": 5.7}')"
+expect "a flag that is nearly 1" "spikeFilterEnabled is 1.9 and read as 1, on" "$(notes '{"spikeFilterEnabled": 1.9}')"
+expect "no object" "it is no JSON object, so it sets nothing" "$(notes '[1]')"
+
+# Advice on the loop: rows of PATTERN|OPTIONS|DOCUMENT on stdin.
+while IFS='|' read -r pattern options document; do
+    echo "$document" > "$scratch/document"
+    # shellcheck disable=SC2086  # split on purpose
+    "${host[@]}" check "$scratch/document" $options > "$scratch/out" 2> "$scratch/both"
+    expect "advice on $document: $pattern" 1 "$(grep -cE -- "$pattern" "$scratch/both")"
+done << 'END'
+^at one pair every 1 s:$|--interval 1s|{}
+^  like a PI controller with kp 0.7 and ki 0.3 per second and pair$|--interval 1s|{"phaseLockGain": 0.7, "phaseLockCoefficientA": 1.428571428571, "phaseLockCoefficientB": 1}
+^  stable below 2\.424 s$|--interval 125ms|{}
+^! unstable: at most 2\.424 s from pair to pair|--interval 2.5s|{}
+^! unstable at any interval$|--interval 1s|{"phaseLockCoefficientA": 0.5}
+^! damping 0\.13; settles within 16\.16 s|--interval 125ms|{}
+^! too quick: alternates|--interval 2s|{"phaseLockGain": 0.6, "phaseLockCoefficientA": 1.2}
+^  passes 40 % of the noise on to the clock, 20\.[0-9]+ ns$|--interval 1s --noise 50ns|{"phaseLockGain": 0.1846, "phaseLockCoefficientA": 1.1018}
+^! snapTimeThreshold, 1 us, is 1\.3 deviations .* about 4[0-9]{2} times an hour; better 6\.4e-06$|--interval 1s --noise 500ns|{}
+^  snapTimeThreshold, 1 us, is 12\.5 deviations of what it is compared with$|--interval 1s --noise 50ns|{}
+^! C is 0\.9, below 1: frequency is forgotten, .* the clock 181\.8 ns off$|--interval 1s|{"phaseLockCoefficientC": 0.9}
+^! C is 1\.5, above 1: frequency runs away$|--interval 1s|{"phaseLockCoefficientC": 1.5}
+^  spike filter off$|--interval 1s --noise 50ns|{}
+^  spike filter limits to 3\.0 mean steps of the noise$|--interval 1s --noise 50ns|{"spikeFilterEnabled": 1}
+^! spike filter limits to 1\.4 mean steps .* cuts into|--interval 1s --noise 50ns|{"spikeFilterEnabled": 1, "spikeFilterGrowthFactor": 1.4}
+END
+expect "noise needs an interval" 2 "$("${host[@]}" check x --noise 1ns 2> /dev/null; echo $?)"
 
 # The CSV file: every pair, every call, exact figures, the same bytes for the same seed.
 n=0

@@ -5,7 +5,11 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <cctype>
+#include <cstring>
+#include <numeric>
 #include <string_view>
+#include <strings.h>
 
 namespace {
 
@@ -75,11 +79,55 @@ std::string notJsonText(const std::string& document)
     return fmt::format("it is not JSON, as of line {}", 1 + std::count(text, end, '\n'));
 }
 
-bool setsSomething(const cJSON* document, const cJSON* member)
+// Letters of either case count as the same, as they do for the plug-in.
+bool sameKey(const char* one, const char* other) { return strcasecmp(one, other) == 0; }
+
+const tKey* keyNamed(const char* name)
 {
-    return std::any_of(std::begin(kKeys), std::end(kKeys), [=](const tKey& key) {
-        return cJSON_GetObjectItem(document, key.name) == member;
-    });
+    const tKey* const key = std::find_if(std::begin(kKeys), std::end(kKeys),
+                                         [name](const tKey& k) { return sameKey(k.name, name); });
+    return key == std::end(kKeys) ? nullptr : key;
+}
+
+// Letters to insert, leave out or replace to make one word of the other.
+size_t distance(std::string_view one, std::string_view other)
+{
+    std::vector<size_t> row(other.size() + 1);
+    std::iota(row.begin(), row.end(), size_t{0});
+    for (size_t i = 0; i < one.size(); ++i) {
+        size_t diagonal = row[0];
+        row[0] = i + 1;
+        for (size_t j = 0; j < other.size(); ++j) {
+            const bool same = std::tolower(one[i]) == std::tolower(other[j]);
+            const size_t replaced = diagonal + (same ? 0 : 1);
+            diagonal = row[j + 1];
+            row[j + 1] = std::min({replaced, row[j] + 1, row[j + 1] + 1});
+        }
+    }
+    return row.back();
+}
+
+std::string unknownText(const char* name)
+{
+    const auto nearest = std::min_element(
+        std::begin(kKeys), std::end(kKeys), [name](const tKey& one, const tKey& other) {
+            return distance(name, one.name) < distance(name, other.name);
+        });
+    const bool near = distance(name, nearest->name) <= std::strlen(nearest->name) / 3;
+    return fmt::format("{} is no key and sets nothing{}", name,
+                       near ? fmt::format("; {} is meant?", nearest->name) : "");
+}
+
+// "" if the value is taken as it looks.
+std::string readingText(const tKey& key, const cJSON* value)
+{
+    if (!key.whole) return "";
+    const bool flag = key.setterLine == 0;
+    const int read = value->valueint;
+    const bool looksRight = value->valuedouble == read && (!flag || read == 0 || read == 1);
+    if (looksRight) return "";
+    const std::string meaning = !flag ? std::to_string(read) : read == 1 ? "1, on" : "off";
+    return fmt::format("{} is {} and read as {}", key.name, value->valuedouble, meaning);
 }
 
 void enumerate(std::string& list, const char* name)
@@ -107,15 +155,25 @@ std::string refusalText(const std::string& document, const std::string& payload)
     return payload;
 }
 
-std::string ignoredText(const std::string& document)
+std::vector<std::string> documentNotes(const std::string& document)
 {
     const tJson root = parseJson(document);
-    if (cJSON_IsObject(root.get()) == 0) return "no JSON object, so nothing is set";
-    std::string ignored;
+    if (cJSON_IsObject(root.get()) == 0) return {"it is no JSON object, so it sets nothing"};
+    std::vector<std::string> notes;
+    const auto add = [&notes](const std::string& note) {
+        if (!note.empty()) notes.push_back(note);
+    };
     const cJSON* member = nullptr;
     cJSON_ArrayForEach(member, root.get())
     {
-        if (!setsSomething(root.get(), member)) enumerate(ignored, member->string);
+        const tKey* const key = keyNamed(member->string);
+        if (key == nullptr) {
+            add(unknownText(member->string));
+        } else if (cJSON_GetObjectItem(root.get(), key->name) != member) {
+            add(fmt::format("{} stands there twice, and the first one counts", key->name));
+        } else {
+            add(readingText(*key, member));
+        }
     }
-    return ignored.empty() ? "" : "ignored: " + ignored;
+    return notes;
 }

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <string>
+#include <vector>
 
 // What a person is told of a configuration document that the plug-in took or refused.
 
@@ -9,5 +10,6 @@
 // of a failure that is not the document's the payload itself is the answer.
 std::string refusalText(const std::string& document, const std::string& payload);
 
-// The members that set nothing, as they are misspelt or repeat a key; "" if there are none.
-std::string ignoredText(const std::string& document);
+// What a document that was taken does otherwise than it looks: members that set nothing, as they
+// are misspelt or stand there twice, and values that are read as others.
+std::vector<std::string> documentNotes(const std::string& document);

@@ -1,9 +1,12 @@
 #include "verbs/check.h"
 
 #include "clocks/tSteeredClock.h"
+#include "design/loopAdvice.h"
 #include "servo/configDocument.h"
 #include "servo/printConfig.h"
 #include "servo/tuning.h"
+
+#include <fmt/format.h>
 
 #include <cstdio>
 #include <memory>
@@ -12,6 +15,8 @@ namespace {
 
 struct tOptions {
     std::string file;
+    double intervalNs = 0; // 0: no advice
+    std::optional<double> noiseNs;
     std::string library;
 };
 
@@ -22,9 +27,11 @@ void check(const tOptions& options)
     tServoHost host(library, clock);
     const std::string document = applyConfigFile(host, options.file);
     printConfig(host);
-    const std::string ignored = ignoredText(document);
-    if (!ignored.empty())
-        (void)std::fprintf(stderr, "dravik-host: %s: %s\n", options.file.c_str(), ignored.c_str());
+    for (const std::string& note : documentNotes(document))
+        fmt::print(stderr, "dravik-host: {}: {}\n", options.file, note);
+    if (options.intervalNs == 0) return;
+    const auto inForce = tServoParameters::of(host.readConfig());
+    fmt::print(stderr, "{}", loopAdvice(inForce, options.intervalNs * 1e-9, options.noiseNs));
 }
 
 } // namespace
@@ -37,6 +44,13 @@ tVerb addCheck(CLI::App& app)
     verb->add_option("document", options->file, "Configuration document")
         ->type_name("FILE")
         ->required();
+    addQuantity(
+        *verb, options->intervalNs,
+        {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair: advise on the loop"});
+    addQuantity(*verb, options->noiseNs,
+                {"--noise", kDuration, "", "1ns", "1s",
+                 "White, of measurements; deviation: advise\non threshold and filter too"});
     addLibraryOption(*verb, options->library);
+    verb->get_option("--noise")->needs("--interval");
     return {verb, [options] { check(*options); }};
 }
