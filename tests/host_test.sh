@@ -147,7 +147,7 @@ done << 'END'
 ^! damping 0\.13; settles within 16\.16 s|--interval 125ms|{}
 ^! too quick: alternates|--interval 2s|{"phaseLockGain": 0.6, "phaseLockCoefficientA": 1.2}
 ^  passes 40 % of the noise on to the clock, 20\.[0-9]+ ns$|--interval 1s --noise 50ns|{"phaseLockGain": 0.1846, "phaseLockCoefficientA": 1.1018}
-^! snapTimeThreshold, 1 us, is 1\.3 deviations .* about 4[0-9]{2} times an hour; better 6\.4e-06$|--interval 1s --noise 500ns|{}
+^! snapTimeThreshold, 1 us, is 1\.3 deviations .* about 4[0-9]{2} times an hour; better 9.6e-06$|--interval 1s --noise 500ns|{}
 ^  snapTimeThreshold, 1 us, is 12\.5 deviations of what it is compared with$|--interval 1s --noise 50ns|{}
 ^! C is 0\.9, below 1: frequency is forgotten, .* the clock 181\.8 ns off$|--interval 1s|{"phaseLockCoefficientC": 0.9}
 ^! C is 1\.5, above 1: frequency runs away$|--interval 1s|{"phaseLockCoefficientC": 1.5}

@@ -2,7 +2,7 @@
 # Documents made to measure: what is found in traces, what the gains are, what they are worth.
 # Usage: tune_test.sh FOLDER CC, with dravik-host and libdravik.so.1 in the folder
 set -uo pipefail
-host=(${EMULATOR:+"$EMULATOR"} "$1/dravik-host")
+host=(${EMULATOR:+"$EMULATOR"} "$(cd "$1" && pwd)/dravik-host")
 source "$(dirname "$0")/support/expect.sh"
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
@@ -61,7 +61,7 @@ done << 'END'
 20,5 10 2.5 2 1
 END
 "${host[@]}" tune --from-pi 0.7,0.3 --noise 100ns --interval 1s > pi.json
-expect "with a noise" "8e-07 1" "$(key snapTimeThreshold pi.json) $(key spikeFilterEnabled pi.json)"
+expect "with a noise" "1.2e-06 1" "$(key snapTimeThreshold pi.json) $(key spikeFilterEnabled pi.json)"
 
 while IFS='|' read -r status pattern arguments; do
     # shellcheck disable=SC2086  # split on purpose

@@ -63,27 +63,49 @@ tServoParameters refined(const tServoLibrary& library, const tNoiseModel& model,
     return parametersAt(place, seen);
 }
 
-// The quick loop lies, by its number of pairs, between the measurement of the frequency and the
-// quiet loop: each of the two changes then leaves a transient of the same kind.
+// How far a loop goes off while it takes up a frequency that was measured over some seconds, three
+// deviations wrong; seconds. Half of that frequency over the natural one is what its peak comes to.
+double takeUp(const tLoopGains& gains, const tNoiseModel& model, double measuredOver)
+{
+    const double frequency = 3 * std::sqrt(2.0) * model.noiseNs * 1e-9 / measuredOver;
+    return frequency / 2 / std::sqrt(gains.ki / model.interval());
+}
+
+// A change to gains of a slower loop leaves it with the frequency that the quicker one had ordered
+// against the noise of the last pair. So they follow one another in steps: each loop works like a
+// filter that has seen three times as many pairs as the one before, from the measurement of the
+// frequency to the quiet loop.
 void addQuick(tDesign& design, const tNoiseModel& model)
 {
     constexpr double kQuickEnough = 12;
     constexpr double kMostMeasured = 10;
+    constexpr double kStep = 3;
     const double quietPairs = 4 / (tLoopGains::of(design.quiet).kp * model.interval());
     if (quietPairs < kQuickEnough) return;
     const double measured = std::clamp(std::round(quietPairs / 8), 1.0, kMostMeasured);
-    const double pairs = std::sqrt(measured * quietPairs);
-    design.quick = design.quiet;
-    growingKalman(pairs, model.interval()).putInto(design.quick);
     design.measureOverNs = static_cast<int64_t>(measured) * model.intervalNs;
-    design.quickNs = static_cast<int64_t>(std::ceil(2 * pairs)) * model.intervalNs;
+    const double steps = std::round(std::log(quietPairs / measured) / std::log(kStep));
+    for (int step = static_cast<int>(steps) - 1; step >= 1; --step) {
+        const double pairs = quietPairs / std::pow(kStep, step);
+        const tLoopGains gains = growingKalman(pairs, model.interval());
+        tQuickDocument quick;
+        quick.parameters = design.quiet;
+        gains.putInto(quick.parameters);
+        quick.heldNs = static_cast<int64_t>(std::ceil(3 * pairs)) * model.intervalNs;
+        if (design.quick.empty()) {
+            const double seconds = static_cast<double>(design.measureOverNs) * 1e-9;
+            double& threshold = quick.parameters.snapTimeThreshold;
+            threshold = std::min(10.0, threshold + takeUp(gains, model, seconds));
+        }
+        design.quick.push_back(quick);
+    }
 }
 
 } // namespace
 
 double snapThresholdFor(const tNoiseModel& model)
 {
-    constexpr double kDeviations = 8;
+    constexpr double kDeviations = 12; // half of them for what a change of gains leaves
     const double outlierNs = model.outlierRate > 0 ? 1.2 * model.outlierSizeNs : 0;
     return std::clamp((kDeviations * model.noiseNs + outlierNs) * 1e-9, 1e-8, 10.0);
 }

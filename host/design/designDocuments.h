@@ -4,15 +4,22 @@
 #include "design/tTrial.h"
 #include "servo/tServoParameters.h"
 
+#include <vector>
+
+// For some time after the lock, in place of the quiet document.
+struct tQuickDocument {
+    tServoParameters parameters;
+    int64_t heldNs;
+};
+
 // The documents that suit a noise, by theory and by simulations through the plug-in.
 struct tDesign {
     tServoParameters quiet; // to hold the lock
     double theoreticalRmsNs = 0;
 
-    // To acquire it, if the quiet loop would be slow: for how long, and over what time to measure
-    // the frequency before.
-    tServoParameters quick;
-    int64_t quickNs = 0; // 0: not needed
+    // To acquire it, one after the other, if the quiet loop would be slow; and over what time to
+    // measure the frequency before.
+    std::vector<tQuickDocument> quick;
     int64_t measureOverNs = 0;
 };
 

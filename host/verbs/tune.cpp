@@ -161,18 +161,34 @@ private:
     std::array<tTrialResult, 2> results;
 };
 
+// quick.json, quick2.json, quick3.json
+std::string quickName(const std::string& file, size_t index)
+{
+    if (index == 0) return file;
+    const size_t dot = std::min(file.rfind('.'), file.size());
+    return file.substr(0, dot) + std::to_string(index + 1) + file.substr(dot);
+}
+
+// The options with which a host acquires the lock quickly and holds it quietly.
 std::string quickText(const tDesign& design, const tOptions& options)
 {
-    if (design.quickNs == 0) return "";
-    const auto name = [](const std::string& file, const char* otherwise) {
-        return file.empty() || file == "-" ? otherwise : file.c_str();
-    };
-    return fmt::format(
-        "slow to acquire; with a quick document{}:\n"
-        "    --measure-over {}s --config {} --then {}s={}\n",
-        options.quickOutput.empty() ? ", which --quick writes" : "",
-        static_cast<double>(design.measureOverNs) * 1e-9, name(options.quickOutput, "QUICK"),
-        static_cast<double>(design.quickNs) * 1e-9, name(options.output, "DOCUMENT"));
+    if (design.quick.empty()) return "";
+    const std::string quick = options.quickOutput.empty() ? "QUICK" : options.quickOutput;
+    const bool unnamed = options.output.empty() || options.output == "-";
+    const auto seconds = [](int64_t ns) { return static_cast<double>(ns) * 1e-9; };
+    std::string line = fmt::format("    --measure-over {}s --config {}",
+                                   seconds(design.measureOverNs), quickName(quick, 0));
+    int64_t sinceNs = 0;
+    for (size_t i = 0; i < design.quick.size(); ++i) {
+        sinceNs += design.quick[i].heldNs;
+        const bool last = i + 1 == design.quick.size();
+        line += fmt::format(" --then {}s={}", seconds(sinceNs),
+                            !last     ? quickName(quick, i + 1)
+                            : unnamed ? "DOCUMENT"
+                                      : options.output);
+    }
+    return fmt::format("slow to acquire; quicker with further documents{}:\n{}\n",
+                       options.quickOutput.empty() ? ", which --quick writes" : "", line);
 }
 
 void writeDocument(const std::string& file, const tServoParameters& parameters)
@@ -217,7 +233,8 @@ void tune(const tOptions& options)
     report.flush();
     writeDocument(options.output, design.quiet);
     if (options.quickOutput.empty()) return;
-    writeDocument(options.quickOutput, design.quickNs > 0 ? design.quick : design.quiet);
+    for (size_t i = 0; i < design.quick.size(); ++i)
+        writeDocument(quickName(options.quickOutput, i), design.quick[i].parameters);
 }
 
 } // namespace
@@ -236,7 +253,8 @@ tVerb addTune(CLI::App& app)
         ->type_name("KP,KI");
     verb->add_option("-o,--output", options->output, "The document; else it goes to stdout")
         ->type_name("FILE");
-    verb->add_option("--quick", options->quickOutput, "Also one to acquire the lock with")
+    verb->add_option("--quick", options->quickOutput,
+                     "Also those to acquire the lock with, if any:\nFILE, then numbered ones")
         ->type_name("FILE");
     addLibraryOption(*verb, options->library);
     verb->final_callback([options] { requireEnough(*options); });
