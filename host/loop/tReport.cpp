@@ -54,7 +54,9 @@ void tReport::print(const std::string& text)
 
 void tReport::event(const tPair& pair, tLockEvent event, const tHostCalls& calls)
 {
-    note(pair, eventText(event, calls, signedDurationText(static_cast<double>(pair.errorNs()))));
+    if (event == kNothingNew) return;
+    const std::string error = signedDurationText(static_cast<double>(pair.errorNs()));
+    note(pair, eventText(event, calls, error));
 }
 
 void tReport::note(const tPair& pair, const std::string& text)
