@@ -3,6 +3,7 @@
 // work on the configuration.
 
 #include "verbs/check.h"
+#include "verbs/plot.h"
 #include "verbs/replay.h"
 #include "verbs/run.h"
 #include "verbs/show.h"
@@ -35,8 +36,8 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app),
-                           addCheck(app),    addShow(app),   addTune(app)};
+    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app), addCheck(app),
+                           addShow(app),     addPlot(app),   addTune(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())

@@ -178,6 +178,22 @@ expect "fifty years to the nanosecond" "call,2.000000000,,,,,stepTime,-157788000
 expect "coarse timestamps" "pair,1.000000000,1700000001000000000,1700000001006000000,6000000,6012000.000,," \
     "$(rows "${quiet[@]}" --granularity 1ms --initial-offset 6ms | grep '^pair,1')"
 
+# Pictures: both kinds, the script for them, and what is wrong with the name or with gnuplot.
+"${host[@]}" simulate --noise 400ns --csv "$scratch/it's.csv" > "$scratch/out"
+plot() { "${host[@]}" plot "$scratch/it's.csv" "$@" 2>&1; }
+plot -o "$scratch/p.svg"
+plot -o "$scratch/p.png"
+expect "an SVG with its text" "1 1 1" "$(for word in "it's.csv" "not locked" "offset ordered"; do
+    grep -c "$word" "$scratch/p.svg"; done | tr '\n' ' ' | sed 's/ $//')"
+expect "a PNG" "$(printf '\211PNG')" "$(head -c 4 "$scratch/p.png")"
+plot -o "$scratch/q.svg" --script "$scratch/script"
+gnuplot "$scratch/script"
+expect "the script draws the same" "" "$(cmp "$scratch/p.svg" "$scratch/q.svg")"
+expect "no picture" "dravik-host: --output: 'a.gif' does not end in .svg or .png" "$(plot -o a.gif)"
+expect "no gnuplot" "dravik-host: cannot start gnuplot: No such file or directory; --script writes what it would be given" \
+    "$(PATH=/none; plot -o a.svg)"
+expect "no folder" 1 "$(plot -o /none/a.svg | grep -c '^dravik-host: gnuplot did not draw it')"
+
 # SIGINT and SIGTERM end a run as its duration would.
 for signal in INT TERM; do
     "${host[@]}" run > "$scratch/$signal" & pid=$!
