@@ -194,16 +194,6 @@ expect "no gnuplot" "dravik-host: cannot start gnuplot: No such file or director
     "$(PATH=/none; plot -o a.svg)"
 expect "no folder" 1 "$(plot -o /none/a.svg | grep -c '^dravik-host: gnuplot did not draw it')"
 
-# SIGINT and SIGTERM end a run as its duration would.
-for signal in INT TERM; do
-    "${host[@]}" run > "$scratch/$signal" & pid=$!
-    for ((wait = 0; wait < 100; ++wait)); do [ -s "$scratch/$signal" ] && break; sleep 0.1; done
-    kill -$signal $pid
-    wait $pid
-    expect "SIG$signal: exit status" 0 $?
-    expect "SIG$signal: summary" 1 "$(grep -c '^host calls' "$scratch/$signal")"
-done
-
 # A plug-in that exceeds the clock's limits: the clock refuses, and code and payload arrive. It also
 # inspects the buffer of the host's status: new, filled, grown, and asked to shrink.
 cat > "$scratch/bad.c" << 'END'

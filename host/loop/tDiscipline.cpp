@@ -14,8 +14,8 @@ tServoHost& tuned(tServoHost& host, tTrace& trace, tSummary& summary, const tTun
 } // namespace
 
 tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
-                         const tDisciplineOptions& options)
-    : trace(options.csv), report(options.csv == "-"), host(library, clock),
+                         const tDisciplineOptions& given)
+    : options(given), trace(options.csv), report(options.csv == "-"), host(library, clock),
       observer(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
       later(tuned(host, trace, summary, options.tuning), options.later)
 {}
@@ -35,7 +35,7 @@ void tDiscipline::take(const tPair& pair)
     summary.addCalls(host.calls());
     summary.addPair(pair, event, observer.locked());
     report.event(pair, event, host.calls());
-    report.note(pair, later.observe(pair.elapsedNs, observer.locked()));
+    report.note(pair.elapsedNs, later.observe(pair.elapsedNs, observer.locked()));
     report.progress(pair, observer.locked());
 }
 
@@ -50,6 +50,19 @@ void tDiscipline::adjust(const tPair& pair)
         throw;
     }
     trace.addCalls(pair.elapsedNs, host.calls());
+}
+
+void tDiscipline::clearHistory()
+{
+    host.clearHistory();
+    observer.restart();
+    spacing.restart();
+}
+
+void tDiscipline::retune()
+{
+    tune(host, options.tuning);
+    later = tLaterDocuments(host, options.later);
 }
 
 void tDiscipline::finish()

@@ -19,19 +19,31 @@
 class tDiscipline
 {
 public:
-    // Library and clock are borrowed.
+    // All are borrowed.
     tDiscipline(const tServoLibrary& library, iClock& clock, const tDisciplineOptions& options);
 
     void start(const std::string& scenario); // one line for people, without its end
     void take(const tPair& pair);
     void finish();
 
-    // All pairs of a source between the two.
+    // Lets the servo measure anew, as if it had just been made, with its tuning.
+    void clearHistory();
+
+    // Reads all documents again. Throws std::runtime_error; what was applied until then stays.
+    void retune();
+
+    void note(int64_t elapsedNs, const std::string& text) { report.note(elapsedNs, text); }
+    bool locked() const { return observer.locked(); }
+    const tSummary& figures() const { return summary; }
+    tReport& reporter() { return report; }
+
+    // All pairs of a source between start and finish.
     void run(const std::string& scenario, iPairSource& source);
 
 private:
     void adjust(const tPair& pair);
 
+    const tDisciplineOptions& options;
     tTrace trace;
     tReport report;
     tSummary summary;

@@ -30,7 +30,7 @@ private:
         tLaterDocument option;
         std::string text;
     };
-    tServoHost& host;
+    tServoHost* host;
     std::string firstTuning;
     std::vector<tDocument> documents;
     size_t applied = 0;

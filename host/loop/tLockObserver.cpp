@@ -14,6 +14,12 @@ tLockEvent tLockObserver::observe(const tHostCalls& callsOfPair)
     return nothingDone();
 }
 
+void tLockObserver::restart()
+{
+    state = kMeasuring;
+    setBefore = false;
+}
+
 tLockEvent tLockObserver::frequencySet(int64_t offsetPpb, bool again)
 {
     if (state == kLocked) return kNothingNew;

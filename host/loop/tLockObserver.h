@@ -26,6 +26,7 @@ public:
     tLockObserver(int32_t lowestPpb, int32_t highestPpb);
 
     tLockEvent observe(const tHostCalls& callsOfPair);
+    void restart(); // the plug-in's history was cleared
     bool locked() const { return state == kLocked; }
     bool measuring() const { return state == kMeasuring; }
 

@@ -56,12 +56,17 @@ void tReport::event(const tPair& pair, tLockEvent event, const tHostCalls& calls
 {
     if (event == kNothingNew) return;
     const std::string error = signedDurationText(static_cast<double>(pair.errorNs()));
-    note(pair, eventText(event, calls, error));
+    note(pair.elapsedNs, eventText(event, calls, error));
 }
 
-void tReport::note(const tPair& pair, const std::string& text)
+void tReport::note(int64_t elapsedNs, const std::string& text)
 {
-    if (!text.empty()) print(fmt::format("{:>10} s  {}\n", secondsText(pair.elapsedNs, 3), text));
+    if (!text.empty()) print(fmt::format("{:>10} s  {}\n", secondsText(elapsedNs, 3), text));
+}
+
+void tReport::progressText(const std::string& text)
+{
+    if (line.due()) line.show(text);
 }
 
 void tReport::progress(const tPair& pair, bool locked)

@@ -16,7 +16,8 @@ public:
 
     void print(const std::string& text);
     void event(const tPair& pair, tLockEvent event, const tHostCalls& calls);
-    void note(const tPair& pair, const std::string& text); // "": nothing to say
+    void note(int64_t elapsedNs, const std::string& text); // "": nothing to say
+    void progressText(const std::string& text);            // in place of what it said before
     void progress(const tPair& pair, bool locked);
 
 private:

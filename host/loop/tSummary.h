@@ -16,6 +16,11 @@ public:
     void addHeldBack(const tPair& pair);
     void addPair(const tPair& pair, tLockEvent event, bool locked);
 
+    int64_t pairsTaken() const { return pairs - heldBack; }
+    int64_t lostLocks() const { return locksLost; }
+    int64_t steps() const { return callCounts[kStepTime]; }
+    double orderedPpb() const { return static_cast<double>(lastPpb); }
+
     // Aligned lines, each with its end.
     std::string text() const;
 

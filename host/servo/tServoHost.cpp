@@ -114,6 +114,14 @@ void tServoHost::adjustTime(uint64_t referenceNs, uint64_t clockNs)
     status.check("adjustTime");
 }
 
+void tServoHost::clearHistory()
+{
+    tStatus status;
+    const tCurrentScope scope(subject);
+    library.clearHistory(&table, &status);
+    status.check("clearHistory");
+}
+
 void tServoHost::writeConfig(const std::string& document)
 {
     tStatus status;

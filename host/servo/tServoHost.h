@@ -19,6 +19,9 @@ public:
     // Throws std::runtime_error with code and payload; the calls made until then are kept.
     void adjustTime(uint64_t referenceNs, uint64_t clockNs);
 
+    // Forgets what it measured. Throws std::runtime_error.
+    void clearHistory();
+
     // The texts of the plug-in. Throw std::runtime_error; of a refused document it says why.
     void writeConfig(const std::string& document);
     std::string readConfig();

@@ -33,34 +33,28 @@ tReading readBoth()
 
 } // namespace
 
-tLiveSource::tLiveSource(tSoftClock& softClock, const tStopSignal& stopSignal, int64_t paceNs,
+tLiveSource::tLiveSource(tSoftClock& softClock, const tSignals& watched, int64_t paceNs,
                          std::optional<int64_t> lengthNs)
-    : clock(softClock), stop(stopSignal), intervalNs(paceNs), durationNs(lengthNs),
+    : clock(softClock), signals(watched), intervalNs(paceNs), durationNs(lengthNs),
       startRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
 {}
 
-std::optional<tPair> tLiveSource::next()
+// A signal may also come between the test and the sleep, where it interrupts nothing: hence naps.
+std::optional<tLiveMoment> tLiveSource::next()
 {
-    if ((durationNs && dueNs >= *durationNs) || !sleepUntil(dueNs)) return std::nullopt;
+    constexpr int64_t kNapNs = 100'000'000;
+    if (signals.stopRaised() || (durationNs && dueNs >= *durationNs)) return std::nullopt;
+    const int64_t remainingNs = dueNs - elapsedNs();
+    if (remainingNs > 0) {
+        const timespec nap{0, static_cast<long>(std::min(remainingNs, kNapNs))};
+        nanosleep(&nap, nullptr);
+        if (remainingNs > kNapNs || signals.stopRaised()) return tLiveMoment{elapsedNs(), {}};
+    }
     const tReading reading = readBoth();
     // A machine that slept through several pairs leaves them out instead of crowding them.
     dueNs += intervalNs * (1 + (elapsedNs() - dueNs + intervalNs / 2) / intervalNs);
-    return tPair{static_cast<int64_t>(reading.rawNs - startRawNs), reading.referenceNs,
-                 clock.timeAtRaw(reading.rawNs), std::nullopt};
-}
-
-// False if the stop signal came. The signal may also come between the test and the sleep, where
-// it interrupts nothing: hence naps.
-bool tLiveSource::sleepUntil(int64_t momentNs) const
-{
-    constexpr int64_t kNapNs = 100'000'000;
-    while (!stop.raised()) {
-        const int64_t remainingNs = momentNs - elapsedNs();
-        if (remainingNs <= 0) return true;
-        const timespec nap{0, static_cast<long>(std::min(remainingNs, kNapNs))};
-        nanosleep(&nap, nullptr);
-    }
-    return false;
+    const auto atNs = static_cast<int64_t>(reading.rawNs - startRawNs);
+    return tLiveMoment{atNs, tPair{atNs, reading.referenceNs, clock.timeAtRaw(reading.rawNs), {}}};
 }
 
 int64_t tLiveSource::elapsedNs() const

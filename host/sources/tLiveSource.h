@@ -1,25 +1,24 @@
 #pragma once
 
 #include "clocks/tSoftClock.h"
-#include "loop/tStopSignal.h"
-#include "sources/iPairSource.h"
+#include "loop/tSignals.h"
+#include "sources/iLiveSource.h"
 
 // Pairs measured on this machine, at the pace of real time: CLOCK_REALTIME is the reference.
-class tLiveSource : public iPairSource
+class tLiveSource : public iLiveSource
 {
 public:
-    // Clock and signal are borrowed. Without a duration the signal is the only end.
-    tLiveSource(tSoftClock& softClock, const tStopSignal& stopSignal, int64_t paceNs,
+    // Clock and signals are borrowed. Without a duration the signal is the only end.
+    tLiveSource(tSoftClock& softClock, const tSignals& watched, int64_t paceNs,
                 std::optional<int64_t> lengthNs);
 
-    std::optional<tPair> next() override;
+    std::optional<tLiveMoment> next() override;
 
 private:
-    bool sleepUntil(int64_t momentNs) const;
     int64_t elapsedNs() const;
 
     tSoftClock& clock;
-    const tStopSignal& stop;
+    const tSignals& signals;
     int64_t intervalNs;
     std::optional<int64_t> durationNs;
     uint64_t startRawNs;

@@ -6,6 +6,7 @@
 
 #include <cmath>
 #include <functional>
+#include <optional>
 #include <string>
 #include <type_traits>
 
@@ -33,7 +34,8 @@ void addQuantity(CLI::App& app, Number& value, const tQuantityOption& option)
 {
     const auto parse = [&value, option](const std::string& text) {
         const double number = parseWithin(option, text);
-        if constexpr (std::is_integral_v<Number>) {
+        if constexpr (std::is_integral_v<Number> ||
+                      std::is_same_v<Number, std::optional<int64_t>>) {
             value = static_cast<Number>(std::llround(number));
         } else {
             value = number;

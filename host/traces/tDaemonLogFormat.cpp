@@ -15,7 +15,7 @@ struct tMeasurement {
     std::string source; // the program, and the clock if it names one
 };
 
-constexpr std::array<std::string_view, 3> kPrograms = {"ptp4l", "phc2sys", "ts2phc"};
+constexpr std::array<std::string_view, 4> kPrograms = {"ptp4l", "phc2sys", "ts2phc", "dravik-host"};
 
 std::string_view programIn(std::string_view text)
 {

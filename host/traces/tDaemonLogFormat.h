@@ -2,8 +2,8 @@
 
 #include "traces/iTraceFormat.h"
 
-// What ptp4l, phc2sys and ts2phc print for each measurement, with or without the prefix of a system
-// log:
+// What ptp4l, phc2sys and ts2phc, and this program's own run, print for each measurement, with or
+// without the prefix of a system log:
 //
 //     ptp4l[1234.567]: master offset        -23 s2 freq  -12345 path delay       500
 //     Nov 23 08:35:26 host phc2sys: [1234.567] CLOCK_REALTIME phc offset  23 s2 freq +12 delay 500

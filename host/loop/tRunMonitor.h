@@ -1,0 +1,51 @@
+#pragma once
+
+#include "loop/tMetricsFile.h"
+#include "loop/tReport.h"
+#include "loop/tRunningFigures.h"
+
+#include <optional>
+#include <string>
+
+// What a run tells those who watch it: status lines in the manner of the field's tools, and figures
+// for a monitoring agent.
+//
+//     dravik-host[12.345]: offset        -23 s2 freq  +12345
+//     dravik-host[60.000]: rms   23 max   45 freq  +12345 +/-   12
+//
+// The offset is clock minus reference in ns; s0 is not locked, s2 is locked; freq is, in ppb, what
+// the clock was found to be fast by, which is minus what it was ordered.
+class tRunMonitor
+{
+public:
+    struct tOptions {
+        std::optional<int64_t> statusIntervalNs; // 0: a line for each pair
+        std::string metricsFile;
+    };
+
+    explicit tRunMonitor(const tOptions& given) : options(given), metrics(given.metricsFile) {}
+
+    struct tState {
+        bool locked = false;
+        double orderedPpb = 0;
+        std::optional<double> holdoverErrorNs;
+        int64_t holdoverNs = 0;
+        int64_t pairs = 0;
+        int64_t locksLost = 0;
+        int64_t steps = 0;
+    };
+
+    void pair(const tPair& pair, const tState& state, tReport& report);
+    void silence(int64_t elapsedNs, const tState& state);
+
+private:
+    void printStatus(const tPair& pair, const tState& state, tReport& report);
+    void writeMetrics(int64_t elapsedNs, const tState& state);
+
+    tOptions options;
+    tMetricsFile metrics;
+    tRunningFigures figures; // since the last line
+    std::optional<int64_t> lineNs;
+    std::optional<int64_t> metricsNs;
+    double latestErrorNs = 0;
+};

@@ -1,0 +1,32 @@
+#include "loop/tRunningFigures.h"
+
+#include <algorithm>
+#include <cmath>
+
+void tRunningFigures::add(const tPair& pair, double orderedPpb)
+{
+    if (pairs++ == 0) firstPpb = orderedPpb;
+    const auto errorNs = static_cast<double>(pair.errorNs());
+    squares += errorNs * errorNs;
+    peak = std::max(peak, std::fabs(errorNs));
+    const double difference = orderedPpb - firstPpb;
+    sum += difference;
+    sumOfSquares += difference * difference;
+}
+
+double tRunningFigures::rmsNs() const
+{
+    return pairs == 0 ? 0 : std::sqrt(squares / static_cast<double>(pairs));
+}
+
+double tRunningFigures::meanPpb() const
+{
+    return pairs == 0 ? 0 : firstPpb + sum / static_cast<double>(pairs);
+}
+
+double tRunningFigures::deviationPpb() const
+{
+    if (pairs == 0) return 0;
+    const double mean = sum / static_cast<double>(pairs);
+    return std::sqrt(std::max(0.0, sumOfSquares / static_cast<double>(pairs) - mean * mean));
+}

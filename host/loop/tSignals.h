@@ -1,0 +1,22 @@
+#pragma once
+
+#include <csignal>
+
+// While it lives, SIGINT, SIGTERM and SIGHUP interrupt a sleep and are remembered instead of ending
+// the program. One at a time.
+class tSignals
+{
+public:
+    tSignals();
+    tSignals(const tSignals&) = delete;
+    tSignals& operator=(const tSignals&) = delete;
+    ~tSignals();
+
+    bool stopRaised() const; // SIGINT or SIGTERM
+    bool takeReload();       // SIGHUP since the last time asked
+
+private:
+    struct sigaction previousInterrupt;
+    struct sigaction previousTerminate;
+    struct sigaction previousHangUp;
+};
