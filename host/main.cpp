@@ -2,7 +2,9 @@
 // clock. simulate and run choose a clock and a source of pairs, and share the loop; check and show
 // work on the configuration.
 
+#include "text/tLimitBroken.h"
 #include "verbs/check.h"
+#include "verbs/metrics.h"
 #include "verbs/plot.h"
 #include "verbs/replay.h"
 #include "verbs/run.h"
@@ -15,13 +17,13 @@
 
 namespace {
 
-enum tExitStatus { kGood = 0, kFailure = 1, kUsage = 2 };
+enum tExitStatus { kGood = 0, kFailure = 1, kUsage = 2, kLimitBroken = 3 };
 
 constexpr const char* kFooter =
     "Values have units: ns us ms s min h, ppb ppm, %.\n"
     "Files may be -, the standard input or output.\n"
     "Exit status: 0 good; 1 a failure of the plug-in or of a file, such as a\n"
-    "refused document; 2 wrong usage.";
+    "refused document; 2 wrong usage; 3 a limit of metrics is not held.";
 
 std::string errorLine(const CLI::App* /*app*/, const CLI::Error& error)
 {
@@ -36,8 +38,8 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app), addCheck(app),
-                           addShow(app),     addPlot(app),   addTune(app)};
+    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app),     addTune(app),
+                           addCheck(app),    addShow(app),   addMetrics(app), addPlot(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())
@@ -56,6 +58,9 @@ int main(int argc, char** argv)
 {
     try {
         return hostMain(argc, argv);
+    } catch (const tLimitBroken& broken) {
+        (void)std::fprintf(stderr, "dravik-host: %s\n", broken.what());
+        return kLimitBroken;
     } catch (const std::exception& failure) {
         (void)std::fprintf(stderr, "dravik-host: %s\n", failure.what());
         return kFailure;

@@ -45,7 +45,7 @@ losses counted      |0|lost 2 times|$bad
 out of reach        |0|^ +3\.000 s  frequency at its limit, -500\.000 ppm$|simulate --frequency-error 600ppm
 real time           |0|^pairs       [1-8] in 0\.[0-9]+ s$|run --duration 1s
 version             |0|^dravik-host [0-9]+\.[0-9]+\.[0-9]+$|--version
-help                |0|^refused document; 2 wrong usage\.$|simulate --help
+help                |0|^refused document; 2 wrong usage; 3 a limit of metrics is not held\.$|simulate --help
 tuned before pair 1 |0|^ +2\.000 s  no step needed, error \+1\.012 ms|simulate --config $scratch/blunt.json
 a new servo         |0|"snapTimeThreshold":.1e-06,$|show
 of an unknown type  |0|"snapTimeThreshold":.1e-06,$|show --reference-type none

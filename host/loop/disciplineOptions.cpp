@@ -9,9 +9,10 @@ namespace {
 tLaterDocument parseLater(const std::string& text)
 {
     const size_t equals = text.find('=');
-    if (equals == std::string::npos || equals + 1 == text.size())
+    if (equals == std::string::npos || equals + 1 == text.size()) {
         throw CLI::ValidationError("--then",
                                    "'" + text + "' is not AFTER=FILE, such as 60s=a.json");
+    }
     const tQuantityOption after = {"--then", kDuration, "", "0ns", "438300h", ""};
     return {static_cast<int64_t>(parseWithin(after, text.substr(0, equals))),
             text.substr(equals + 1)};

@@ -2,6 +2,15 @@
 
 #include <algorithm>
 
+std::string_view takeLine(std::string_view& text)
+{
+    const size_t end = std::min(text.find('\n'), text.size());
+    std::string_view line = text.substr(0, end);
+    text.remove_prefix(std::min(end + 1, text.size()));
+    if (!line.empty() && line.back() == '\r') line.remove_suffix(1);
+    return line;
+}
+
 std::string_view takeWord(std::string_view& text)
 {
     text.remove_prefix(std::min(text.find_first_not_of(" \t"), text.size()));

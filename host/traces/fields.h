@@ -7,6 +7,9 @@
 
 // Pieces of a line.
 
+// Splits a line off, without its end.
+std::string_view takeLine(std::string_view& text);
+
 // Splits the next word off the text; "" at its end.
 std::string_view takeWord(std::string_view& text);
 

@@ -1,4 +1,5 @@
 #include "text/readText.h"
+#include "traces/fields.h"
 #include "traces/iTraceFormat.h"
 #include "traces/tCsvFormat.h"
 #include "traces/tDaemonLogFormat.h"
@@ -10,16 +11,6 @@
 #include <stdexcept>
 
 namespace {
-
-// Splits a line off the text, without its end.
-std::string_view takeLine(std::string_view& text)
-{
-    const size_t end = std::min(text.find('\n'), text.size());
-    std::string_view line = text.substr(0, end);
-    text.remove_prefix(std::min(end + 1, text.size()));
-    if (!line.empty() && line.back() == '\r') line.remove_suffix(1);
-    return line;
-}
 
 class tFormats
 {

@@ -1,0 +1,21 @@
+#pragma once
+
+#include "metrics/tMeasured.h"
+
+#include <optional>
+#include <string>
+#include <vector>
+
+// A figure by its name: rms, peak, peak-to-peak, mean, time-to-lock, locks-lost, and with a tau in
+// parentheses adev, oadev, mdev, tdev, mtie.
+struct tFigure {
+    std::string name;
+    double tau = 0;      // s
+    bool isTime = false; // in s; else a plain number
+};
+
+// Throws std::invalid_argument for what is no figure.
+tFigure parseFigure(const std::string& text);
+
+// Nothing if the data do not tell.
+std::optional<double> valueOf(const tFigure& figure, const tMeasured& measured);

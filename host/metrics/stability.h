@@ -1,0 +1,22 @@
+#pragma once
+
+#include "metrics/tSeries.h"
+
+#include <optional>
+
+// How stable a phase is over tau, n intervals. Nothing if the series is too short for it.
+struct tStability {
+    std::optional<double> adev;  // Allan deviation; a fraction, as the next two
+    std::optional<double> oadev; // from all overlapping stretches
+    std::optional<double> mdev;  // modified: of averages
+    std::optional<double> tdev;  // of time; s
+    std::optional<double> mtie;  // largest peak-to-peak within tau; s
+};
+
+tStability stabilityAt(const tSeries& series, size_t n);
+
+// The largest n for which there is an Allan deviation; 0 if there is none.
+size_t largestAveraging(const tSeries& series);
+
+// 1, 2, 4 ... as far as the series allows.
+std::vector<size_t> octaves(const tSeries& series);

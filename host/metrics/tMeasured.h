@@ -1,0 +1,37 @@
+#pragma once
+
+#include "metrics/tSeries.h"
+#include "traces/tRecording.h"
+
+#include <optional>
+#include <string>
+
+// What of a trace is looked at.
+struct tSelection {
+    bool measured = false;         // the measured error also where the true one is known
+    std::optional<int64_t> fromNs; // else from the first lock on, if the trace tells of locks
+    std::optional<int64_t> toNs;
+};
+
+// The figures of a phase error that need no even spacing, and the series that the others need.
+struct tMeasured {
+    std::string what; // in words
+    double fromSeconds = 0;
+    double toSeconds = 0;
+    std::vector<double> errors;       // s, all
+    tSeries series;                   // the longest stretch without a gap
+    std::optional<double> timeToLock; // s; if the trace tells of locks
+    std::optional<int64_t> locksLost;
+
+    double mean() const;
+    double rms() const;
+    double peak() const;
+    double peakToPeak() const;
+};
+
+// Throws std::runtime_error if nothing is selected.
+tMeasured measure(const tRecording& recording, const tSelection& selection);
+
+// Of a file of numbers, one a line, "#" beginning a comment: phase in seconds, or fractional
+// frequency. Throws std::runtime_error that names a line that is no number.
+tMeasured readNumbers(const std::string& file, double interval, bool frequency);
