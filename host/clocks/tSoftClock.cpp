@@ -3,9 +3,14 @@
 #include "clocks/systemTime.h"
 
 tSoftClock::tSoftClock(uint64_t startNs, double frequencyErrorPpb, int32_t maxOffsetPpb)
-    : tSteeredClock(startNs, frequencyErrorPpb, maxOffsetPpb),
-      lastRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
+    : clock(startNs, frequencyErrorPpb, maxOffsetPpb), lastRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
 {}
+
+tCrossReading tSoftClock::crossRead()
+{
+    const tCrossReading raw = crossReadSystem(CLOCK_MONOTONIC_RAW);
+    return {raw.systemNs, timeAtRaw(raw.clockNs), raw.windowNs};
+}
 
 uint64_t tSoftClock::timeNs() { return timeAtRaw(systemTimeNs(CLOCK_MONOTONIC_RAW)); }
 
@@ -13,12 +18,12 @@ uint64_t tSoftClock::timeNs() { return timeAtRaw(systemTimeNs(CLOCK_MONOTONIC_RA
 void tSoftClock::setOffsetPpb(int32_t offsetPpb)
 {
     timeNs();
-    tSteeredClock::setOffsetPpb(offsetPpb);
+    clock.setOffsetPpb(offsetPpb);
 }
 
 uint64_t tSoftClock::timeAtRaw(uint64_t rawNs)
 {
-    pass(static_cast<int64_t>(rawNs - lastRawNs));
+    clock.pass(static_cast<int64_t>(rawNs - lastRawNs));
     lastRawNs = rawNs;
-    return tSteeredClock::timeNs();
+    return clock.timeNs();
 }

@@ -19,9 +19,9 @@ public:
     // Fractions of a nanosecond included; positive: the clock is ahead.
     double aheadOfNs(uint64_t trueNs) const;
 
-protected:
     void pass(int64_t trueNs, double phaseNoiseNs = 0);
 
+protected:
     double frequencyError; // of the oscillator: a fraction, positive is fast
 
 private:

@@ -25,6 +25,8 @@ void tLiveRun::run(const std::string& scenario, iLiveSource& source)
             silence(moment->elapsedNs);
         }
     }
+    const std::string remarks = source.remarks();
+    if (!remarks.empty()) discipline.reporter().print(remarks + "\n");
     discipline.finish();
 }
 

@@ -2,62 +2,64 @@
 
 #include "clocks/systemTime.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
-#include <limits>
+#include <cmath>
 
-namespace {
-
-struct tReading {
-    uint64_t rawNs;
-    uint64_t referenceNs;
-};
-
-// Two clocks cannot be read at once: the reference is read between two readings of the raw clock
-// and belongs to their middle. The closest pair of several is the one least disturbed.
-tReading readBoth()
-{
-    constexpr int kAttempts = 9;
-    tReading best{};
-    uint64_t shortestNs = std::numeric_limits<uint64_t>::max();
-    for (int attempt = 0; attempt < kAttempts; ++attempt) {
-        const uint64_t beforeNs = systemTimeNs(CLOCK_MONOTONIC_RAW);
-        const uint64_t referenceNs = systemTimeNs(CLOCK_REALTIME);
-        const uint64_t bracketNs = systemTimeNs(CLOCK_MONOTONIC_RAW) - beforeNs;
-        if (bracketNs < shortestNs) {
-            shortestNs = bracketNs;
-            best = {beforeNs + bracketNs / 2, referenceNs};
-        }
-    }
-    return best;
-}
-
-} // namespace
-
-tLiveSource::tLiveSource(tSoftClock& softClock, const tSignals& watched, int64_t paceNs,
-                         std::optional<int64_t> lengthNs)
-    : clock(softClock), signals(watched), intervalNs(paceNs), durationNs(lengthNs),
+tLiveSource::tLiveSource(iLiveClock& liveClock, iReference& liveReference, const tSignals& watched,
+                         const tOptions& given)
+    : clock(liveClock), reference(liveReference), signals(watched), options(given),
       startRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
 {}
 
-// A signal may also come between the test and the sleep, where it interrupts nothing: hence naps.
+// A signal may also come between the test and the wait, where it interrupts nothing: hence naps.
+// A sample from before the latest order tells of a clock that is no more.
 std::optional<tLiveMoment> tLiveSource::next()
 {
     constexpr int64_t kNapNs = 100'000'000;
-    if (signals.stopRaised() || (durationNs && dueNs >= *durationNs)) return std::nullopt;
-    const int64_t remainingNs = dueNs - elapsedNs();
-    if (remainingNs > 0) {
-        const timespec nap{0, static_cast<long>(std::min(remainingNs, kNapNs))};
-        nanosleep(&nap, nullptr);
-        if (remainingNs > kNapNs || signals.stopRaised()) return tLiveMoment{elapsedNs(), {}};
+    const int64_t leftNs = options.durationNs ? *options.durationNs - elapsedNs() : kNapNs;
+    if (signals.stopRaised() || leftNs <= 0) return std::nullopt;
+    if (!ordered) ordered = clock.crossRead();
+    const auto sample = reference.next(std::min(leftNs, kNapNs));
+    if (!sample) return tLiveMoment{elapsedNs(), {}};
+    const tCrossReading now = clock.crossRead();
+    if (sample->systemNs < ordered->systemNs || sample->systemNs > now.systemNs) {
+        ++outOfDate;
+        if (now.systemNs < ordered->systemNs) ordered = now; // the machine's clock was set back
+        return tLiveMoment{elapsedNs(), {}};
     }
-    const tReading reading = readBoth();
-    // A machine that slept through several pairs leaves them out instead of crowding them.
-    dueNs += intervalNs * (1 + (elapsedNs() - dueNs + intervalNs / 2) / intervalNs);
-    const auto atNs = static_cast<int64_t>(reading.rawNs - startRawNs);
-    return tLiveMoment{atNs, tPair{atNs, reading.referenceNs, clock.timeAtRaw(reading.rawNs), {}}};
+    const tPair pair = pairAt(*sample, now);
+    ordered.reset();
+    return tLiveMoment{pair.elapsedNs, pair};
+}
+
+std::string tLiveSource::remarks() const
+{
+    if (outOfDate == 0 && reference.unusable() == 0) return "";
+    return fmt::format("left out of the reference's samples: {} out of date, {} not usable",
+                       outOfDate, reference.unusable());
 }
 
 int64_t tLiveSource::elapsedNs() const
 {
     return static_cast<int64_t>(systemTimeNs(CLOCK_MONOTONIC_RAW) - startRawNs);
+}
+
+// The clock has run evenly since it was last ordered anything.
+tPair tLiveSource::pairAt(const tReferenceSample& sample, const tCrossReading& now) const
+{
+    constexpr double kSecondNs = 1e9;
+    const auto agoNs = static_cast<double>(now.systemNs - sample.systemNs);
+    const auto systemNs = static_cast<double>(now.systemNs - ordered->systemNs);
+    const auto clockNs = static_cast<double>(static_cast<int64_t>(now.clockNs - ordered->clockNs));
+    const double rate = systemNs > 0 ? clockNs / systemNs : 1;
+    tPair pair{};
+    pair.elapsedNs = std::max<int64_t>(elapsedNs() - std::llround(agoNs), 0);
+    pair.clockNs = now.clockNs - static_cast<uint64_t>(std::llround(agoNs * rate));
+    pair.referenceNs = sample.referenceNs + static_cast<uint64_t>(options.referenceOffsetNs);
+    if (!sample.pulse) return pair;
+    const double seconds = std::round(static_cast<double>(pair.errorNs()) / kSecondNs);
+    pair.referenceNs += static_cast<uint64_t>(std::llround(seconds * kSecondNs));
+    return pair;
 }

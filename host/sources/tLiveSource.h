@@ -1,26 +1,36 @@
 #pragma once
 
-#include "clocks/tSoftClock.h"
+#include "clocks/iLiveClock.h"
 #include "loop/tSignals.h"
 #include "sources/iLiveSource.h"
+#include "sources/iReference.h"
 
-// Pairs measured on this machine, at the pace of real time: CLOCK_REALTIME is the reference.
+// Pairs measured on this machine, at the pace of real time: what a reference says, and what the
+// clock showed at that moment.
 class tLiveSource : public iLiveSource
 {
 public:
-    // Clock and signals are borrowed. Without a duration the signal is the only end.
-    tLiveSource(tSoftClock& softClock, const tSignals& watched, int64_t paceNs,
-                std::optional<int64_t> lengthNs);
+    struct tOptions {
+        int64_t referenceOffsetNs = 0;     // added to what the reference says
+        std::optional<int64_t> durationNs; // else the signal is the only end
+    };
+
+    // All are borrowed.
+    tLiveSource(iLiveClock& liveClock, iReference& liveReference, const tSignals& watched,
+                const tOptions& given);
 
     std::optional<tLiveMoment> next() override;
+    std::string remarks() const override;
 
 private:
     int64_t elapsedNs() const;
+    tPair pairAt(const tReferenceSample& sample, const tCrossReading& now) const;
 
-    tSoftClock& clock;
+    iLiveClock& clock;
+    iReference& reference;
     const tSignals& signals;
-    int64_t intervalNs;
-    std::optional<int64_t> durationNs;
+    tOptions options;
     uint64_t startRawNs;
-    int64_t dueNs = 0; // of the next pair, since the start
+    std::optional<tCrossReading> ordered; // the clock since it was last ordered anything
+    int64_t outOfDate = 0;                // samples
 };

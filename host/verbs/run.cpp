@@ -1,7 +1,8 @@
 #include "verbs/run.h"
 
-#include "clocks/systemTime.h"
+#include "clocks/openClock.h"
 #include "loop/tLiveRun.h"
+#include "sources/openReference.h"
 #include "sources/tLiveSource.h"
 
 #include <fmt/format.h>
@@ -11,23 +12,73 @@
 namespace {
 
 struct tOptions : tLiveRunOptions {
-    tInitialError initialError;
-    int64_t intervalNs = 0;
-    int64_t durationNs = 0; // 0: until the signal
+    std::string reference = "realtime";
+    std::string clock = "soft";
+    tInitialError initialError; // of the soft clock
+    int64_t intervalNs = 0;     // of a reference that is read on demand
+    tLiveSource::tOptions source;
 };
+
+std::string scenarioText(const tOptions& options, const tServoLibrary& library)
+{
+    const std::string start =
+        options.clock == "soft" ? ", " + options.initialError.text() : std::string();
+    return fmt::format("run: clock {}{}; reference {}; {}", options.clock, start, options.reference,
+                       library.path);
+}
 
 void run(const tOptions& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.discipline.library));
     tSignals signals;
-    const uint64_t startNs =
-        systemTimeNs(CLOCK_REALTIME) + static_cast<uint64_t>(options.initialError.offsetNs);
-    tSoftClock clock(startNs, options.initialError.frequencyPpb,
-                     options.discipline.maxFrequencyOffsetPpb);
-    const auto duration = options.durationNs > 0 ? std::optional(options.durationNs) : std::nullopt;
-    tLiveSource source(clock, signals, options.intervalNs, duration);
-    tLiveRun(library, clock, signals, options)
-        .run(fmt::format("run: clock {}; {}", options.initialError.text(), library.path), source);
+    const auto clock =
+        openClock({options.clock, options.discipline.maxFrequencyOffsetPpb,
+                   options.initialError.offsetNs, options.initialError.frequencyPpb});
+    const auto reference = openReference(options.reference, options.intervalNs);
+    tLiveSource source(*clock, *reference, signals, options.source);
+    tLiveRun(library, *clock, signals, options).run(scenarioText(options, library), source);
+}
+
+void addReferenceOptions(CLI::App& app, tOptions& options)
+{
+    app.add_option("--reference", options.reference,
+                   "realtime, phc:DEVICE, shm:UNIT (a segment of\nNTP) or sock:PATH (datagrams)")
+        ->type_name("NAME")
+        ->capture_default_str()
+        ->check([](const std::string& name) {
+            return isReferenceName(name) ? "" : "'" + name + "' is no reference; see --help";
+        });
+    addQuantity(app, options.source.referenceOffsetNs,
+                {"--reference-offset", kDuration, "0ns", "-438300h", "438300h",
+                 "Added to what it says, such as -37s from TAI\nto UTC"});
+    addQuantity(
+        app, options.intervalNs,
+        {"--interval", kDuration, "125ms", "1ms", "24h", "How often realtime and phc are read"});
+}
+
+void addClockOptions(CLI::App& app, tOptions& options)
+{
+    app.add_option("--clock", options.clock,
+                   "soft (the program's own), phc:DEVICE or\nrealtime (the machine's)")
+        ->type_name("NAME")
+        ->capture_default_str()
+        ->check([](const std::string& name) {
+            return isClockName(name) ? "" : "'" + name + "' is no clock; see --help";
+        });
+    addInitialErrorOptions(app, options.initialError, "3ms");
+}
+
+// What would have no effect is a mistake.
+void requireConsistency(const CLI::App& app, const tOptions& options)
+{
+    if (options.reference == options.clock)
+        throw CLI::ValidationError("--clock", options.clock + " is its own reference");
+    if (app.count("--interval") > 0 && !isReadOnDemand(options.reference))
+        throw CLI::ValidationError("--interval", options.reference + " has a pace of its own");
+    for (const char* const option : {"--initial-offset", "--frequency-error"}) {
+        if (app.count(option) > 0 && options.clock != "soft")
+            throw CLI::ValidationError(option, "only the soft clock starts as one likes");
+    }
 }
 
 void addGuardOptions(CLI::App& app, tOptions& options)
@@ -69,14 +120,14 @@ tVerb addRun(CLI::App& app)
 {
     CLI::App* const verb = app.add_subcommand("run", "Discipline a clock in real time");
     const auto options = std::make_shared<tOptions>();
-    addInitialErrorOptions(*verb, options->initialError, "3ms");
+    addReferenceOptions(*verb, *options);
+    addClockOptions(*verb, *options);
     addDisciplineOptions(*verb, options->discipline);
-    addQuantity(*verb, options->intervalNs,
-                {"--interval", kDuration, "125ms", "1ms", "24h", "Time from pair to pair"});
-    addQuantity(*verb, options->durationNs,
+    addQuantity(*verb, options->source.durationNs,
                 {"--duration", kDuration, "", "1ns", "438300h", "Else until SIGINT or SIGTERM"});
     addGuardOptions(*verb, *options);
     addSilenceOptions(*verb, *options);
     addMonitorOptions(*verb, options->monitor);
+    verb->final_callback([verb, options] { requireConsistency(*verb, *options); });
     return {verb, [options] { run(*options); }};
 }

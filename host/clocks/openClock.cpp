@@ -1,0 +1,62 @@
+#include "clocks/openClock.h"
+
+#include "clocks/systemTime.h"
+#include "clocks/tKernelClock.h"
+#include "clocks/tPtpDevice.h"
+#include "clocks/tSoftClock.h"
+#include "text/afterPrefix.h"
+
+#include <algorithm>
+#include <cerrno>
+#include <limits>
+#include <system_error>
+
+namespace {
+
+// What the kernel's own numbers can say: a long may have 32 bits.
+int32_t withinKernel(double limitPpb)
+{
+    const int32_t widestPpb = sizeof(long) > 4
+                                  ? std::numeric_limits<int32_t>::max()
+                                  : ppbOfKernelFrequency(std::numeric_limits<int32_t>::max()) - 1;
+    return static_cast<int32_t>(std::min<double>(limitPpb, widestPpb));
+}
+
+std::unique_ptr<iLiveClock> openPtp(const std::string& path, int32_t limitPpb)
+{
+    const auto device = std::make_shared<tPtpDevice>(path);
+    const int32_t narrower = std::min(limitPpb, withinKernel(device->maxOffsetPpb()));
+    return std::make_unique<tKernelClock>(device->clock(), path, narrower,
+                                          [device] { return device->crossRead(); });
+}
+
+std::unique_ptr<iLiveClock> openRealtime(int32_t limitPpb)
+{
+    timex state{};
+    if (clock_adjtime(CLOCK_REALTIME, &state) < 0)
+        throw std::system_error(errno, std::generic_category(), "cannot read CLOCK_REALTIME");
+    const int32_t narrower = std::min(limitPpb, ppbOfKernelFrequency(state.tolerance));
+    return std::make_unique<tKernelClock>(CLOCK_REALTIME, "CLOCK_REALTIME", narrower,
+                                          readSystemItself);
+}
+
+std::unique_ptr<iLiveClock> startSoft(const tClockChoice& choice)
+{
+    const uint64_t startNs =
+        systemTimeNs(CLOCK_REALTIME) + static_cast<uint64_t>(choice.startOffsetNs);
+    return std::make_unique<tSoftClock>(startNs, choice.startFrequencyPpb, choice.limitPpb);
+}
+
+} // namespace
+
+bool isClockName(const std::string& name)
+{
+    return name == "soft" || name == "realtime" || afterPrefix(name, "phc:");
+}
+
+std::unique_ptr<iLiveClock> openClock(const tClockChoice& choice)
+{
+    if (const auto path = afterPrefix(choice.name, "phc:")) return openPtp(*path, choice.limitPpb);
+    if (choice.name == "realtime") return openRealtime(choice.limitPpb);
+    return startSoft(choice);
+}

@@ -1,0 +1,76 @@
+#include "clocks/tKernelClock.h"
+
+#include "clocks/systemTime.h"
+
+#include <fmt/format.h>
+
+#include <cerrno>
+#include <cmath>
+#include <stdexcept>
+#include <system_error>
+#include <utility>
+
+namespace {
+
+constexpr int64_t kSecondNs = 1'000'000'000;
+constexpr double kKernelUnitsPerPpb = 65.536;
+
+// A time_t may have 32 bits.
+time_t secondsOf(int64_t whole)
+{
+    const auto seconds = static_cast<time_t>(whole);
+    if (seconds != whole)
+        throw std::out_of_range(fmt::format("a step by {} s is beyond this machine's time", whole));
+    return seconds;
+}
+
+} // namespace
+
+long kernelFrequency(int32_t offsetPpb) { return std::lround(offsetPpb * kKernelUnitsPerPpb); }
+
+int32_t ppbOfKernelFrequency(long frequency)
+{
+    return static_cast<int32_t>(std::lround(static_cast<double>(frequency) / kKernelUnitsPerPpb));
+}
+
+tKernelClock::tKernelClock(clockid_t clock, std::string nameForPeople, int32_t limitPpb,
+                           std::function<tCrossReading()> crossReader)
+    : id(clock), name(std::move(nameForPeople)), limit(limitPpb), reader(std::move(crossReader))
+{}
+
+uint64_t tKernelClock::timeNs() { return systemTimeNs(id); }
+
+// The kernel wants seconds of either sign and nanoseconds that are not negative.
+void tKernelClock::step(int64_t deltaNs)
+{
+    const int64_t nanoseconds = ((deltaNs % kSecondNs) + kSecondNs) % kSecondNs;
+    timex request{};
+    request.modes = ADJ_SETOFFSET | ADJ_NANO;
+    request.time.tv_sec = secondsOf((deltaNs - nanoseconds) / kSecondNs);
+    request.time.tv_usec = static_cast<suseconds_t>(nanoseconds);
+    adjust(request, "step");
+}
+
+int32_t tKernelClock::offsetPpb() { return ppbOfKernelFrequency(adjust({}, "read").freq); }
+
+// Beyond its limits one clock refuses and another one takes the limit without a word.
+void tKernelClock::setOffsetPpb(int32_t offsetPpb)
+{
+    timex request{};
+    request.modes = ADJ_FREQUENCY;
+    request.freq = kernelFrequency(offsetPpb);
+    adjust(request, "set the frequency of");
+    const int32_t inForcePpb = this->offsetPpb();
+    if (inForcePpb == offsetPpb) return;
+    throw std::out_of_range(
+        fmt::format("{} took an offset of {} ppb for {} ppb", name, inForcePpb, offsetPpb));
+}
+
+timex tKernelClock::adjust(timex request, const char* deed)
+{
+    if (clock_adjtime(id, &request) >= 0) return request;
+    const int failure = errno;
+    throw std::system_error(failure, std::generic_category(),
+                            fmt::format("cannot {} {}{}", deed, name,
+                                        failure == EPERM ? ", which takes CAP_SYS_TIME" : ""));
+}

@@ -1,0 +1,38 @@
+#pragma once
+
+#include "clocks/iLiveClock.h"
+
+#include <ctime>
+#include <functional>
+#include <string>
+#include <sys/timex.h>
+
+// A clock that the kernel keeps: CLOCK_REALTIME, or a PTP hardware clock.
+class tKernelClock : public iLiveClock
+{
+public:
+    // The name is for people. The limit is the program's own; the kernel may have a narrower one.
+    tKernelClock(clockid_t clock, std::string name, int32_t limitPpb,
+                 std::function<tCrossReading()> crossReader);
+
+    tCrossReading crossRead() override { return reader(); }
+
+    uint64_t timeNs() override;
+    void step(int64_t deltaNs) override;
+    int32_t offsetPpb() override;
+    void setOffsetPpb(int32_t offsetPpb) override;
+    int32_t maxOffsetPpb() override { return limit; }
+    int32_t minOffsetPpb() override { return -limit; }
+
+private:
+    timex adjust(timex request, const char* deed);
+
+    clockid_t id;
+    std::string name;
+    int32_t limit; // ppb
+    std::function<tCrossReading()> reader;
+};
+
+// The kernel counts in 2^-16 ppm. Rounded both ways, a value that is read back is the one set.
+long kernelFrequency(int32_t offsetPpb);
+int32_t ppbOfKernelFrequency(long frequency);

@@ -1,0 +1,50 @@
+#include "sources/openReference.h"
+
+#include "clocks/systemTime.h"
+#include "clocks/tPtpDevice.h"
+#include "sources/tClockReference.h"
+#include "sources/tSharedMemoryReference.h"
+#include "sources/tSocketReference.h"
+#include "text/afterPrefix.h"
+
+#include <charconv>
+
+namespace {
+
+std::optional<int> unitIn(const std::string& name)
+{
+    constexpr int kLastUnit = 255;
+    const auto text = afterPrefix(name, "shm:");
+    if (!text) return std::nullopt;
+    int unit = 0;
+    const char* const end = text->data() + text->size();
+    const auto result = std::from_chars(text->data(), end, unit);
+    if (result.ec != std::errc() || result.ptr != end || unit < 0 || unit > kLastUnit)
+        return std::nullopt;
+    return unit;
+}
+
+} // namespace
+
+bool isReferenceName(const std::string& name)
+{
+    return isReadOnDemand(name) || unitIn(name) || afterPrefix(name, "sock:");
+}
+
+bool isReadOnDemand(const std::string& name)
+{
+    return name == "realtime" || afterPrefix(name, "phc:");
+}
+
+std::unique_ptr<iReference> openReference(const std::string& name, int64_t intervalNs)
+{
+    if (const auto unit = unitIn(name)) return std::make_unique<tSharedMemoryReference>(*unit);
+    if (const auto path = afterPrefix(name, "sock:"))
+        return std::make_unique<tSocketReference>(*path);
+    if (const auto path = afterPrefix(name, "phc:")) {
+        const auto device = std::make_shared<tPtpDevice>(*path);
+        return std::make_unique<tClockReference>(intervalNs,
+                                                 [device] { return device->crossRead(); });
+    }
+    return std::make_unique<tClockReference>(intervalNs, readSystemItself);
+}

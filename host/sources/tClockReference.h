@@ -1,0 +1,23 @@
+#pragma once
+
+#include "clocks/tCrossReading.h"
+#include "sources/iReference.h"
+
+#include <functional>
+#include <utility>
+
+// A clock of this machine, read at a pace of our own.
+class tClockReference : public iReference
+{
+public:
+    tClockReference(int64_t paceNs, std::function<tCrossReading()> crossReader)
+        : intervalNs(paceNs), reader(std::move(crossReader))
+    {}
+
+    std::optional<tReferenceSample> next(int64_t atMostNs) override;
+
+private:
+    int64_t intervalNs;
+    std::function<tCrossReading()> reader;
+    std::optional<int64_t> dueNs; // by CLOCK_MONOTONIC_RAW
+};

@@ -1,0 +1,156 @@
+#include "sources/tSharedMemoryReference.h"
+
+#include "sources/nap.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+#include <atomic>
+#include <cerrno>
+#include <ctime>
+#include <stdexcept>
+#include <sys/ipc.h>
+#include <sys/shm.h>
+#include <system_error>
+
+namespace {
+
+// The members of the segment, by their offsets in bytes. Reference is the true time of an event
+// and system the machine's at the same moment; both have microseconds, and nanoseconds that older
+// producers leave alone.
+struct tLayout {
+    size_t size;
+    size_t referenceSeconds, referenceMicroseconds;
+    size_t systemSeconds, systemMicroseconds;
+    size_t leap, valid;
+    size_t referenceNanoseconds, systemNanoseconds;
+};
+constexpr size_t kMode = 0;
+constexpr size_t kCount = 4;
+constexpr tLayout kNarrow = {80, 8, 12, 16, 20, 24, 36, 40, 44};
+constexpr tLayout kWide = {96, 8, 16, 24, 32, 36, 48, 52, 56};
+
+constexpr uint32_t kNotSynchronised = 3; // of leap
+
+class tSegmentView
+{
+public:
+    tSegmentView(volatile unsigned char* bytes, bool isWide)
+        : start(bytes), layout(isWide ? kWide : kNarrow), wide(isWide)
+    {}
+
+    volatile uint32_t& word(size_t offset) const
+    {
+        return *reinterpret_cast<volatile uint32_t*>(start + offset);
+    }
+    volatile uint32_t& valid() const { return word(layout.valid); }
+    uint32_t leap() const { return word(layout.leap); }
+    std::optional<uint64_t> referenceNs() const
+    {
+        return timeNs(layout.referenceSeconds, layout.referenceMicroseconds,
+                      layout.referenceNanoseconds);
+    }
+    std::optional<uint64_t> systemNs() const
+    {
+        return timeNs(layout.systemSeconds, layout.systemMicroseconds, layout.systemNanoseconds);
+    }
+
+private:
+    // A second of 32 bits has no sign: it lasts until 2106.
+    uint64_t seconds(size_t offset) const
+    {
+        if (!wide) return word(offset);
+        return *reinterpret_cast<volatile uint64_t*>(start + offset);
+    }
+
+    // Nothing if it is no time that 64 bits of nanoseconds can tell.
+    std::optional<uint64_t> timeNs(size_t second, size_t microsecond, size_t nanosecond) const
+    {
+        constexpr uint64_t kLastSecond = 18'000'000'000;
+        const uint64_t whole = seconds(second);
+        const uint32_t microseconds = word(microsecond);
+        const uint32_t nanoseconds = word(nanosecond);
+        if (whole > kLastSecond || microseconds >= 1'000'000) return std::nullopt;
+        const bool finer = nanoseconds / 1000 == microseconds;
+        return whole * 1'000'000'000 + (finer ? nanoseconds : microseconds * 1000);
+    }
+
+    volatile unsigned char* start;
+    const tLayout& layout;
+    bool wide;
+};
+
+constexpr key_t kKey = 0x4e545030; // of unit 0
+
+[[noreturn]] void fail(int failure, int unit, const char* deed)
+{
+    throw std::system_error(failure, std::generic_category(),
+                            fmt::format("cannot {} the shared memory segment of unit {} ({:#x})",
+                                        deed, unit, kKey + unit));
+}
+
+// One that is there already has the size that its maker gave it.
+int openSegment(int unit)
+{
+    constexpr int kOwnerOnly = 0600;
+    const int there = shmget(kKey + unit, 0, 0);
+    if (there >= 0) return there;
+    if (errno != ENOENT) fail(errno, unit, "open");
+    const size_t size = sizeof(time_t) > 4 ? kWide.size : kNarrow.size;
+    const int made = shmget(kKey + unit, size, IPC_CREAT | kOwnerOnly);
+    if (made < 0) fail(errno, unit, "make");
+    return made;
+}
+
+} // namespace
+
+tSharedMemoryReference::tSharedMemoryReference(int unit)
+{
+    const int id = openSegment(unit);
+    shmid_ds state{};
+    if (shmctl(id, IPC_STAT, &state) != 0) fail(errno, unit, "look at");
+    wide = state.shm_segsz == kWide.size;
+    if (!wide && state.shm_segsz != kNarrow.size) {
+        throw std::runtime_error(
+            fmt::format("the shared memory segment of unit {} has {} bytes, neither {} nor {}",
+                        unit, state.shm_segsz, kNarrow.size, kWide.size));
+    }
+    void* const attached = shmat(id, nullptr, 0);
+    if (attached == reinterpret_cast<void*>(-1)) fail(errno, unit, "attach"); // NOLINT: its failure
+    segment = static_cast<volatile unsigned char*>(attached);
+}
+
+tSharedMemoryReference::~tSharedMemoryReference()
+{
+    shmdt(const_cast<unsigned char*>(segment)); // NOLINT: volatile for the producer's sake
+}
+
+// Nobody tells when a sample comes.
+std::optional<tReferenceSample> tSharedMemoryReference::next(int64_t atMostNs)
+{
+    constexpr int64_t kPollNs = 10'000'000;
+    if (const auto sample = take()) return sample;
+    nap(std::min(atMostNs, kPollNs));
+    return take();
+}
+
+// In mode 1 a producer that is at work meanwhile shows in the count; in mode 0 it waits for its
+// turn.
+std::optional<tReferenceSample> tSharedMemoryReference::take()
+{
+    const tSegmentView view(segment, wide);
+    if (view.valid() == 0) return std::nullopt;
+    const uint32_t mode = view.word(kMode);
+    const uint32_t countBefore = view.word(kCount);
+    std::atomic_thread_fence(std::memory_order_acquire);
+    const auto systemNs = view.systemNs();
+    const auto referenceNs = view.referenceNs();
+    const uint32_t leap = view.leap();
+    std::atomic_thread_fence(std::memory_order_acquire);
+    const bool undisturbed = mode == 0 || (mode == 1 && view.word(kCount) == countBefore);
+    view.valid() = 0;
+    if (undisturbed && systemNs && referenceNs && leap != kNotSynchronised)
+        return tReferenceSample{*systemNs, *referenceNs, false};
+    ++unusableCount;
+    return std::nullopt;
+}

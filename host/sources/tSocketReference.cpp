@@ -1,0 +1,104 @@
+#include "sources/tSocketReference.h"
+
+#include <fmt/format.h>
+
+#include <cerrno>
+#include <cmath>
+#include <cstring>
+#include <poll.h>
+#include <stdexcept>
+#include <sys/socket.h>
+#include <sys/un.h>
+#include <system_error>
+
+namespace {
+
+// The members after the time, which has 32 or 64 bits for seconds and as many for microseconds.
+struct tRest {
+    double offset; // true minus machine's time, s
+    int32_t pulse; // not 0: only the fraction of a second of the offset is known
+    int32_t leap;
+    int32_t unused;
+    int32_t magic;
+};
+constexpr size_t kNarrowSize = 2 * sizeof(int32_t) + sizeof(tRest);
+constexpr size_t kWideSize = 2 * sizeof(int64_t) + sizeof(tRest);
+static_assert(kNarrowSize == 32 && kWideSize == 40);
+
+template <typename Part> Part partAt(const unsigned char* bytes)
+{
+    Part part;
+    std::memcpy(&part, bytes, sizeof part);
+    return part;
+}
+
+std::optional<tReferenceSample> decode(const unsigned char* datagram, size_t size)
+{
+    constexpr int32_t kMagic = 0x534f434b;
+    constexpr int32_t kNotSynchronised = 3;
+    constexpr uint64_t kLastSecond = 18'000'000'000;
+    if (size != kNarrowSize && size != kWideSize) return std::nullopt;
+    const bool wide = size == kWideSize;
+    const uint64_t seconds = wide ? partAt<uint64_t>(datagram) : partAt<uint32_t>(datagram);
+    const uint64_t microseconds =
+        wide ? partAt<uint64_t>(datagram + 8) : partAt<uint32_t>(datagram + 4);
+    const auto rest = partAt<tRest>(datagram + size - sizeof(tRest));
+    const bool plausible = seconds <= kLastSecond && microseconds < 1'000'000 &&
+                           std::fabs(rest.offset) <= static_cast<double>(seconds);
+    if (!plausible || rest.magic != kMagic || rest.leap == kNotSynchronised) return std::nullopt;
+    const uint64_t systemNs = seconds * 1'000'000'000 + microseconds * 1000;
+    const auto offsetNs = static_cast<uint64_t>(std::llround(rest.offset * 1e9));
+    return tReferenceSample{systemNs, systemNs + offsetNs, rest.pulse != 0};
+}
+
+[[noreturn]] void fail(int failure, const std::string& path)
+{
+    throw std::system_error(failure, std::generic_category(), "cannot make the socket " + path);
+}
+
+sockaddr_un addressOf(const std::string& path)
+{
+    sockaddr_un address{};
+    address.sun_family = AF_UNIX;
+    if (path.size() >= sizeof address.sun_path) fail(ENAMETOOLONG, path);
+    std::memcpy(address.sun_path, path.c_str(), path.size() + 1);
+    return address;
+}
+
+int openSocket() { return socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0); }
+
+// Whether a name that is taken is only what a program left that did not end well.
+bool isAbandoned(const sockaddr_un& address)
+{
+    const tDescriptor probe(openSocket());
+    const auto* const general = reinterpret_cast<const sockaddr*>(&address);
+    return connect(probe.get(), general, sizeof address) != 0 && errno == ECONNREFUSED;
+}
+
+} // namespace
+
+tSocketReference::tSocketReference(const std::string& path) : name(path), socket(openSocket())
+{
+    if (socket.get() < 0) fail(errno, path);
+    const sockaddr_un address = addressOf(path);
+    const auto* const general = reinterpret_cast<const sockaddr*>(&address);
+    if (bind(socket.get(), general, sizeof address) == 0) return;
+    const int failure = errno;
+    if (failure != EADDRINUSE || !isAbandoned(address)) fail(failure, path);
+    (void)unlink(path.c_str());
+    if (bind(socket.get(), general, sizeof address) != 0) fail(errno, path);
+}
+
+tSocketReference::~tSocketReference() { (void)unlink(name.c_str()); }
+
+std::optional<tReferenceSample> tSocketReference::next(int64_t atMostNs)
+{
+    pollfd waiting{socket.get(), POLLIN, 0};
+    if (poll(&waiting, 1, static_cast<int>(atMostNs / 1'000'000)) <= 0) return std::nullopt;
+    unsigned char datagram[kWideSize + 1]; // a longer one shows
+    const ssize_t size = recv(socket.get(), datagram, sizeof datagram, 0);
+    if (size < 0) return std::nullopt;
+    const auto sample = decode(datagram, static_cast<size_t>(size));
+    if (!sample) ++unusableCount;
+    return sample;
+}
