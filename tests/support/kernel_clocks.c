@@ -1,5 +1,5 @@
 /* Loaded before the C library, it keeps CLOCK_REALTIME and a PTP hardware clock itself, so that
- * programs steer those and never the machine's: oscillators 20 ppm and -30 ppm off, starting at
+ * programs steer those and never the machine's: oscillators 100 ppm and -150 ppm off, starting at
  * 1000000000 s and 2000000000 s. KERNEL_CLOCKS names what is out of the ordinary, in letters:
  *   p  no capability to set anything     c  frequencies beyond 10 ppm become 10 ppm
  *   r  frequencies beyond 10 ppm are refused
@@ -23,8 +23,8 @@ struct clock {
     long frequency;
     int64_t rawNs;
 };
-static struct clock realtime = {1000000000LL * 1000000000, 20e-6, 0, 0};
-static struct clock ptp = {2000000000LL * 1000000000, -30e-6, 0, 0};
+static struct clock realtime = {1000000000LL * 1000000000, 100e-6, 0, 0};
+static struct clock ptp = {2000000000LL * 1000000000, -150e-6, 0, 0};
 
 static int odd(char letter)
 {
