@@ -181,15 +181,20 @@ expect "coarse timestamps" "pair,1.000000000,1700000001000000000,170000000100600
 # Pictures: both kinds, the script for them, and what is wrong with the name or with gnuplot.
 "${host[@]}" simulate --noise 400ns --csv "$scratch/it's.csv" > "$scratch/out"
 plot() { "${host[@]}" plot "$scratch/it's.csv" "$@" 2>&1; }
-plot -o "$scratch/p.svg"
+plot -o "$scratch/p.svg" --mask 802.1as
 plot -o "$scratch/p.png"
-expect "an SVG with its text" "1 1 1" "$(for word in "it's.csv" "not locked" "offset ordered"; do
+expect "an SVG with its text" "1 1 1 1 1" "$(for word in "it's.csv" "not locked" "offset ordered" ADEV "limit of TDEV"; do
     grep -c "$word" "$scratch/p.svg"; done | tr '\n' ' ' | sed 's/ $//')"
 expect "a PNG" "$(printf '\211PNG')" "$(head -c 4 "$scratch/p.png")"
-plot -o "$scratch/q.svg" --script "$scratch/script"
+plot -o "$scratch/q.svg" --mask 802.1as --script "$scratch/script"
 gnuplot "$scratch/script"
 expect "the script draws the same" "" "$(cmp "$scratch/p.svg" "$scratch/q.svg")"
 expect "no picture" "dravik-host: --output: 'a.gif' does not end in .svg or .png" "$(plot -o a.gif)"
+expect "no curve of that mask" 1 "$(plot -o a.svg --mask g8273.2-d | grep -c '^dravik-host: --mask: g8273.2-d not in {')"
+expect "too far apart for a mask" "dravik-host: pairs are too far apart for the mask's filter of 0.1 Hz" \
+    "$("${host[@]}" simulate --interval 2s --csv - 2> /dev/null | "${host[@]}" plot - -o a.svg --mask g8273.2-a 2>&1)"
+expect "nothing moves" 0 "$(printf 'reference_ns,clock_ns\n1000000000,1000000000\n2000000000,2000000000\n3000000000,3000000000\n' |
+    "${host[@]}" plot - -o "$scratch/p.svg" 2> /dev/null; echo $?)"
 expect "no gnuplot" "dravik-host: cannot start gnuplot: No such file or directory; --script writes what it would be given" \
     "$(PATH=/none; plot -o a.svg)"
 expect "no folder" 1 "$(plot -o /none/a.svg | grep -c '^dravik-host: gnuplot did not draw it')"

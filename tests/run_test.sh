@@ -39,14 +39,14 @@ expect "figures" "8 8 8" "$(grep -c '^# HELP' figures) $(grep -c '^# TYPE' figur
 
 # SIGHUP reads the documents again, and keeps the old ones if one of them is refused.
 echo '{"snapTimeThreshold": 1e-3}' > live.json
-"${host[@]}" run --interval 20ms --config live.json --no-step-after-lock > out 2>&1 & pid=$!
+"${host[@]}" run --interval 20ms --config live.json --no-step-after-lock --duration 30s > out 2>&1 & pid=$!
 waitFor 'locked'
 kill -HUP $pid
 waitFor 'documents read again'
 echo '{"snapTimeThreshold": 100}' > live.json
 kill -HUP $pid
 waitFor 'stay as they are'
-echo '{"snapTimeThreshold": 1e-8}' > live.json # which no lock withstands
+echo '{"snapTimeThreshold": 1e-8, "phaseLockCoefficientC": -10}' > live.json # no lock withstands it
 kill -HUP $pid
 wait $pid
 expect "no step after the lock: exit status" 1 $?

@@ -1,6 +1,5 @@
 #include "metrics/masks.h"
 
-#include "metrics/stability.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
@@ -8,7 +7,7 @@
 #include <algorithm>
 #include <cmath>
 #include <numeric>
-#include <optional>
+#include <stdexcept>
 
 namespace {
 
@@ -33,6 +32,14 @@ constexpr tMask kMasks[] = {
 constexpr double kCorner = 0.1;        // Hz
 constexpr double kLongestInterval = 1; // s; a filter of that corner needs some points in its time
 constexpr double kLongestTau = 1000;   // s
+constexpr double kSlopeFrom = 0.05;    // s; of the limit that grows with tau
+constexpr double kSlopeUpTo = 10;
+
+const tMask& maskOf(const std::string& name)
+{
+    return *std::find_if(std::begin(kMasks), std::end(kMasks),
+                         [&name](const tMask& m) { return name == m.name; });
+}
 
 tMaskLine compared(std::string limit, double foundNs, double limitNs)
 {
@@ -112,7 +119,6 @@ void addUnfiltered(std::vector<tMaskLine>& lines, const tMask& mask, const tMeas
                              : tMaskLine{limit, "less than 1000 s", tMaskLine::kNotChecked});
     }
     if (mask.tdevPerSecond > 0) {
-        constexpr double kSlopeUpTo = 10;
         const auto limitNs = [&mask](double tau) { return mask.tdevPerSecond * tau; };
         lines.push_back(
             comparedWorst(fmt::format("TDEV {} ns per s of tau up to 10 s", mask.tdevPerSecond),
@@ -164,10 +170,35 @@ const std::vector<std::string>& maskNames()
     return names;
 }
 
+std::vector<tMaskCurve> maskCurves(const std::string& name)
+{
+    const tMask& mask = maskOf(name);
+    std::vector<tMaskCurve> curves;
+    if (mask.lowPassedMtie > 0) {
+        curves.push_back({"MTIE", &tStability::mtie, true, kSlopeFrom, kLongestTau,
+                          mask.lowPassedMtie, mask.lowPassedMtie});
+    }
+    if (mask.lowPassedTdev > 0) {
+        curves.push_back({"TDEV", &tStability::tdev, true, kSlopeFrom, kLongestTau,
+                          mask.lowPassedTdev, mask.lowPassedTdev});
+    }
+    if (mask.tdevPerSecond > 0) {
+        curves.push_back({"TDEV", &tStability::tdev, false, kSlopeFrom, kSlopeUpTo,
+                          mask.tdevPerSecond * kSlopeFrom, mask.tdevPerSecond * kSlopeUpTo});
+    }
+    return curves;
+}
+
+tSeries behindMaskFilter(const tSeries& series)
+{
+    if (series.interval > kLongestInterval)
+        throw std::runtime_error("pairs are too far apart for the mask's filter of 0.1 Hz");
+    return lowPass(series, kCorner);
+}
+
 std::vector<tMaskLine> checkMask(const std::string& name, const tMeasured& measured)
 {
-    const tMask& mask = *std::find_if(std::begin(kMasks), std::end(kMasks),
-                                      [&name](const tMask& m) { return name == m.name; });
+    const tMask& mask = maskOf(name);
     std::vector<tMaskLine> lines;
     addUnfiltered(lines, mask, measured);
     if (measured.series.phase.size() > 1) addFiltered(lines, mask, measured.series);

@@ -1,5 +1,8 @@
 #include "plot/plotScript.h"
 
+#include "metrics/tMeasured.h"
+#include "plot/stabilityPanels.h"
+
 #include <fmt/format.h>
 
 #include <algorithm>
@@ -81,11 +84,11 @@ std::string tics(double typicalNs)
     return list;
 }
 
-std::string headText(const tRecording& recording, const std::string& file)
+std::string headText(const tRecording& recording, const std::string& file, int rows)
 {
-    const char* const terminal = endsWith(file, ".svg")
-                                     ? "svg size 1100,700 dynamic background '#ffffff'"
-                                     : "pngcairo size 1100,700 background '#ffffff'";
+    const std::string size = fmt::format("size 1100,{} background '#ffffff'", 100 + 300 * rows);
+    const std::string terminal =
+        endsWith(file, ".svg") ? "svg dynamic " + size : "pngcairo " + size;
     return fmt::format("set terminal {} font 'sans,11' noenhanced\n"
                        "set output {}\n"
                        "$pairs << END\n{}END\n"
@@ -108,7 +111,8 @@ std::string phaseText(const tRecording& recording)
                        "plot $pairs using 1:4 axes x1y2 with fillsteps lc rgb shade title 'not "
                        "locked', \\\n"
                        "    '' using 1:2 with lines lc rgb '#1f6feb' title 'clock - {}'\n"
-                       "unset nonlinear y\n",
+                       "unset nonlinear y\n"
+                       "set ytics auto\n",
                        quoted("Phase error, " + recording.name), typicalNs, typicalNs,
                        tics(typicalNs), isTrue ? "true time" : "reference, as measured");
 }
@@ -116,7 +120,6 @@ std::string phaseText(const tRecording& recording)
 std::string frequencyText()
 {
     return "set title 'Frequency'\n"
-           "set ytics auto\n"
            "set ylabel 'ppm'\n"
            "set xlabel 's'\n"
            "plot $pairs using 1:4 axes x1y2 with fillsteps lc rgb shade notitle, \\\n"
@@ -130,15 +133,20 @@ bool isPictureName(const std::string& file)
     return endsWith(file, ".svg") || endsWith(file, ".png");
 }
 
-std::string plotScript(const tRecording& recording, const std::string& file)
+std::string plotScript(const tRecording& recording, const tPlotOptions& options)
 {
     const auto& pairs = recording.pairs;
     const bool hasFrequency =
         std::any_of(pairs.begin(), pairs.end(),
                     [](const tRecordedPair& pair) { return pair.orderedPpb.has_value(); });
-    std::string script = headText(recording, file);
-    script += fmt::format("set multiplot layout {},1\n", hasFrequency ? 2 : 1);
+    const tSeries series = measure(recording, {}).series;
+    const int rows = 1 + (hasFrequency ? 1 : 0) + (hasStability(series) ? 1 : 0);
+    const double height = 1.0 / rows;
+    std::string script = headText(recording, options.picture, rows) + "set multiplot\n";
+    script += fmt::format("set size 1,{:.3f}\nset origin 0,{:.3f}\n", height, 1 - height);
     script += phaseText(recording);
+    script += fmt::format("set origin 0,{:.3f}\n", 1 - 2 * height);
     if (hasFrequency) script += frequencyText();
+    if (hasStability(series)) script += stabilityPanels(series, options.mask, {0, height});
     return script + "unset multiplot\n";
 }

@@ -18,10 +18,11 @@ tLiveSource::tLiveSource(iLiveClock& liveClock, iReference& liveReference, const
 std::optional<tLiveMoment> tLiveSource::next()
 {
     constexpr int64_t kNapNs = 100'000'000;
-    const int64_t leftNs = options.durationNs ? *options.durationNs - elapsedNs() : kNapNs;
-    if (signals.stopRaised() || leftNs <= 0) return std::nullopt;
     if (!ordered) ordered = clock.crossRead();
-    const auto sample = reference.next(std::min(leftNs, kNapNs));
+    const int64_t leftNs = options.durationNs ? *options.durationNs - elapsedNs() : kNapNs;
+    const auto sample = reference.next(std::clamp<int64_t>(leftNs, 0, kNapNs));
+    if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
+        return std::nullopt;
     if (!sample) return tLiveMoment{elapsedNs(), {}};
     const tCrossReading now = clock.crossRead();
     if (sample->systemNs < ordered->systemNs || sample->systemNs > now.systemNs) {

@@ -1,5 +1,6 @@
 #include "verbs/plot.h"
 
+#include "metrics/masks.h"
 #include "plot/plotScript.h"
 #include "plot/runGnuplot.h"
 #include "text/tOutputFile.h"
@@ -11,13 +12,13 @@ namespace {
 
 struct tOptions {
     tTraceOptions trace;
-    std::string picture;
+    tPlotOptions plot;
     std::string script; // "": none; "-": stdout
 };
 
 void plot(const tOptions& options)
 {
-    const std::string script = plotScript(readTrace(options.trace), options.picture);
+    const std::string script = plotScript(readTrace(options.trace), options.plot);
     if (options.script.empty()) {
         runGnuplot(script);
         return;
@@ -26,6 +27,15 @@ void plot(const tOptions& options)
                                                : tOutputFile(options.script);
     output.write(script);
     output.flush();
+}
+
+// Other masks limit single figures only.
+std::vector<std::string> curvedMaskNames()
+{
+    std::vector<std::string> names;
+    for (const std::string& name : maskNames())
+        if (!maskCurves(name).empty()) names.push_back(name);
+    return names;
 }
 
 void requirePictureName(const std::string& file)
@@ -45,11 +55,15 @@ tVerb addPlot(CLI::App& app)
             "-o,--output",
             [options](const std::string& file) {
                 requirePictureName(file);
-                options->picture = file;
+                options->plot.picture = file;
             },
             "The picture; its ending, .svg or .png,\nsays what kind")
         ->type_name("FILE")
         ->required();
+    verb->add_option("--mask", options->plot.mask,
+                     "Limits beside the stability curves, as of metrics")
+        ->type_name("NAME")
+        ->check(CLI::IsMember(curvedMaskNames()));
     verb->add_option("--script", options->script,
                      "Write the script for gnuplot instead; - is\nstdout")
         ->type_name("FILE");
