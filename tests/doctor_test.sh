@@ -1,0 +1,62 @@
+#!/usr/bin/env bash
+# What the doctor sees of the plug-in, of default documents in all their states, and of clocks, for
+# which a library of our own stands in.
+# Usage: doctor_test.sh FOLDER CC, with dravik-host and libdravik.so.1 in the folder
+set -uo pipefail
+bin=$(cd "$1" && pwd)
+host=(${EMULATOR:+"$EMULATOR"} "$bin/dravik-host")
+support=$(cd "$(dirname "$0")/support" && pwd)
+source "$support/expect.sh"
+scratch=$(mktemp -d)
+trap 'rm -rf "$scratch"' EXIT
+unset DRAVIK_LIBRARY
+cd "$scratch" || exit 1
+"$2" -shared -fPIC -o kernel_clocks.so "$support/kernel_clocks.c" -ldl -lm || exit 1
+
+# As on a target: the manager's folder is there, with one document that is good and one that is not.
+servos=$scratch/zv-chronel/servos
+mkdir -p "$servos"
+echo '{"phaseLockGain": 0.3}' > "$servos/dravik_tr_ptp4l_tab.json"
+echo '{"phaseLockGain": 0}' > "$servos/dravik_tr_ptp4l_bc.json"
+touch ptp
+export RELOCATIONS=multiarchlibdir=$scratch
+doctor() { # LETTERS ARGUMENT...: under the libraries that stand in
+    local under=(LD_PRELOAD="$scratch/kernel_clocks.so" LD_LIBRARY_PATH="$bin/../tests/relocations"
+        KERNEL_CLOCKS="$1")
+    [ -z "${EMULATOR:-}" ] || under=(QEMU_SET_ENV="$(IFS=,; echo "${under[*]}")")
+    env "${under[@]}" "${host[@]}" doctor "${@:2}" > out 2> err
+}
+
+doctor b ptp none
+expect "exit status" 1 $?
+expect "faults in all" "dravik-host: faults found: 2" "$(cat err)"
+while IFS='|' read -r count pattern; do
+    expect "$pattern" "$count" "$(grep -cE -- "$pattern" out)"
+done << END
+1|^ok +words +of (32|64) bits
+1|^ok +library +$bin/libdravik.so.1, with all nine functions\$
+1|^ok +servo
+1|^ok +document +IEEE 802.1AS-2011 TAB: $servos/dravik_tr_ptp4l_tab.json\$
+1|^FAULT document +IEEE 1588-2008 BC: $servos/dravik_tr_ptp4l_bc.json: applyMetaData failed
+1|^ok +CLOCK_REALTIME said to be synchronised; steered by \+0.000 ppm, up to \+500.000 ppm\$
+1|^ok +TAI offset +37 s\$
+1|^ok +PTP clock +ptp: steered up to \+62500.000 ppm, read by PTP_SYS_OFFSET within [0-9.]+ [nu]s, \+1e\+09 s from
+1|^FAULT PTP clock +cannot open none: No such file
+1|^(ok|look) +permission
+10|.
+END
+
+rm "$servos/dravik_tr_ptp4l_bc.json"
+doctor "" ptp
+expect "a document that is not there: exit status" 0 $?
+expect "a document that is not there" 1 "$(grep -c "^look .*$servos/dravik_tr_ptp4l_bc.json cannot be read: the built-in" out)"
+expect "hardware reads" 1 "$(grep -c 'by PTP_SYS_OFFSET_PRECISE within 0 ns' out)"
+
+"$2" -shared -fPIC -o other.so -x c /dev/null
+doctor "" --library ./other.so ptp
+expect "not the plug-in" "1 1" "$? $(grep -c '^FAULT library .*is not the plug-in: it has no zvckmservo_initialize' out)"
+doctor "" --library ./none.so ptp
+expect "no plug-in" "1 1" "$? $(grep -c '^FAULT library .*cannot load the plug-in: ./none.so' out)"
+
+echo "$checks checks, $failures failures"
+exit $((failures > 0))
