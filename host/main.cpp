@@ -4,6 +4,7 @@
 
 #include "text/tLimitBroken.h"
 #include "verbs/check.h"
+#include "verbs/doctor.h"
 #include "verbs/metrics.h"
 #include "verbs/plot.h"
 #include "verbs/replay.h"
@@ -38,8 +39,9 @@ int hostMain(int argc, char** argv)
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
     app.footer(kFooter);
-    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app),     addTune(app),
-                           addCheck(app),    addShow(app),   addMetrics(app), addPlot(app)};
+    const tVerb verbs[] = {addSimulate(app), addReplay(app), addRun(app),
+                           addTune(app),     addCheck(app),  addShow(app),
+                           addMetrics(app),  addPlot(app),   addDoctor(app)};
     try {
         app.parse(argc, argv);
         if (app.get_subcommands().empty())

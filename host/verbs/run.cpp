@@ -128,6 +128,6 @@ tVerb addRun(CLI::App& app)
     addGuardOptions(*verb, *options);
     addSilenceOptions(*verb, *options);
     addMonitorOptions(*verb, options->monitor);
-    verb->final_callback([verb, options] { requireConsistency(*verb, *options); });
+    verb->parse_complete_callback([verb, options] { requireConsistency(*verb, *options); });
     return {verb, [options] { run(*options); }};
 }

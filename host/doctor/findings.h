@@ -1,0 +1,18 @@
+#pragma once
+
+#include "doctor/tFinding.h"
+
+#include <string>
+#include <vector>
+
+// The plug-in: whether it loads, works and finds its default documents.
+tFindings servoFindings(const std::string& libraryFile);
+
+// The machine's own clock, as the kernel keeps it. Only looks.
+tFindings kernelClockFindings();
+
+// PTP hardware clocks; all that there are if none is named. Only looks.
+tFindings ptpClockFindings(std::vector<std::string> devices);
+
+// What this process may do.
+tFindings permissionFindings();

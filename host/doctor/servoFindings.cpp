@@ -1,0 +1,70 @@
+#include "clocks/tSteeredClock.h"
+#include "doctor/findings.h"
+#include "doctor/loggedDuring.h"
+#include "servo/tuning.h"
+
+#include <fmt/format.h>
+
+#include <ctime>
+#include <exception>
+
+namespace {
+
+// As the plug-in says in the system log: "... configuration from: FILE".
+std::string fileIn(const std::string& log)
+{
+    constexpr std::string_view kBefore = "configuration from: ";
+    const size_t found = log.find(kBefore);
+    if (found == std::string::npos) return "";
+    const size_t start = found + kBefore.size();
+    return log.substr(start, log.find('\n', start) - start);
+}
+
+tFinding documentFinding(const tServoLibrary& library, const std::string& referenceType)
+{
+    tSteeredClock clock(0, 0, 0); // stands still: there are no pairs
+    tServoHost host(library, clock);
+    tTuning tuning;
+    tuning.referenceType = referenceType;
+    const tLogged told = loggedDuring([&] { tune(host, tuning); });
+    const std::string file = fileIn(told.log);
+    const auto finding = [&](tFinding::tGrade grade, const std::string& text) {
+        return tFinding{grade, "document", fmt::format("{}: {}", referenceType, text)};
+    };
+    if (file.empty()) return finding(tFinding::kFault, "the plug-in looks for none");
+    if (!told.failure.empty()) return finding(tFinding::kFault, file + ": " + told.failure);
+    if (told.log.find("Unable") != std::string::npos)
+        return finding(tFinding::kLook, file + " cannot be read: the built-in values stay");
+    return finding(tFinding::kGood, file);
+}
+
+void addServo(tFindings& findings, const tServoLibrary& library)
+{
+    tSteeredClock clock(0, 0, 0);
+    tServoHost host(library, clock);
+    host.writeConfig(host.readConfig());
+    findings.push_back({tFinding::kGood, "servo", "starts, and takes the document that it gives"});
+    for (const char* const type : {"IEEE 802.1AS-2011 TAB", "IEEE 1588-2008 BC"})
+        findings.push_back(documentFinding(library, type));
+}
+
+} // namespace
+
+tFindings servoFindings(const std::string& libraryFile)
+{
+    constexpr size_t kBits = 8;
+    tFindings findings;
+    findings.push_back({tFinding::kGood, "words",
+                        fmt::format("of {} bits, as the plug-in's must be; time_t of {} bits",
+                                    kBits * sizeof(void*), kBits * sizeof(std::time_t))});
+    const char* topic = "library";
+    try {
+        const tServoLibrary library(libraryFile);
+        findings.push_back({tFinding::kGood, topic, library.path + ", with all nine functions"});
+        topic = "servo";
+        addServo(findings, library);
+    } catch (const std::exception& failure) {
+        findings.push_back({tFinding::kFault, topic, failure.what()});
+    }
+    return findings;
+}

@@ -1,0 +1,5 @@
+#pragma once
+
+#include "text/options.h"
+
+tVerb addDoctor(CLI::App& app);
