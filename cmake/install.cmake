@@ -17,6 +17,23 @@ install(TARGETS dravik EXPORT dravikTargets
 install(FILES config/dravik_tr_ptp4l_tab.json config/dravik_tr_ptp4l_bc.json
     DESTINATION ${DRAVIK_SERVOS_DIR} COMPONENT library)
 install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT host)
+install(FILES host/completion/dravik-host
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT host)
+install(FILES examples/dravik-host.service
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/dravik-host/examples COMPONENT host)
+find_program(SCDOC scdoc)
+if(SCDOC)
+    foreach(page dravik-host.1 dravik-servo-document.5)
+        cmake_path(GET page EXTENSION LAST_ONLY section)
+        string(SUBSTRING ${section} 1 -1 section)
+        add_custom_command(OUTPUT ${page} DEPENDS docs/man/${page}.scd VERBATIM
+            COMMAND sh -c "${SCDOC} < ${PROJECT_SOURCE_DIR}/docs/man/${page}.scd > ${page}")
+        install(FILES ${PROJECT_BINARY_DIR}/${page}
+            DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT host)
+        list(APPEND pages ${PROJECT_BINARY_DIR}/${page})
+    endforeach()
+    add_custom_target(manual ALL DEPENDS ${pages})
+endif()
 
 install(DIRECTORY include/zvckmservo include/zverr DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
     COMPONENT development)

@@ -33,6 +33,6 @@ set(CPACK_DEBIAN_HOST_PACKAGE_NAME dravik-host)
 set(CPACK_DEBIAN_HOST_PACKAGE_SECTION utils)
 set(CPACK_DEBIAN_HOST_PACKAGE_DEPENDS "libdravik1 ${same_version}, ${run_time}, libfmt9")
 set(CPACK_COMPONENT_HOST_DESCRIPTION 
-    "The reference host: simulates and disciplines clocks, shows and checks configurations.")
+    "The reference host: simulates, replays and disciplines clocks; tunes, measures and plots.")
 
 include(CPack)

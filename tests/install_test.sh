@@ -25,6 +25,10 @@ $scratch/usr/$lib/libdravik.so
 $scratch/usr/$lib/libdravik.so.1
 $scratch/usr/$lib/libdravik.so.1.0.0
 $scratch/usr/$lib/pkgconfig/dravik.pc
+$scratch/usr/share/bash-completion/completions/dravik-host
+$scratch/usr/share/doc/dravik-host/examples/dravik-host.service
+$scratch/usr/share/man/man1/dravik-host.1
+$scratch/usr/share/man/man5/dravik-servo-document.5
 /usr/lib/arm-linux-gnueabi/zv-chronel/servos/dravik_tr_ptp4l_bc.json
 /usr/lib/arm-linux-gnueabi/zv-chronel/servos/dravik_tr_ptp4l_tab.json
 END
