@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cmath>
 #include <iterator>
+#include <limits>
 
 namespace {
 
@@ -117,13 +118,30 @@ std::string phaseText(const tRecording& recording)
                        tics(typicalNs), isTrue ? "true time" : "reference, as measured");
 }
 
-std::string frequencyText()
+// Once locked, what is ordered moves by much less than from the start to there.
+std::string frequencyRange(const std::vector<tRecordedPair>& pairs)
 {
-    return "set title 'Frequency'\n"
+    double lowest = std::numeric_limits<double>::infinity();
+    double highest = -lowest;
+    for (const tRecordedPair& pair : pairs) {
+        if (!pair.locked.value_or(true) || !pair.orderedPpb) continue;
+        lowest = std::min(lowest, *pair.orderedPpb / 1e3);
+        highest = std::max(highest, *pair.orderedPpb / 1e3);
+    }
+    if (!(lowest < highest)) return "";
+    const double margin = (highest - lowest) / 10;
+    return fmt::format("set yrange [{:.6g}:{:.6g}]\n", lowest - margin, highest + margin);
+}
+
+std::string frequencyText(const std::vector<tRecordedPair>& pairs)
+{
+    return frequencyRange(pairs) +
+           "set title 'Frequency'\n"
            "set ylabel 'ppm'\n"
            "set xlabel 's'\n"
            "plot $pairs using 1:4 axes x1y2 with fillsteps lc rgb shade notitle, \\\n"
-           "    '' using 1:3 with steps lc rgb '#d1242f' title 'offset ordered'\n";
+           "    '' using 1:3 with steps lc rgb '#d1242f' title 'offset ordered'\n"
+           "set yrange [*:*]\n";
 }
 
 } // namespace
@@ -146,7 +164,7 @@ std::string plotScript(const tRecording& recording, const tPlotOptions& options)
     script += fmt::format("set size 1,{:.3f}\nset origin 0,{:.3f}\n", height, 1 - height);
     script += phaseText(recording);
     script += fmt::format("set origin 0,{:.3f}\n", 1 - 2 * height);
-    if (hasFrequency) script += frequencyText();
+    if (hasFrequency) script += frequencyText(pairs);
     if (hasStability(series)) script += stabilityPanels(series, options.mask, {0, height});
     return script + "unset multiplot\n";
 }

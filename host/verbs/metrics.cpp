@@ -137,7 +137,7 @@ void metrics(const tOptions& options)
     const int brokenMasks = reportMasks(options, measured, options.json ? other : output);
     output.flush();
     std::string failures =
-        brokenMasks > 0 ? fmt::format("{} limits of masks broken", brokenMasks) : "";
+        brokenMasks > 0 ? fmt::format("limits of masks broken: {}", brokenMasks) : "";
     for (const tAssertion& assertion : options.assertions) {
         const std::string failure = assertion.failure(measured);
         if (failure.empty()) continue;

@@ -11,6 +11,7 @@
 
 #include <fmt/format.h>
 
+#include <filesystem>
 #include <memory>
 
 // From the noise, given in numbers or found in a trace, to the document that suits it.
@@ -165,8 +166,10 @@ private:
 std::string quickName(const std::string& file, size_t index)
 {
     if (index == 0) return file;
-    const size_t dot = std::min(file.rfind('.'), file.size());
-    return file.substr(0, dot) + std::to_string(index + 1) + file.substr(dot);
+    std::filesystem::path path = file;
+    path.replace_filename(path.stem().string() + std::to_string(index + 1) +
+                          path.extension().string());
+    return path.string();
 }
 
 // The options with which a host acquires the lock quickly and holds it quietly.
@@ -175,7 +178,7 @@ std::string quickText(const tDesign& design, const tOptions& options)
     if (design.quick.empty()) return "";
     const std::string quick = options.quickOutput.empty() ? "QUICK" : options.quickOutput;
     const bool unnamed = options.output.empty() || options.output == "-";
-    const auto seconds = [](int64_t ns) { return static_cast<double>(ns) * 1e-9; };
+    const auto seconds = [](int64_t ns) { return static_cast<double>(ns) / 1e9; };
     std::string line = fmt::format("    --measure-over {}s --config {}",
                                    seconds(design.measureOverNs), quickName(quick, 0));
     int64_t sinceNs = 0;
