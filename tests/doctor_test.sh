@@ -11,7 +11,7 @@ scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 cd "$scratch" || exit 1
-"$2" -shared -fPIC -o kernel_clocks.so "$support/kernel_clocks.c" -ldl -lm || exit 1
+source "$support/kernel_clocks.sh"
 
 # As on a target: the manager's folder is there, with one document that is good and one that is not.
 servos=$scratch/zv-chronel/servos
@@ -20,12 +20,8 @@ echo '{"phaseLockGain": 0.3}' > "$servos/dravik_tr_ptp4l_tab.json"
 echo '{"phaseLockGain": 0}' > "$servos/dravik_tr_ptp4l_bc.json"
 touch ptp
 export RELOCATIONS=multiarchlibdir=$scratch
-doctor() { # LETTERS ARGUMENT...: under the libraries that stand in
-    local under=(LD_PRELOAD="$scratch/kernel_clocks.so" LD_LIBRARY_PATH="$bin/../tests/relocations"
-        KERNEL_CLOCKS="$1")
-    [ -z "${EMULATOR:-}" ] || under=(QEMU_SET_ENV="$(IFS=,; echo "${under[*]}")")
-    env "${under[@]}" "${host[@]}" doctor "${@:2}" > out 2> err
-}
+export LIBRARIES=$bin/../tests/relocations
+doctor() { underKernelClocks "$1" "${host[@]}" doctor "${@:2}" > out 2> err; } # LETTERS ARGUMENT...
 
 doctor b ptp none
 expect "exit status" 1 $?

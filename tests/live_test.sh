@@ -13,7 +13,7 @@ trap 'dropSegment; rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 cd "$scratch" || exit 1
 "$2" -O1 -o producer "$support/producer.c" || exit 1
-"$2" -O1 -shared -fPIC -o kernel_clocks.so "$support/kernel_clocks.c" -ldl -lm || exit 1
+source "$support/kernel_clocks.sh"
 produce() { ${EMULATOR:+"$EMULATOR"} ./producer "$@"; }
 
 found() { grep -qE -- "$1" out; echo $?; }
@@ -65,15 +65,13 @@ expect "socket left behind" "0 1" "$? $([ -e here ]; echo $?)"
 
 # Clocks of the kernel. Nothing is steered before it is certain that the library stands in for it.
 kernel=("${run[@]}" --interval 20ms --duration 500ms)
-underLibrary() { LD_PRELOAD=$scratch/kernel_clocks.so "$@"; }
-[ -z "${EMULATOR:-}" ] || underLibrary() { QEMU_SET_ENV=LD_PRELOAD=$scratch/kernel_clocks.so "$@"; }
 touch ptp
-underLibrary "${kernel[@]}" --reference phc:ptp --clock realtime --dry-run --csv seen > out 2>&1
+underKernelClocks "" "${kernel[@]}" --reference phc:ptp --clock realtime --dry-run --csv seen > out 2>&1
 expect "stand-in" 0 "$(grep -q ',1000000000[0-9]*,' seen; echo $?)"
 if [ $failures == 0 ]; then
     while IFS='|' read -r letters status pattern options; do
         # shellcheck disable=SC2086  # split on purpose
-        KERNEL_CLOCKS=$letters underLibrary "${kernel[@]}" $options > out 2>&1
+        underKernelClocks "$letters" "${kernel[@]}" $options > out 2>&1
         expect "kernel $letters $options: exit status" "$status" $?
         expect "kernel $letters $options: $pattern" 0 "$(found "$pattern")"
     done << 'END'
