@@ -5,8 +5,8 @@
 #include <fmt/format.h>
 
 #include <algorithm>
-#include <atomic>
 #include <cerrno>
+#include <cstring>
 #include <ctime>
 #include <stdexcept>
 #include <sys/ipc.h>
@@ -32,18 +32,17 @@ constexpr tLayout kWide = {96, 8, 16, 24, 32, 36, 48, 52, 56};
 
 constexpr uint32_t kNotSynchronised = 3; // of leap
 
+// What the other side writes meanwhile is loaded in the order of the calls.
 class tSegmentView
 {
 public:
-    tSegmentView(volatile unsigned char* bytes, bool isWide)
+    tSegmentView(unsigned char* bytes, bool isWide)
         : start(bytes), layout(isWide ? kWide : kNarrow), wide(isWide)
     {}
 
-    volatile uint32_t& word(size_t offset) const
-    {
-        return *reinterpret_cast<volatile uint32_t*>(start + offset);
-    }
-    volatile uint32_t& valid() const { return word(layout.valid); }
+    uint32_t word(size_t offset) const { return __atomic_load_n(wordAt(offset), __ATOMIC_ACQUIRE); }
+    bool isValid() const { return word(layout.valid) != 0; }
+    void markTaken() const { __atomic_store_n(wordAt(layout.valid), 0U, __ATOMIC_RELEASE); }
     uint32_t leap() const { return word(layout.leap); }
     std::optional<uint64_t> referenceNs() const
     {
@@ -56,11 +55,17 @@ public:
     }
 
 private:
-    // A second of 32 bits has no sign: it lasts until 2106.
+    uint32_t* wordAt(size_t offset) const { return reinterpret_cast<uint32_t*>(start + offset); }
+
+    // A second of 32 bits has no sign: it lasts until 2106. One of 64 is read in halves, which the
+    // count of mode 1 keeps together.
     uint64_t seconds(size_t offset) const
     {
         if (!wide) return word(offset);
-        return *reinterpret_cast<volatile uint64_t*>(start + offset);
+        const uint32_t halves[] = {word(offset), word(offset + sizeof(uint32_t))};
+        uint64_t whole = 0;
+        std::memcpy(&whole, halves, sizeof whole);
+        return whole;
     }
 
     // Nothing if it is no time that 64 bits of nanoseconds can tell.
@@ -75,7 +80,7 @@ private:
         return whole * 1'000'000'000 + (finer ? nanoseconds : microseconds * 1000);
     }
 
-    volatile unsigned char* start;
+    unsigned char* start;
     const tLayout& layout;
     bool wide;
 };
@@ -117,13 +122,10 @@ tSharedMemoryReference::tSharedMemoryReference(int unit)
     }
     void* const attached = shmat(id, nullptr, 0);
     if (attached == reinterpret_cast<void*>(-1)) fail(errno, unit, "attach"); // NOLINT: its failure
-    segment = static_cast<volatile unsigned char*>(attached);
+    segment = static_cast<unsigned char*>(attached);
 }
 
-tSharedMemoryReference::~tSharedMemoryReference()
-{
-    shmdt(const_cast<unsigned char*>(segment)); // NOLINT: volatile for the producer's sake
-}
+tSharedMemoryReference::~tSharedMemoryReference() { (void)shmdt(segment); }
 
 // Nobody tells when a sample comes.
 std::optional<tReferenceSample> tSharedMemoryReference::next(int64_t atMostNs)
@@ -139,16 +141,14 @@ std::optional<tReferenceSample> tSharedMemoryReference::next(int64_t atMostNs)
 std::optional<tReferenceSample> tSharedMemoryReference::take()
 {
     const tSegmentView view(segment, wide);
-    if (view.valid() == 0) return std::nullopt;
+    if (!view.isValid()) return std::nullopt;
     const uint32_t mode = view.word(kMode);
     const uint32_t countBefore = view.word(kCount);
-    std::atomic_thread_fence(std::memory_order_acquire);
     const auto systemNs = view.systemNs();
     const auto referenceNs = view.referenceNs();
     const uint32_t leap = view.leap();
-    std::atomic_thread_fence(std::memory_order_acquire);
     const bool undisturbed = mode == 0 || (mode == 1 && view.word(kCount) == countBefore);
-    view.valid() = 0;
+    view.markTaken();
     if (undisturbed && systemNs && referenceNs && leap != kNotSynchronised)
         return tReferenceSample{*systemNs, *referenceNs, false};
     ++unusableCount;

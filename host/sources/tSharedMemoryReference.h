@@ -23,7 +23,7 @@ public:
 private:
     std::optional<tReferenceSample> take();
 
-    volatile unsigned char* segment = nullptr;
+    unsigned char* segment = nullptr;
     bool wide = false; // time_t of 64 bits
     int64_t unusableCount = 0;
 };
