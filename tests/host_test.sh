@@ -195,9 +195,16 @@ expect "too far apart for a mask" "dravik-host: pairs are too far apart for the 
     "$("${host[@]}" simulate --interval 2s --csv - 2> /dev/null | "${host[@]}" plot - -o a.svg --mask g8273.2-a 2>&1)"
 expect "nothing moves" 0 "$(printf 'reference_ns,clock_ns\n1000000000,1000000000\n2000000000,2000000000\n3000000000,3000000000\n' |
     "${host[@]}" plot - -o "$scratch/p.svg" 2> /dev/null; echo $?)"
+mkdir "$scratch/few" # programs, those that an emulator needs
+for program in bash dirname qemu-arm; do ln -s "$(command -v $program)" "$scratch/few/"; done
 expect "no gnuplot" "dravik-host: cannot start gnuplot: No such file or directory; --script writes what it would be given" \
-    "$(PATH=/none; plot -o a.svg)"
-expect "no folder" 1 "$(plot -o /none/a.svg | grep -c '^dravik-host: gnuplot did not draw it')"
+    "$(PATH=$scratch/few; plot -o "$scratch/a.svg")"
+printf '#!/bin/sh\nexit 1\n' > "$scratch/few/gnuplot"
+chmod +x "$scratch/few/gnuplot"
+"${host[@]}" simulate --duration 3h --csv "$scratch/it's.csv" > "$scratch/out"
+expect "gnuplot ends early" "dravik-host: gnuplot did not draw it; what is wrong stands above" \
+    "$(PATH=$scratch/few; plot -o "$scratch/a.svg")"
+expect "no folder" "dravik-host: cannot write /none/a.svg: No such file or directory" "$(plot -o /none/a.svg)"
 
 # A plug-in that exceeds the clock's limits: the clock refuses, and code and payload arrive. It also
 # inspects the buffer of the host's status: new, filled, grown, and asked to shrink.

@@ -15,12 +15,12 @@ void tGuardedClock::step(int64_t deltaNs)
     }
     if (guards.noStepAfterLock && wasLocked)
         throw std::runtime_error(fmt::format("a step by {} after the first lock", text(deltaNs)));
-    if (guards.dryRun) return;
+    if (dryRun) return;
     clock.step(deltaNs);
     sumNs += deltaNs;
 }
 
 void tGuardedClock::setOffsetPpb(int32_t offsetPpb)
 {
-    if (!guards.dryRun) clock.setOffsetPpb(offsetPpb);
+    if (!dryRun) clock.setOffsetPpb(offsetPpb);
 }

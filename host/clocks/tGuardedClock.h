@@ -7,7 +7,6 @@
 
 // What a clock that matters is protected from.
 struct tClockGuards {
-    bool dryRun = false;              // nothing reaches the clock
     std::optional<int64_t> maxStepNs; // either way
     bool noStepAfterLock = false;
 };
@@ -17,8 +16,10 @@ struct tClockGuards {
 class tGuardedClock : public iClock
 {
 public:
-    // The clock is borrowed.
-    tGuardedClock(iClock& guarded, const tClockGuards& options) : clock(guarded), guards(options) {}
+    // The clock is borrowed. In a dry run no order reaches it.
+    tGuardedClock(iClock& guarded, const tClockGuards& options, bool isDryRun)
+        : clock(guarded), guards(options), dryRun(isDryRun)
+    {}
 
     void setLocked(bool isLocked) { wasLocked = wasLocked || isLocked; }
 
@@ -35,6 +36,7 @@ public:
 private:
     iClock& clock;
     tClockGuards guards;
+    bool dryRun;
     bool wasLocked = false;
     int64_t sumNs = 0;
 };

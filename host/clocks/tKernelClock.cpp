@@ -70,7 +70,8 @@ timex tKernelClock::adjust(timex request, const char* deed)
 {
     if (clock_adjtime(id, &request) >= 0) return request;
     const int failure = errno;
-    throw std::system_error(failure, std::generic_category(),
-                            fmt::format("cannot {} {}{}", deed, name,
-                                        failure == EPERM ? ", which takes CAP_SYS_TIME" : ""));
+    throw std::system_error(
+        failure, std::generic_category(),
+        fmt::format("cannot {} {}{}", deed, name,
+                    failure == EPERM && id == CLOCK_REALTIME ? ", which takes CAP_SYS_TIME" : ""));
 }

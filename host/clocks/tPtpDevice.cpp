@@ -30,7 +30,8 @@ constexpr tCrossReading kNoReading = {0, 0, std::numeric_limits<uint64_t>::max()
 int openDevice(const std::string& path)
 {
     const int fd = open(path.c_str(), O_RDWR | O_CLOEXEC);
-    return fd < 0 && errno == EACCES ? open(path.c_str(), O_RDONLY | O_CLOEXEC) : fd;
+    const bool forbidden = fd < 0 && (errno == EACCES || errno == EPERM || errno == EROFS);
+    return forbidden ? open(path.c_str(), O_RDONLY | O_CLOEXEC) : fd;
 }
 
 } // namespace
@@ -56,7 +57,8 @@ tCrossReading tPtpDevice::crossRead()
 {
     for (;;) {
         if (const auto reading = read(latest)) return *reading;
-        if (latest == kBasic)
+        const bool unknown = errno == EOPNOTSUPP || errno == ENOTTY || errno == EINVAL;
+        if (latest == kBasic || !unknown)
             throw std::system_error(errno, std::generic_category(), "cannot read " + name);
         latest = static_cast<tMethod>(latest + 1);
     }

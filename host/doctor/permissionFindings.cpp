@@ -23,8 +23,8 @@ bool hasCapability(unsigned number)
 
 tFindings permissionFindings()
 {
-    if (hasCapability(CAP_SYS_TIME))
-        return {{tFinding::kGood, "permission", "CAP_SYS_TIME is there: clocks can be steered"}};
-    return {{tFinding::kLook, "permission",
-             "no CAP_SYS_TIME: the soft clock can be steered, no clock of the machine"}};
+    const bool allowed = hasCapability(CAP_SYS_TIME);
+    return {{allowed ? tFinding::kGood : tFinding::kLook, "permission",
+             allowed ? "CAP_SYS_TIME is there: CLOCK_REALTIME can be steered"
+                     : "no CAP_SYS_TIME: CLOCK_REALTIME cannot be steered"}};
 }

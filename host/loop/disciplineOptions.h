@@ -15,6 +15,7 @@ struct tDisciplineOptions {
     int64_t measureOverNs = 0;
     std::vector<tLaterDocument> later; // in the order of their times
     std::string csv;                   // "": none; "-": stdout
+    bool dryRun = false;               // no order reaches the clock
     tTuning tuning;
     std::string library;
 };

@@ -1,5 +1,7 @@
 #include "loop/tDiscipline.h"
 
+#include "clocks/tSteeredClock.h"
+
 namespace {
 
 // The servo's calls while it was made are noted before it is tuned.
@@ -13,9 +15,10 @@ tServoHost& tuned(tServoHost& host, tTrace& trace, tSummary& summary, const tTun
 
 } // namespace
 
-tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
+tDiscipline::tDiscipline(const tServoLibrary& plugIn, iClock& clock,
                          const tDisciplineOptions& given)
-    : options(given), trace(options.csv), report(options.csv == "-"), host(library, clock),
+    : library(plugIn), options(given), trace(options.csv, options.dryRun),
+      report(options.csv == "-"), host(library, clock),
       observer(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
       later(tuned(host, trace, summary, options.tuning), options.later)
 {}
@@ -35,7 +38,7 @@ void tDiscipline::take(const tPair& pair)
     summary.addCalls(host.calls());
     summary.addPair(pair, event, observer.locked());
     report.event(pair, event, host.calls());
-    report.note(pair.elapsedNs, later.observe(pair.elapsedNs, observer.locked()));
+    report.note(pair.elapsedNs, later.observe(host, pair.elapsedNs, observer.locked()));
     report.progress(pair, observer.locked());
 }
 
@@ -55,14 +58,20 @@ void tDiscipline::adjust(const tPair& pair)
 void tDiscipline::clearHistory()
 {
     host.clearHistory();
+    if (observer.locked()) summary.addLostLock();
     observer.restart();
     spacing.restart();
 }
 
 void tDiscipline::retune()
 {
-    tune(host, options.tuning);
-    later = tLaterDocuments(host, options.later);
+    tSteeredClock still(0, 0, 0);
+    tServoHost trial(library, still);
+    tune(trial, options.tuning);
+    tLaterDocuments anew(trial, options.later);
+    host.writeConfig(trial.readConfig()); // all keys: what is no longer in a document goes back
+    anew.takeOver(later);
+    later = anew;
 }
 
 void tDiscipline::finish()

@@ -29,7 +29,8 @@ public:
     // Lets the servo measure anew, as if it had just been made, with its tuning.
     void clearHistory();
 
-    // Reads all documents again. Throws std::runtime_error; what was applied until then stays.
+    // Reads all documents again, on a servo of its own first: if it throws std::runtime_error, all
+    // is as it was.
     void retune();
 
     void note(int64_t elapsedNs, const std::string& text) { report.note(elapsedNs, text); }
@@ -43,6 +44,7 @@ public:
 private:
     void adjust(const tPair& pair);
 
+    const tServoLibrary& library;
     const tDisciplineOptions& options;
     tTrace trace;
     tReport report;

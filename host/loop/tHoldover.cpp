@@ -26,7 +26,7 @@ void tHoldover::pair(const tPair& pair, bool locked, double orderedPpb)
 std::optional<double> tHoldover::errorNs(int64_t elapsedNs) const
 {
     const tRunningFigures& known = previous.count() > 0 ? previous : window;
-    if (known.count() == 0) return std::nullopt;
+    if (known.count() < kLeast) return std::nullopt;
     const double grownNs = known.deviationPpb() * static_cast<double>(lengthNs(elapsedNs)) * 1e-9;
     return std::hypot(known.rmsNs(), grownNs);
 }

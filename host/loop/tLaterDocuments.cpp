@@ -7,22 +7,21 @@
 // Every document is applied once before the first pair: a file that would be refused in the middle
 // of a run is refused at its start.
 tLaterDocuments::tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& options)
-    : host(&servo)
 {
     if (options.empty()) return;
-    firstTuning = host->readConfig();
+    firstTuning = servo.readConfig();
     for (const tLaterDocument& option : options)
-        documents.push_back({option, applyConfigFile(*host, option.file)});
-    host->writeConfig(firstTuning);
+        documents.push_back({option, applyConfigFile(servo, option.file)});
+    servo.writeConfig(firstTuning);
 }
 
-std::string tLaterDocuments::observe(int64_t elapsedNs, bool locked)
+std::string tLaterDocuments::observe(tServoHost& servo, int64_t elapsedNs, bool locked)
 {
     if (!locked) {
         lockedSinceNs.reset();
         if (applied == 0) return "";
         applied = 0;
-        host->writeConfig(firstTuning);
+        servo.writeConfig(firstTuning);
         return "tuned as at the start";
     }
     if (!lockedSinceNs) lockedSinceNs = elapsedNs;
@@ -30,6 +29,6 @@ std::string tLaterDocuments::observe(int64_t elapsedNs, bool locked)
         elapsedNs - *lockedSinceNs < documents[applied].option.afterNs)
         return "";
     const tDocument& next = documents[applied++];
-    host->writeConfig(next.text);
+    servo.writeConfig(next.text);
     return fmt::format("tuned by {}", next.option.file);
 }

@@ -18,19 +18,21 @@ struct tLaterDocument {
 class tLaterDocuments
 {
 public:
-    // In the order of their times. The servo is borrowed and has its first tuning. Throws
-    // std::runtime_error if a file cannot be read, or is refused.
-    tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& documents);
+    // In the order of their times. The servo has its first tuning, and has it again in the end.
+    // Throws std::runtime_error if a file cannot be read, or is refused.
+    tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& options);
 
-    // Returns what was done, for people; mostly "".
-    std::string observe(int64_t elapsedNs, bool locked);
+    // Returns what was done to the servo, for people; mostly "".
+    std::string observe(tServoHost& servo, int64_t elapsedNs, bool locked);
+
+    // Goes on where others were that these replace: what is due is applied.
+    void takeOver(const tLaterDocuments& others) { lockedSinceNs = others.lockedSinceNs; }
 
 private:
     struct tDocument {
         tLaterDocument option;
         std::string text;
     };
-    tServoHost* host;
     std::string firstTuning;
     std::vector<tDocument> documents;
     size_t applied = 0;

@@ -1,6 +1,5 @@
 #include "loop/tLiveRun.h"
 
-#include "clocks/tSteeredClock.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
@@ -9,8 +8,9 @@
 
 tLiveRun::tLiveRun(const tServoLibrary& plugIn, iClock& guarded, tSignals& watched,
                    const tLiveRunOptions& given)
-    : library(plugIn), signals(watched), options(given), clock(guarded, options.guards),
-      discipline(library, clock, options.discipline), sanity(options.sanityLimitPpb),
+    : signals(watched), options(given), clock(guarded, options.guards, options.discipline.dryRun),
+      discipline(plugIn, clock, options.discipline),
+      heldPpb(options.discipline.dryRun ? guarded.offsetPpb() : 0), sanity(options.sanityLimitPpb),
       holdover(options.silenceNs), monitor(options.monitor)
 {}
 
@@ -41,7 +41,7 @@ void tLiveRun::take(const tPair& pair)
     }
     discipline.take(pair);
     clock.setLocked(discipline.locked());
-    holdover.pair(pair, discipline.locked(), discipline.figures().orderedPpb());
+    holdover.pair(pair, discipline.locked(), inForcePpb());
     monitor.pair(pair, state(pair.elapsedNs), discipline.reporter());
 }
 
@@ -69,17 +69,12 @@ void tLiveRun::silence(int64_t elapsedNs)
                         durationText(static_cast<double>(holdover.lengthNs(elapsedNs))),
                         error ? durationText(*error) : "unknown"));
     }
-    monitor.silence(elapsedNs, state(elapsedNs));
+    monitor.silence(elapsedNs, state(elapsedNs), discipline.reporter());
 }
 
-// Tried on a servo of its own first, so that a document that is refused leaves all as it was.
 void tLiveRun::reload(int64_t elapsedNs)
 {
     try {
-        tSteeredClock still(0, 0, 0);
-        tServoHost trial(library, still);
-        tune(trial, options.discipline.tuning);
-        const tLaterDocuments later(trial, options.discipline.later);
         discipline.retune();
         discipline.note(elapsedNs, "documents read again");
     } catch (const std::runtime_error& failure) {
@@ -87,12 +82,17 @@ void tLiveRun::reload(int64_t elapsedNs)
     }
 }
 
+double tLiveRun::inForcePpb() const
+{
+    return options.discipline.dryRun ? heldPpb : discipline.figures().orderedPpb();
+}
+
 tRunMonitor::tState tLiveRun::state(int64_t elapsedNs) const
 {
     const tSummary& figures = discipline.figures();
     tRunMonitor::tState state;
     state.locked = discipline.locked();
-    state.orderedPpb = figures.orderedPpb();
+    state.inForcePpb = inForcePpb();
     state.pairs = figures.pairsTaken();
     state.locksLost = figures.lostLocks();
     state.steps = figures.steps();

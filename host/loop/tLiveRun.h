@@ -36,13 +36,14 @@ private:
     void endHoldover(const tPair& pair);
     void silence(int64_t elapsedNs);
     void reload(int64_t elapsedNs);
+    double inForcePpb() const;
     tRunMonitor::tState state(int64_t elapsedNs) const;
 
-    const tServoLibrary& library;
     tSignals& signals;
     const tLiveRunOptions& options;
     tGuardedClock clock;
     tDiscipline discipline;
+    double heldPpb; // in a dry run the offset stays what it is
     tSanityCheck sanity;
     tHoldover holdover;
     tRunMonitor monitor;

@@ -12,9 +12,10 @@
 //
 //     dravik-host[12.345]: offset        -23 s2 freq  +12345
 //     dravik-host[60.000]: rms   23 max   45 freq  +12345 +/-   12
+//     dravik-host[90.000]: holdover for 20 s, error about 34 ns
 //
 // The offset is clock minus reference in ns; s0 is not locked, s2 is locked; freq is, in ppb, what
-// the clock was found to be fast by, which is minus what it was ordered.
+// the clock was found to be fast by, which is minus what is in force.
 class tRunMonitor
 {
 public:
@@ -27,7 +28,7 @@ public:
 
     struct tState {
         bool locked = false;
-        double orderedPpb = 0;
+        double inForcePpb = 0;
         std::optional<double> holdoverErrorNs;
         int64_t holdoverNs = 0;
         int64_t pairs = 0;
@@ -36,16 +37,19 @@ public:
     };
 
     void pair(const tPair& pair, const tState& state, tReport& report);
-    void silence(int64_t elapsedNs, const tState& state);
+    void silence(int64_t elapsedNs, const tState& state, tReport& report);
 
 private:
     void printStatus(const tPair& pair, const tState& state, tReport& report);
-    void writeMetrics(int64_t elapsedNs, const tState& state);
+    void printSilence(int64_t elapsedNs, const tState& state, tReport& report);
+    void writeMetrics(int64_t elapsedNs, const tState& state, tReport& report);
+    std::vector<tMetric> figuresOf(const tState& state) const;
 
     tOptions options;
     tMetricsFile metrics;
     tRunningFigures figures; // since the last line
     std::optional<int64_t> lineNs;
     std::optional<int64_t> metricsNs;
+    bool metricsFail = false; // as was told
     double latestErrorNs = 0;
 };

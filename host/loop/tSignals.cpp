@@ -20,8 +20,9 @@ tSignals::tSignals() : previousInterrupt{}, previousTerminate{}, previousHangUp{
 {
     stopped = 0;
     reload = 0;
-    struct sigaction action = {}; // no SA_RESTART: the sleep is to end
+    struct sigaction action = {};
     action.sa_handler = noteSignal;
+    action.sa_flags = SA_RESTART; // of writes; nanosleep and poll end all the same
     sigaction(SIGINT, &action, &previousInterrupt);
     sigaction(SIGTERM, &action, &previousTerminate);
     sigaction(SIGHUP, &action, &previousHangUp);
@@ -38,7 +39,7 @@ bool tSignals::stopRaised() const { return stopped != 0; }
 
 bool tSignals::takeReload()
 {
-    const bool raised = reload != 0;
+    if (reload == 0) return false;
     reload = 0;
-    return raised;
+    return true;
 }

@@ -12,6 +12,7 @@
 class tSummary
 {
 public:
+    void addLostLock() { ++locksLost; } // by the host's own will
     void addCalls(const tHostCalls& calls);
     void addHeldBack(const tPair& pair);
     void addPair(const tPair& pair, tLockEvent event, bool locked);

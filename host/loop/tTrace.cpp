@@ -4,7 +4,7 @@
 
 #include <fmt/format.h>
 
-tTrace::tTrace(const std::string& path)
+tTrace::tTrace(const std::string& path, bool isDryRun) : dryRun(isDryRun)
 {
     if (path.empty()) return;
     if (path == "-") {
@@ -28,8 +28,10 @@ void tTrace::addCalls(int64_t elapsedNs, const tHostCalls& calls)
 {
     if (!file) return;
     for (const tHostCall& call : calls) {
-        file->write(fmt::format("call,{},,,,,{},{}\n", secondsText(elapsedNs, 9),
-                                kHostOperationNames[call.operation], call.value));
+        const bool held = dryRun && isOrder(call.operation);
+        file->write(fmt::format("{},{},,,,,{},{}\n", held ? "held" : "call",
+                                secondsText(elapsedNs, 9), kHostOperationNames[call.operation],
+                                call.value));
     }
 }
 

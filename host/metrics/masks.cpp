@@ -32,8 +32,8 @@ constexpr tMask kMasks[] = {
 constexpr double kCorner = 0.1;        // Hz
 constexpr double kLongestInterval = 1; // s; a filter of that corner needs some points in its time
 constexpr double kLongestTau = 1000;   // s
-constexpr double kSlopeFrom = 0.05;    // s; of the limit that grows with tau
-constexpr double kSlopeUpTo = 10;
+constexpr double kShortestTau = 0.05;
+constexpr double kSlopeUpTo = 10; // s; of the limit that grows with tau
 
 const tMask& maskOf(const std::string& name)
 {
@@ -87,6 +87,7 @@ std::optional<tWorst> worstOf(const tSeries& series, std::optional<double> tStab
     std::optional<tWorst> worst;
     for (const size_t n : octaves(series)) {
         const double tau = static_cast<double>(n) * series.interval;
+        if (tau < kShortestTau) continue;
         if (tau > longestTau) break;
         const auto found = stabilityAt(series, n).*figure;
         if (!found) continue;
@@ -175,16 +176,16 @@ std::vector<tMaskCurve> maskCurves(const std::string& name)
     const tMask& mask = maskOf(name);
     std::vector<tMaskCurve> curves;
     if (mask.lowPassedMtie > 0) {
-        curves.push_back({"MTIE", &tStability::mtie, true, kSlopeFrom, kLongestTau,
+        curves.push_back({"MTIE", &tStability::mtie, true, kShortestTau, kLongestTau,
                           mask.lowPassedMtie, mask.lowPassedMtie});
     }
     if (mask.lowPassedTdev > 0) {
-        curves.push_back({"TDEV", &tStability::tdev, true, kSlopeFrom, kLongestTau,
+        curves.push_back({"TDEV", &tStability::tdev, true, kShortestTau, kLongestTau,
                           mask.lowPassedTdev, mask.lowPassedTdev});
     }
     if (mask.tdevPerSecond > 0) {
-        curves.push_back({"TDEV", &tStability::tdev, false, kSlopeFrom, kSlopeUpTo,
-                          mask.tdevPerSecond * kSlopeFrom, mask.tdevPerSecond * kSlopeUpTo});
+        curves.push_back({"TDEV", &tStability::tdev, false, kShortestTau, kSlopeUpTo,
+                          mask.tdevPerSecond * kShortestTau, mask.tdevPerSecond * kSlopeUpTo});
     }
     return curves;
 }

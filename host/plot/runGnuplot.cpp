@@ -56,9 +56,10 @@ void runGnuplot(const std::string& script)
     int ends[2];
     if (pipe2(ends, O_CLOEXEC) != 0)
         throw std::system_error(errno, std::generic_category(), "cannot make a pipe");
-    const tFile output(fdopen(ends[0], "r"), std::fclose);
+    tFile output(fdopen(ends[0], "r"), std::fclose);
     tFile input(fdopen(ends[1], "w"), std::fclose);
     const tChild gnuplot(ends[0]);
+    output.reset(); // now it is gnuplot's alone, or the pipe would never break
     (void)std::signal(SIGPIPE, SIG_IGN);
     (void)std::fwrite(script.data(), 1, script.size(), input.get());
     input.reset();

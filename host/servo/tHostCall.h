@@ -23,6 +23,12 @@ constexpr std::array<const char*, 6> kHostOperationNames = {
     "getMinFrequencyOffset",
 };
 
+// Whether it changes the clock.
+constexpr bool isOrder(tHostOperation operation)
+{
+    return operation == kStepTime || operation == kSetFrequency;
+}
+
 struct tHostCall {
     tHostOperation operation;
     int64_t value; // given or returned, in the operation's unit: nanoseconds or ppb

@@ -43,6 +43,7 @@ std::unique_ptr<iReference> openReference(const std::string& name, int64_t inter
         return std::make_unique<tSocketReference>(*path);
     if (const auto path = afterPrefix(name, "phc:")) {
         const auto device = std::make_shared<tPtpDevice>(*path);
+        device->crossRead(); // one that cannot be read at all is told at once
         return std::make_unique<tClockReference>(intervalNs,
                                                  [device] { return device->crossRead(); });
     }

@@ -3,6 +3,8 @@
 #include "clocks/systemTime.h"
 #include "sources/nap.h"
 
+#include <system_error>
+
 // A machine that slept through several readings leaves them out instead of crowding them.
 std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
 {
@@ -13,6 +15,11 @@ std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
     const int64_t lateNs = rawNs() - *dueNs;
     if (lateNs < 0) return std::nullopt;
     *dueNs += intervalNs * (1 + (lateNs + intervalNs / 2) / intervalNs);
-    const tCrossReading reading = reader();
-    return tReferenceSample{reading.systemNs, reading.clockNs, false};
+    try {
+        const tCrossReading reading = reader();
+        return tReferenceSample{reading.systemNs, reading.clockNs, false};
+    } catch (const std::system_error&) {
+        ++failures;
+        return std::nullopt;
+    }
 }

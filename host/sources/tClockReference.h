@@ -14,10 +14,13 @@ public:
         : intervalNs(paceNs), reader(std::move(crossReader))
     {}
 
+    // A reading that fails is a reference that is silent.
     std::optional<tReferenceSample> next(int64_t atMostNs) override;
+    int64_t unusable() const override { return failures; }
 
 private:
     int64_t intervalNs;
     std::function<tCrossReading()> reader;
     std::optional<int64_t> dueNs; // by CLOCK_MONOTONIC_RAW
+    int64_t failures = 0;
 };

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 
 tLiveSource::tLiveSource(iLiveClock& liveClock, iReference& liveReference, const tSignals& watched,
                          const tOptions& given)
@@ -18,21 +19,24 @@ tLiveSource::tLiveSource(iLiveClock& liveClock, iReference& liveReference, const
 std::optional<tLiveMoment> tLiveSource::next()
 {
     constexpr int64_t kNapNs = 100'000'000;
-    if (!ordered) ordered = clock.crossRead();
+    if (!ordered) ordered = crossRead();
     const int64_t leftNs = options.durationNs ? *options.durationNs - elapsedNs() : kNapNs;
     const auto sample = reference.next(std::clamp<int64_t>(leftNs, 0, kNapNs));
     if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
         return std::nullopt;
     if (!sample) return tLiveMoment{elapsedNs(), {}};
-    const tCrossReading now = clock.crossRead();
-    if (sample->systemNs < ordered->systemNs || sample->systemNs > now.systemNs) {
-        ++outOfDate;
-        if (now.systemNs < ordered->systemNs) ordered = now; // the machine's clock was set back
-        return tLiveMoment{elapsedNs(), {}};
+    const tMoment now = crossRead();
+    const bool even = ranEvenly(now);
+    const bool upToDate =
+        sample->systemNs >= ordered->reading.systemNs && sample->systemNs <= now.reading.systemNs;
+    if (even && upToDate) {
+        const tPair pair = pairAt(*sample, now);
+        ordered.reset();
+        return tLiveMoment{pair.elapsedNs, pair};
     }
-    const tPair pair = pairAt(*sample, now);
-    ordered.reset();
-    return tLiveMoment{pair.elapsedNs, pair};
+    ++outOfDate;
+    if (!even) ordered = now;
+    return tLiveMoment{now.elapsedNs, {}};
 }
 
 std::string tLiveSource::remarks() const
@@ -47,17 +51,35 @@ int64_t tLiveSource::elapsedNs() const
     return static_cast<int64_t>(systemTimeNs(CLOCK_MONOTONIC_RAW) - startRawNs);
 }
 
+tLiveSource::tMoment tLiveSource::crossRead()
+{
+    const tCrossReading reading = clock.crossRead();
+    return {elapsedNs(), reading};
+}
+
+// Whether the machine's clock was left alone by others, who may step it.
+bool tLiveSource::ranEvenly(const tMoment& now) const
+{
+    constexpr int64_t kReadingNs = 1'000'000;
+    constexpr int64_t kFastest = 1000; // 1000 ppm
+    const int64_t rawNs = now.elapsedNs - ordered->elapsedNs;
+    const auto systemNs = static_cast<int64_t>(now.reading.systemNs - ordered->reading.systemNs);
+    return std::llabs(systemNs - rawNs) <= kReadingNs + rawNs / kFastest;
+}
+
 // The clock has run evenly since it was last ordered anything.
-tPair tLiveSource::pairAt(const tReferenceSample& sample, const tCrossReading& now) const
+tPair tLiveSource::pairAt(const tReferenceSample& sample, const tMoment& now) const
 {
     constexpr double kSecondNs = 1e9;
-    const auto agoNs = static_cast<double>(now.systemNs - sample.systemNs);
-    const auto systemNs = static_cast<double>(now.systemNs - ordered->systemNs);
-    const auto clockNs = static_cast<double>(static_cast<int64_t>(now.clockNs - ordered->clockNs));
+    const tCrossReading& from = ordered->reading;
+    const tCrossReading& to = now.reading;
+    const auto agoNs = static_cast<double>(to.systemNs - sample.systemNs);
+    const auto systemNs = static_cast<double>(to.systemNs - from.systemNs);
+    const auto clockNs = static_cast<double>(static_cast<int64_t>(to.clockNs - from.clockNs));
     const double rate = systemNs > 0 ? clockNs / systemNs : 1;
     tPair pair{};
-    pair.elapsedNs = std::max<int64_t>(elapsedNs() - std::llround(agoNs), 0);
-    pair.clockNs = now.clockNs - static_cast<uint64_t>(std::llround(agoNs * rate));
+    pair.elapsedNs = std::max<int64_t>(now.elapsedNs - std::llround(agoNs), 0);
+    pair.clockNs = to.clockNs - static_cast<uint64_t>(std::llround(agoNs * rate));
     pair.referenceNs = sample.referenceNs + static_cast<uint64_t>(options.referenceOffsetNs);
     if (!sample.pulse) return pair;
     const double seconds = std::round(static_cast<double>(pair.errorNs()) / kSecondNs);

@@ -23,14 +23,21 @@ public:
     std::string remarks() const override;
 
 private:
+    struct tMoment {
+        int64_t elapsedNs;
+        tCrossReading reading;
+    };
+
     int64_t elapsedNs() const;
-    tPair pairAt(const tReferenceSample& sample, const tCrossReading& now) const;
+    tMoment crossRead();
+    bool ranEvenly(const tMoment& now) const;
+    tPair pairAt(const tReferenceSample& sample, const tMoment& now) const;
 
     iLiveClock& clock;
     iReference& reference;
     const tSignals& signals;
     tOptions options;
     uint64_t startRawNs;
-    std::optional<tCrossReading> ordered; // the clock since it was last ordered anything
-    int64_t outOfDate = 0;                // samples
+    std::optional<tMoment> ordered; // since when the clock has not been ordered anything
+    int64_t outOfDate = 0;          // samples
 };

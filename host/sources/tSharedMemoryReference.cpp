@@ -94,15 +94,17 @@ constexpr key_t kKey = 0x4e545030; // of unit 0
                                         deed, unit, kKey + unit));
 }
 
-// One that is there already has the size that its maker gave it.
+// One that is there already has the size that its maker gave it. By custom the first two units are
+// for producers of the same user only.
 int openSegment(int unit)
 {
-    constexpr int kOwnerOnly = 0600;
+    constexpr int kFirstOfAll = 2;
+    const int mode = unit < kFirstOfAll ? 0600 : 0666;
     const int there = shmget(kKey + unit, 0, 0);
     if (there >= 0) return there;
     if (errno != ENOENT) fail(errno, unit, "open");
     const size_t size = sizeof(time_t) > 4 ? kWide.size : kNarrow.size;
-    const int made = shmget(kKey + unit, size, IPC_CREAT | kOwnerOnly);
+    const int made = shmget(kKey + unit, size, IPC_CREAT | mode);
     if (made < 0) fail(errno, unit, "make");
     return made;
 }

@@ -8,6 +8,7 @@
 #include <poll.h>
 #include <stdexcept>
 #include <sys/socket.h>
+#include <sys/stat.h>
 #include <sys/un.h>
 #include <system_error>
 
@@ -36,7 +37,8 @@ std::optional<tReferenceSample> decode(const unsigned char* datagram, size_t siz
 {
     constexpr int32_t kMagic = 0x534f434b;
     constexpr int32_t kNotSynchronised = 3;
-    constexpr uint64_t kLastSecond = 18'000'000'000;
+    constexpr uint64_t kLastSecond = 18'000'000'000; // of what 64 bits of nanoseconds can tell
+    constexpr double kLargestOffset = 9e9;
     if (size != kNarrowSize && size != kWideSize) return std::nullopt;
     const bool wide = size == kWideSize;
     const uint64_t seconds = wide ? partAt<uint64_t>(datagram) : partAt<uint32_t>(datagram);
@@ -44,7 +46,7 @@ std::optional<tReferenceSample> decode(const unsigned char* datagram, size_t siz
         wide ? partAt<uint64_t>(datagram + 8) : partAt<uint32_t>(datagram + 4);
     const auto rest = partAt<tRest>(datagram + size - sizeof(tRest));
     const bool plausible = seconds <= kLastSecond && microseconds < 1'000'000 &&
-                           std::fabs(rest.offset) <= static_cast<double>(seconds);
+                           std::fabs(rest.offset) <= kLargestOffset;
     if (!plausible || rest.magic != kMagic || rest.leap == kNotSynchronised) return std::nullopt;
     const uint64_t systemNs = seconds * 1'000'000'000 + microseconds * 1000;
     const auto offsetNs = static_cast<uint64_t>(std::llround(rest.offset * 1e9));
@@ -67,9 +69,12 @@ sockaddr_un addressOf(const std::string& path)
 
 int openSocket() { return socket(AF_UNIX, SOCK_DGRAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0); }
 
-// Whether a name that is taken is only what a program left that did not end well.
+// Whether a name that is taken is only the socket of a program that did not end well.
 bool isAbandoned(const sockaddr_un& address)
 {
+    struct stat there {
+    };
+    if (lstat(address.sun_path, &there) != 0 || !S_ISSOCK(there.st_mode)) return false;
     const tDescriptor probe(openSocket());
     const auto* const general = reinterpret_cast<const sockaddr*>(&address);
     return connect(probe.get(), general, sizeof address) != 0 && errno == ECONNREFUSED;

@@ -40,7 +40,7 @@ std::string tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
     }
     const tFields fields = split(line);
     if (fields[kKind].empty() || fields[kKind] == "pair") return readPair(fields, builder);
-    if (fields[kKind] == "call") return readCall(fields, builder);
+    if (fields[kKind] == "call" || fields[kKind] == "held") return readCall(fields, builder);
     return fmt::format("a row of the unknown kind '{}'", fields[kKind]);
 }
 
@@ -90,6 +90,8 @@ std::string tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& build
     const auto value = numberIn<int64_t>(fields[kValue]);
     if (operation == kHostOperationNames.end() || !value) return "no call that is known";
     hasCalls = true;
+    calls.push_back({static_cast<tHostOperation>(operation - kHostOperationNames.begin()), *value});
+    if (fields[kKind] == "held") return "";
     const auto ppb = static_cast<double>(*value);
     switch (static_cast<tHostOperation>(operation - kHostOperationNames.begin())) {
     case kGetMaxFrequencyOffset:
@@ -111,7 +113,6 @@ std::string tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& build
     case kGetTime:
         break;
     }
-    calls.push_back({static_cast<tHostOperation>(operation - kHostOperationNames.begin()), *value});
     return "";
 }
 

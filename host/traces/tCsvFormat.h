@@ -9,7 +9,7 @@
 // CSV with a header that names at least reference_ns and clock_ns, in any order. Also read are
 // elapsed_s, true_error_ns, frequency_ppb (in force from this pair on), step_ns (by which the clock
 // was stepped after it), and what this program writes: kind, call and value, the calls of each pair
-// in rows of their own.
+// in rows of their own, and orders of a dry run, which did not reach the clock.
 class tCsvFormat : public iTraceFormat
 {
 public:

@@ -20,6 +20,8 @@ void plot(const tOptions& options)
 {
     const std::string script = plotScript(readTrace(options.trace), options.plot);
     if (options.script.empty()) {
+        const tOutputFile writable(
+            options.plot.picture); // or gnuplot would take the standard output
         runGnuplot(script);
         return;
     }

@@ -7,6 +7,7 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <memory>
 
 namespace {
@@ -27,6 +28,17 @@ std::string scenarioText(const tOptions& options, const tServoLibrary& library)
                        library.path);
 }
 
+// What is read on demand is silent only when readings fail.
+tLiveRunOptions patient(const tOptions& options)
+{
+    tLiveRunOptions patient = static_cast<const tLiveRunOptions&>(options);
+    if (!isReadOnDemand(options.reference)) return patient;
+    constexpr int64_t kReadings = 3;
+    patient.silenceNs = std::max(options.silenceNs, kReadings * options.intervalNs);
+    patient.longHoldoverNs = std::max(options.longHoldoverNs, patient.silenceNs);
+    return patient;
+}
+
 void run(const tOptions& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.discipline.library));
@@ -36,7 +48,8 @@ void run(const tOptions& options)
                    options.initialError.offsetNs, options.initialError.frequencyPpb});
     const auto reference = openReference(options.reference, options.intervalNs);
     tLiveSource source(*clock, *reference, signals, options.source);
-    tLiveRun(library, *clock, signals, options).run(scenarioText(options, library), source);
+    const tLiveRunOptions live = patient(options);
+    tLiveRun(library, *clock, signals, live).run(scenarioText(options, library), source);
 }
 
 void addReferenceOptions(CLI::App& app, tOptions& options)
@@ -83,7 +96,7 @@ void requireConsistency(const CLI::App& app, const tOptions& options)
 
 void addGuardOptions(CLI::App& app, tOptions& options)
 {
-    app.add_flag("--dry-run", options.guards.dryRun,
+    app.add_flag("--dry-run", options.discipline.dryRun,
                  "Order nothing: look at what would be ordered");
     addQuantity(app, options.guards.maxStepNs,
                 {"--max-step", kDuration, "", "0ns", "438300h", "End rather than step by more"});
@@ -98,7 +111,7 @@ void addSilenceOptions(CLI::App& app, tOptions& options)
 {
     addQuantity(app, options.silenceNs,
                 {"--holdover-after", kDuration, "10s", "1ms", "24h",
-                 "Silence of the reference that is a holdover"});
+                 "Silence of the reference that is a holdover,\nand three intervals at least"});
     addQuantity(app, options.longHoldoverNs,
                 {"--remeasure-after", kDuration, "1h", "1ms", "438300h",
                  "Holdover after which to measure anew"});
@@ -111,7 +124,10 @@ void addMonitorOptions(CLI::App& app, tRunMonitor::tOptions& monitor)
         {"--status", kDuration, "", "0ns", "24h", "A line each time; 0 is one for each pair"});
     app.add_option("--metrics", monitor.metricsFile,
                    "Figures for a monitoring agent, replaced as a\nwhole once a second")
-        ->type_name("FILE");
+        ->type_name("FILE")
+        ->check([](const std::string& file) {
+            return file == "-" ? "the figures are replaced as a whole, which takes a file" : "";
+        });
 }
 
 } // namespace
