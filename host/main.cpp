@@ -1,6 +1,6 @@
 // dravik-host: loads the clock servo plug-in as any other host would, and lets it discipline a
-// clock. simulate and run choose a clock and a source of pairs, and share the loop; check and show
-// work on the configuration.
+// clock. Each word of the command line is a file in verbs/. simulate, replay and run choose a clock
+// and a source of pairs, and share the loop; the others work on documents, traces and the machine.
 
 #include "text/tLimitBroken.h"
 #include "verbs/check.h"

@@ -15,6 +15,15 @@ namespace {
 
 using tFile = std::unique_ptr<std::FILE, decltype(&std::fclose)>;
 
+// The status of a child that became no other program, where its start told nothing else.
+constexpr int kNotStarted = 127;
+
+[[noreturn]] void failToStart(int failure)
+{
+    throw std::runtime_error("cannot start gnuplot: " + std::generic_category().message(failure) +
+                             "; --script writes what it would be given");
+}
+
 class tChild
 {
 public:
@@ -28,11 +37,7 @@ public:
         char* const arguments[] = {name, nullptr};
         const int failure = posix_spawnp(&pid, name, &actions, nullptr, arguments, environ);
         posix_spawn_file_actions_destroy(&actions);
-        if (failure != 0) {
-            throw std::runtime_error(
-                "cannot start gnuplot: " + std::generic_category().message(failure) +
-                "; --script writes what it would be given");
-        }
+        if (failure != 0) failToStart(failure);
     }
 
     void requireSuccess() const
@@ -40,6 +45,7 @@ public:
         int status = 0;
         while (waitpid(pid, &status, 0) < 0 && errno == EINTR) {
         }
+        if (WIFEXITED(status) && WEXITSTATUS(status) == kNotStarted) failToStart(ENOENT);
         if (!WIFEXITED(status) || WEXITSTATUS(status) != 0)
             throw std::runtime_error("gnuplot did not draw it; what is wrong stands above");
     }
