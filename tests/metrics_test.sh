@@ -21,7 +21,8 @@ while read -r figure value error; do
     metrics numbers --interval 1s --frequency $slope > out 2>&1 \
         --assert "$figure>$(awk "BEGIN { printf \"%.9g\", $value - $error }")$unit" \
         --assert "$figure<$(awk "BEGIN { printf \"%.9g\", $value + $error }")$unit"
-    expect "$figure is $value: $(tail -n 1 out)" 0 $?
+    status=$?
+    expect "$figure is $value: $(tail -n 1 out)" 0 $status
 done << 'END'
 adev(1s) 2.922319e-01 1e-7
 oadev(1s) 2.922319e-01 1e-7
@@ -79,7 +80,11 @@ limits held       |0|peak|trace.csv --assert rms<29ns --assert rms>28ns --assert
 a limit broken    |3|^dravik-host: peak<40ns does not hold: it is 40 ns$|trace.csv --assert peak<40ns
 two broken        |3|^dravik-host: rms<1ns .*; locks-lost>0 does not hold: it is 0$|trace.csv --assert rms<1ns --assert locks-lost>0
 not to be told    |3|adev\(1000s\)<1 cannot be told from these data|trace.csv --assert adev(1000s)<1
+beyond all tau    |3|mtie\(4294967306s\)<1us cannot be told|trace.csv --assert mtie(4294967306s)<1us
 between intervals |3|tdev\(1500ms\)<1s cannot be told|trace.csv --assert tdev(1500ms)<1s
+without its slope |0|^longest stretch without a gap: 59 points$|trace.csv --remove-slope
+no slope          |1|^dravik-host: one measurement has no slope$|trace.csv --from 20s --to 20s --remove-slope
+nothing in time   |3|^dravik-host: limits of masks not checked: 1$|trace.csv --from 20s --to 20s --mask g8273.2-d
 nothing selected  |1|^dravik-host: trace.csv has no measurement in that time$|trace.csv --from 1h
 no unit           |2|'20' has no unit|trace.csv --assert rms<20
 no figure         |2|'rmse' is none of rms, peak, |trace.csv --assert rmse<1ns
@@ -99,8 +104,10 @@ END
 for ((i = 0; i < 1200; ++i)); do echo 8e-9; done > constant
 check "low pass" 3 '^mask g8273.2-d +max .TEL. 5 ns +broken +8 ns$' constant --interval 1s --mask g8273.2-d
 check "constant" 0 '^mask g8273.2-c +constant TE 10 ns +held +8 ns$' constant --interval 1s --mask g8273.2-c
+awk 'BEGIN { for (i = 0; i <= 1200; ++i) print i * 4.6e-11 }' > ramp
+check "to the end of the mask" 3 '^mask g8273.2-a +dTEL MTIE up to 1000 s 40 ns +broken +46 ns at 1000 s$' ramp --interval 1s --mask g8273.2-a
 for ((i = 0; i < 600; ++i)); do printf '2e-8\n-2e-8\n'; done > alternating
-check "too slow a filter" 0 '^mask g8273.2-d +max .TEL. 5 ns +not checked +pairs too far apart' \
+check "too slow a filter" 3 '^mask g8273.2-d +max .TEL. 5 ns +not checked +pairs too far apart' \
     alternating --interval 2s --mask g8273.2-d
 sed -n '1!p' alternating | sed '1i 0' > centred
 check "alternating" 0 '^mask g8273.2-d +max .TEL. 5 ns +held +[0-4]\.' centred --interval 100ms --mask g8273.2-d

@@ -39,6 +39,10 @@ expect "several clocks" "dravik-host: the standard input has several sources, ch
     "$( (daemon ptp4l 'master ' ''; daemon phc2sys 'CLOCK_REALTIME phc ' '') | messages | tail -n 1)"
 expect "one of several" "$wanted" \
     "$( (daemon phc2sys 'eth1 sys ' ''; daemon phc2sys 'CLOCK_REALTIME phc ' '') | pairs --source REALTIME)"
+expect "the one of that very name" "$wanted" \
+    "$( (daemon ts2phc '/dev/ptp10 master ' ''; daemon ts2phc '/dev/ptp1 master ' '') | pairs --source 'ts2phc /dev/ptp1')"
+expect "a host of another's name" "$wanted" \
+    "$(daemon phc2sys 'eth0 sys ' '' | sed -E 's/^phc2sys(.*\]):/Nov 23 08:35:26 ptp4l-gw phc2sys[812]: \1/' | pairs --source phc2sys)"
 expect "none of them" "dravik-host: the standard input has no source 'eth2', but 'ptp4l'" \
     "$(daemon ptp4l 'master ' '' | messages --source eth2 | tail -n 1)"
 
@@ -58,6 +62,8 @@ expect "its corrections" "dravik-host: the standard input does not tell what fre
     "$(refclocks | messages --re-discipline | sed -n 's/; if it had.*//p')"
 expect "a clock that had none" "0.000000000 -23
 1.500000000 -15" "$(refclocks | pairs --re-discipline --free-running | cut -d, -f1,4 | tr , ' ')"
+expect "no number where one may be" "dravik-host: the standard input: 3 lines are not used, lines 2 (no number in true_error_ns, step_ns or frequency_ppb), 3 (no number in true_error_ns, step_ns or frequency_ppb), 4 (no number in true_error_ns, step_ns or frequency_ppb)" \
+    "$(printf 'reference_ns,clock_ns,step_ns,true_error_ns,frequency_ppb\n1,1,1.0,,\n2,2,,n/a,\n3,3,,,nan\n4,4,,,\n' | messages)"
 expect "columns in any order" "$wanted" "$(pairs << 'END'
 comment,clock_ns,reference_ns
 a,1700003531419999977,1700003531420000000

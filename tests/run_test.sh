@@ -36,6 +36,7 @@ no such metrics     |1|^dravik-host: cannot write none/m.new: No such file|--met
 END
 "${run[@]}" --duration 400ms --status 0 --metrics figures > out
 expect "its lines are a trace" "$(grep -c offset out)" "$("${host[@]}" replay out 2> err | sed -nE 's/^pairs +([0-9]+) .*/\1/p')"
+expect "the step among them" "1 0" "$(grep -c ' s1 ' out) $("${host[@]}" replay out --re-discipline --config calm.json 2> err | grep -c missed)"
 expect "figures" "8 8 8" "$(grep -c '^# HELP' figures) $(grep -c '^# TYPE' figures) $(grep -cE '^dravik_[a-z_]+ -?[0-9.e-]+$' figures)"
 
 # A reference that is read seldom is not silent in between.

@@ -44,6 +44,11 @@ expect "all keys are taken" 11 "$("${host[@]}" check tuned.json | grep -c '":')"
 "${host[@]}" tune --noise 50ns --wander 1ppb --interval 1s > other.json 2> report
 expect "to the standard output" "" "$(cmp tuned.json other.json; diff <(sed s/DOCUMENT/tuned.json/ report) out)"
 
+if [ -z "${EMULATOR:-}" ]; then
+    "${host[@]}" tune --noise 50ns --wander 1ppb --interval 1ms -o fast.json > out
+    expect "quick gains beyond all documents" "0 11" "$? $(grep -c '":' fast.json)"
+fi
+
 # Acquired quickly and held quietly, by the very options that the report names.
 "${host[@]}" tune --noise 10us --wander 1ppb --interval 1s -o quiet.json --quick quick.json > out
 # shellcheck disable=SC2046  # split on purpose
@@ -57,7 +62,8 @@ while read -r controller wanted; do
     expect "from $controller" "$wanted" "$(key phaseLockGain pi.json) $(key phaseLockCoefficientA pi.json) $(
         key phaseLockCoefficientB pi.json) $(key phaseLockCoefficientC pi.json)"
 done << 'END'
-0.7,0.3 0.7 1.42857 1 1
+0.7,0.3 0.7 1.42857142857 1 1
+0.1,1e-7 0.1 1.000001 1 1
 0.01,0.99 0.1 10 0.1 1
 20,5 10 2.5 2 1
 END
@@ -73,6 +79,8 @@ done << 'END'
 2|A trace, or --noise, --wander and --interval, or --from-pi is required|--noise 1ns
 2|--from-pi: '1,-1' is not KP,KI|--from-pi 1,-1
 2|--from-pi: '1,1,1' is not KP,KI|--from-pi 1,1,1
+2|--quick: several documents take files|--noise 1ns --wander 1ppb --interval 1s --quick -
+2|--from-pi: a trace has no say in it|trace.csv --from-pi 1,1
 1|no document can have kp 60 and ki 50 per second|--from-pi 60,50
 1|cannot read none|none
 END

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
 
 namespace {
 
@@ -38,11 +39,16 @@ void setFilter(tServoParameters& parameters, const tNoiseModel& model, double li
 }
 
 // Place is the logarithms of kp and ki, and the limit of the filter.
+tLoopGains gainsAt(const std::vector<double>& place)
+{
+    return {std::exp(place[0]), std::exp(place[1])};
+}
+
 tServoParameters parametersAt(const std::vector<double>& place, const tNoiseModel& model)
 {
     tServoParameters parameters;
     parameters.snapTimeThreshold = snapThresholdFor(model);
-    tLoopGains{std::exp(place[0]), std::exp(place[1])}.putInto(parameters);
+    gainsAt(place).putInto(parameters);
     setFilter(parameters, model, place[2]);
     return parameters;
 }
@@ -55,6 +61,7 @@ tServoParameters refined(const tServoLibrary& library, const tNoiseModel& model,
     const tTrialOptions trial = trialFor(gains, model);
     const auto cost = [&](const std::vector<double>& at) {
         constexpr double kWeightOfTail = 0.3; // of normal errors the tail is 1.8 times the RMS
+        if (!gainsAt(at).fit()) return std::numeric_limits<double>::infinity();
         const auto document = parametersAt(at, seen).documentText();
         const tTrialResult result = runTrial(library, document, model, trial);
         return result.rmsNs + kWeightOfTail * result.tailNs;
@@ -79,15 +86,19 @@ void addQuick(tDesign& design, const tNoiseModel& model)
 {
     constexpr double kQuickEnough = 12;
     constexpr double kMostMeasured = 10;
+    constexpr double kDayNs = 86400e9; // the longest that --measure-over takes
     constexpr double kStep = 3;
     const double quietPairs = 4 / (tLoopGains::of(design.quiet).kp * model.interval());
     if (quietPairs < kQuickEnough) return;
-    const double measured = std::clamp(std::round(quietPairs / 8), 1.0, kMostMeasured);
+    const double mostMeasured =
+        std::clamp(kDayNs / static_cast<double>(model.intervalNs), 1.0, kMostMeasured);
+    const double measured = std::clamp(std::round(quietPairs / 8), 1.0, std::floor(mostMeasured));
     design.measureOverNs = static_cast<int64_t>(measured) * model.intervalNs;
     const double steps = std::round(std::log(quietPairs / measured) / std::log(kStep));
     for (int step = static_cast<int>(steps) - 1; step >= 1; --step) {
         const double pairs = quietPairs / std::pow(kStep, step);
         const tLoopGains gains = growingKalman(pairs, model.interval());
+        if (!gains.fit()) continue; // one step less
         tQuickDocument quick;
         quick.parameters = design.quiet;
         gains.putInto(quick.parameters);

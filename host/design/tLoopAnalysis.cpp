@@ -63,6 +63,7 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     : stable(false), stableBelow(0)
 {
     constexpr double kSettled = 0.01;
+    constexpr double kLeastPairs = 2; // of a loop with both poles at 0
     constexpr double kMostPairs = 1e6;
     const double g = parameters.phaseLockGain;
     const double a = parameters.phaseLockCoefficientA;
@@ -78,7 +79,7 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     const tPoles poles = polesOf(sum, product);
     damping = dampingOf(poles);
     const double radius = std::max(std::abs(poles.one), std::abs(poles.other));
-    const double pairs = std::min(std::log(kSettled) / std::log(radius), kMostPairs);
+    const double pairs = std::clamp(std::log(kSettled) / std::log(radius), kLeastPairs, kMostPairs);
     settling = pairs * interval;
     tLoop step(parameters, interval, 1);
     tLoop impulse(parameters, interval, 0);

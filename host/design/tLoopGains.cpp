@@ -5,15 +5,22 @@
 #include <algorithm>
 #include <stdexcept>
 
+namespace {
+
+constexpr double kLargest = 10; // gain and coefficients alike
+constexpr double kLeastGain = 1e-9;
+
+} // namespace
+
+bool tLoopGains::fit() const { return kp + ki <= kLargest * kLargest; }
+
 // With B = 1 the gain is kp, and A - 1 is ki / kp. The bound of A, or that of the gain, may need
 // another B.
 void tLoopGains::putInto(tServoParameters& parameters) const
 {
-    constexpr double kLargest = 10; // gain and coefficients alike
-    constexpr double kLeastGain = 1e-9;
     const double sum = kp + ki;
     const double gain = std::clamp(std::max(kp, sum / kLargest), kLeastGain, kLargest);
-    if (!(sum <= kLargest * gain)) {
+    if (!fit()) {
         throw std::runtime_error(
             fmt::format("no document can have kp {:.4g} and ki {:.4g} per second", kp, ki));
     }

@@ -11,6 +11,7 @@ struct tLoopGains {
     // Sets the law's gain and coefficients. Throws std::runtime_error if their bounds are too
     // tight.
     void putInto(tServoParameters& parameters) const;
+    bool fit() const; // whether a document can have them
 
     // Of a law whose coefficient C is 1.
     static tLoopGains of(const tServoParameters& parameters);

@@ -39,10 +39,13 @@ void tLiveRun::take(const tPair& pair)
         discipline.note(pair.elapsedNs, wrong + ": measuring anew");
         discipline.clearHistory();
     }
+    const int64_t steppedNs = clock.steppedNs();
     discipline.take(pair);
     clock.setLocked(discipline.locked());
     holdover.pair(pair, discipline.locked(), inForcePpb());
-    monitor.pair(pair, state(pair.elapsedNs), discipline.reporter());
+    tRunMonitor::tState now = state(pair.elapsedNs);
+    now.stepped = clock.steppedNs() != steppedNs;
+    monitor.pair(pair, now, discipline.reporter());
 }
 
 // What was measured before a long silence says nothing of the clock after it.

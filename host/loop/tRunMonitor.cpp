@@ -26,7 +26,10 @@ void tRunMonitor::printStatus(const tPair& pair, const tState& state, tReport& r
     const std::string head = fmt::format("dravik-host[{}]:", secondsText(pair.elapsedNs, 3));
     if (*options.statusIntervalNs == 0) {
         report.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}\n", head, pair.errorNs(),
-                                 state.locked ? 2 : 0, 0 - state.inForcePpb));
+                                 state.locked    ? 2
+                                 : state.stepped ? 1
+                                                 : 0,
+                                 0 - state.inForcePpb));
         return;
     }
     figures.add(pair, state.inForcePpb);

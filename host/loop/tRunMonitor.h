@@ -14,7 +14,8 @@
 //     dravik-host[60.000]: rms   23 max   45 freq  +12345 +/-   12
 //     dravik-host[90.000]: holdover for 20 s, error about 34 ns
 //
-// The offset is clock minus reference in ns; s0 is not locked, s2 is locked; freq is, in ppb, what
+// The offset is clock minus reference in ns; s0 is not locked, s1 is stepped
+// onto the reference, s2 is locked; freq is, in ppb, what
 // the clock was found to be fast by, which is minus what is in force.
 class tRunMonitor
 {
@@ -28,6 +29,7 @@ public:
 
     struct tState {
         bool locked = false;
+        bool stepped = false; // after this pair
         double inForcePpb = 0;
         std::optional<double> holdoverErrorNs;
         int64_t holdoverNs = 0;

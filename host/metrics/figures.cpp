@@ -68,13 +68,16 @@ tFigure parseFigure(const std::string& text)
 
 std::optional<double> valueOf(const tFigure& figure, const tMeasured& measured)
 {
-    constexpr double kInexact = 1e-3; // of an interval
+    constexpr double kInexact = 1e-3;     // of tau, as moments may be rounded; less than ...
+    constexpr double kMostInexact = 0.25; // ... of an interval
     const tPlain* const plain = find(kPlain, figure.name);
     if (plain != nullptr) return plain->value(measured);
     const tOverTau* const overTau = find(kOverTau, figure.name);
     if (overTau == nullptr || measured.series.phase.size() < 2) return std::nullopt;
     const double n = figure.tau / measured.series.interval;
-    if (std::round(n) < 1 || n > 1e15 || std::fabs(n - std::round(n)) > kInexact)
+    const auto points = static_cast<double>(measured.series.phase.size());
+    const double tolerance = std::min(kInexact * std::max(n, 1.0), kMostInexact);
+    if (std::round(n) < 1 || n >= points || std::fabs(n - std::round(n)) > tolerance)
         return std::nullopt;
     return stabilityAt(measured.series, static_cast<size_t>(std::llround(n))).*overTau->value;
 }

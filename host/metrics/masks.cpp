@@ -61,11 +61,23 @@ double peakToPeakNs(const std::vector<double>& errors)
     return (*extremes.second - *extremes.first) * 1e9;
 }
 
+// Octaves, and the longest tau up to the mask's end that a figure may be told for.
+std::vector<size_t> averagingsUpTo(const tSeries& series, double longestTau)
+{
+    std::vector<size_t> list = octaves(series);
+    const size_t points = series.phase.size();
+    const auto last = static_cast<size_t>(std::min(longestTau / series.interval, 1e9) + 1e-6);
+    for (const size_t n : {points / 3, points - 1})
+        list.push_back(std::min(n, last));
+    return list;
+}
+
 // The largest mean over so many seconds; nothing if the series is shorter.
 std::optional<double> largestMeanNs(const tSeries& series, double seconds)
 {
-    const auto n = static_cast<size_t>(std::ceil(seconds / series.interval));
-    if (series.phase.size() < n) return std::nullopt;
+    const double wanted = std::ceil(seconds / series.interval);
+    if (static_cast<double>(series.phase.size()) < wanted) return std::nullopt;
+    const auto n = static_cast<size_t>(wanted);
     std::vector<double> sums(series.phase.size() + 1, 0);
     std::partial_sum(series.phase.begin(), series.phase.end(), sums.begin() + 1);
     double largest = 0;
@@ -85,10 +97,10 @@ std::optional<tWorst> worstOf(const tSeries& series, std::optional<double> tStab
                               double longestTau, Limit limitNs)
 {
     std::optional<tWorst> worst;
-    for (const size_t n : octaves(series)) {
+    if (series.phase.size() < 2) return worst;
+    for (const size_t n : averagingsUpTo(series, longestTau)) {
         const double tau = static_cast<double>(n) * series.interval;
-        if (tau < kShortestTau) continue;
-        if (tau > longestTau) break;
+        if (n < 1 || tau < kShortestTau || tau > longestTau) continue;
         const auto found = stabilityAt(series, n).*figure;
         if (!found) continue;
         const tWorst here = {tau, *found * 1e9, limitNs(tau)};
@@ -202,6 +214,10 @@ std::vector<tMaskLine> checkMask(const std::string& name, const tMeasured& measu
     const tMask& mask = maskOf(name);
     std::vector<tMaskLine> lines;
     addUnfiltered(lines, mask, measured);
-    if (measured.series.phase.size() > 1) addFiltered(lines, mask, measured.series);
+    if (measured.series.phase.size() > 1) {
+        addFiltered(lines, mask, measured.series);
+    } else {
+        lines.push_back({"all over time", "too few points", tMaskLine::kNotChecked});
+    }
     return lines;
 }

@@ -72,7 +72,10 @@ tSeries longestStretch(const tPairs& pairs, const std::vector<double>& errors)
         start = i;
     }
     const auto at = [&errors](size_t i) { return errors.begin() + static_cast<std::ptrdiff_t>(i); };
-    return {static_cast<double>(spacingNs) * 1e-9, {at(bestStart), at(bestEnd)}};
+    const auto lengthNs =
+        static_cast<double>(pairs[bestEnd - 1]->elapsedNs - pairs[bestStart]->elapsedNs);
+    const double intervalNs = lengthNs / static_cast<double>(bestEnd - bestStart - 1);
+    return {intervalNs * 1e-9, {at(bestStart), at(bestEnd)}};
 }
 
 } // namespace
@@ -82,14 +85,20 @@ tMeasured measure(const tRecording& recording, const tSelection& selection)
     const tPairs pairs = select(recording.pairs, selection);
     if (pairs.empty())
         throw std::runtime_error(recording.name + " has no measurement in that time");
-    const bool isTrue = !selection.measured && pairs.front()->trueErrorNs.has_value();
+    const bool allTrue = std::all_of(pairs.begin(), pairs.end(), [](const tRecordedPair* pair) {
+        return pair->trueErrorNs.has_value();
+    });
+    const bool isTrue = !selection.measured && allTrue;
     tMeasured measured;
     measured.what = isTrue ? "true error" : "measured error";
     measured.fromSeconds = static_cast<double>(pairs.front()->elapsedNs) * 1e-9;
     measured.toSeconds = static_cast<double>(pairs.back()->elapsedNs) * 1e-9;
     measured.errors.reserve(pairs.size());
-    for (const tRecordedPair* const pair : pairs)
+    measured.times.reserve(pairs.size());
+    for (const tRecordedPair* const pair : pairs) {
         measured.errors.push_back((isTrue ? pair->trueErrorNs.value_or(0) : pair->errorNs) * 1e-9);
+        measured.times.push_back(static_cast<double>(pair->elapsedNs) * 1e-9);
+    }
     measured.series = longestStretch(pairs, measured.errors);
     lookAtLocks(measured, recording.pairs);
     return measured;
@@ -114,8 +123,20 @@ tMeasured readNumbers(const std::string& file, double interval, bool frequency)
     measured.what = frequency ? "phase of the frequency" : "phase";
     measured.series = frequency ? phaseOf(series) : series;
     measured.errors = measured.series.phase;
+    for (size_t i = 0; i < measured.errors.size(); ++i)
+        measured.times.push_back(static_cast<double>(i) * interval);
     measured.toSeconds = static_cast<double>(measured.errors.size() - 1) * interval;
     return measured;
+}
+
+void tMeasured::removeSlope()
+{
+    if (errors.size() < 2) throw std::runtime_error("one measurement has no slope");
+    const double first = errors.front();
+    const double slope = (errors.back() - first) / (times.back() - times.front());
+    for (size_t i = 0; i < errors.size(); ++i)
+        errors[i] -= first + slope * (times[i] - times.front());
+    series = withoutSlope(series);
 }
 
 double tMeasured::mean() const

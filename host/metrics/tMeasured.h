@@ -19,9 +19,14 @@ struct tMeasured {
     double fromSeconds = 0;
     double toSeconds = 0;
     std::vector<double> errors;       // s, all
+    std::vector<double> times;        // s, of each
     tSeries series;                   // the longest stretch without a gap
     std::optional<double> timeToLock; // s; if the trace tells of locks
     std::optional<int64_t> locksLost;
+
+    // Takes out the straight line from the first point to the last, of errors and series each.
+    // Throws std::runtime_error if there is but one.
+    void removeSlope();
 
     double mean() const;
     double rms() const;

@@ -38,8 +38,11 @@ constexpr tWholeKey kWholes[] = {
 std::string tServoParameters::documentText() const
 {
     std::string text;
-    for (const tNumberKey& key : kNumbers)
-        text += fmt::format("  \"{}\": {:.6g},\n", key.name, this->*key.value);
+    for (const tNumberKey& key : kNumbers) {
+        const bool isRatio = key.value == &tServoParameters::phaseLockCoefficientA;
+        const int digits = isRatio ? 12 : 6; // A - B may be a small part of A
+        text += fmt::format("  \"{}\": {:.{}g},\n", key.name, this->*key.value, digits);
+    }
     for (const tWholeKey& key : kWholes)
         text += fmt::format("  \"{}\": {},\n", key.name, this->*key.value);
     text.resize(text.size() - 2);

@@ -5,12 +5,22 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <cmath>
 
 namespace {
 
 constexpr std::array<std::string_view, 9> kTitles = {"reference_ns",  "clock_ns",      "elapsed_s",
                                                      "true_error_ns", "frequency_ppb", "step_ns",
                                                      "kind",          "call",          "value"};
+
+// What a field says that may be empty; nothing if it is neither that nor a finite number.
+template <typename Number> std::optional<std::optional<Number>> optionalIn(std::string_view field)
+{
+    if (field.empty()) return std::optional<Number>();
+    const auto number = numberIn<Number>(field);
+    if (!number || !std::isfinite(static_cast<double>(*number))) return std::nullopt;
+    return number;
+}
 
 } // namespace
 
@@ -69,16 +79,20 @@ std::string tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& build
                                ? std::optional(static_cast<int64_t>(*referenceNs))
                                : secondsIn(fields[kElapsed]);
     if (!elapsedNs) return "elapsed_s is no time";
+    const auto trueErrorNs = optionalIn<double>(fields[kTrueError]);
+    const auto stepNs = optionalIn<int64_t>(fields[kStep]);
+    const auto frequencyPpb = optionalIn<double>(fields[kFrequency]);
+    if (!trueErrorNs || !stepNs || !frequencyPpb)
+        return "no number in true_error_ns, step_ns or frequency_ppb";
     endPair(builder);
     tRecordedPair pair{};
     pair.elapsedNs = *elapsedNs;
     pair.referenceNs = *referenceNs;
     pair.clockNs = *clockNs;
     pair.errorNs = static_cast<double>(static_cast<int64_t>(*clockNs - *referenceNs));
-    pair.trueErrorNs = numberIn<double>(fields[kTrueError]);
-    pair.stepNs = numberIn<int64_t>(fields[kStep]).value_or(0);
-    pair.orderedPpb =
-        fields[kFrequency].empty() ? orderedPpb : numberIn<double>(fields[kFrequency]);
+    pair.trueErrorNs = *trueErrorNs;
+    pair.stepNs = stepNs->value_or(0);
+    pair.orderedPpb = *frequencyPpb ? *frequencyPpb : orderedPpb;
     return builder.add("", pair);
 }
 

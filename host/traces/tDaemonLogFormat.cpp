@@ -19,9 +19,15 @@ constexpr std::array<std::string_view, 4> kPrograms = {"ptp4l", "phc2sys", "ts2p
 
 std::string_view programIn(std::string_view text)
 {
-    for (const std::string_view program : kPrograms)
-        if (text.find(program) != std::string_view::npos) return program;
-    return "";
+    std::string_view last; // before it may stand a host of such a name
+    size_t lastAt = 0;
+    for (const std::string_view program : kPrograms) {
+        const size_t at = text.rfind(program);
+        if (at == std::string_view::npos || at < lastAt) continue;
+        last = program;
+        lastAt = at;
+    }
+    return last;
 }
 
 // Splits off everything up to the monotonic time, the first bracket that has a decimal point: a

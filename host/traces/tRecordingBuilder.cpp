@@ -37,7 +37,16 @@ bool tRecordingBuilder::isWanted(std::string_view source)
         latestSource = static_cast<size_t>(known - sources.begin());
         if (known == sources.end()) sources.emplace_back(source);
     }
-    return source.find(wanted) != std::string_view::npos;
+    if (source == wanted && !exact) { // what has a part of the name only was not meant
+        exact = true;
+        pairs.clear();
+    }
+    return matches(source);
+}
+
+bool tRecordingBuilder::matches(std::string_view source) const
+{
+    return exact ? source == wanted : source.find(wanted) != std::string_view::npos;
 }
 
 void tRecordingBuilder::setUnread(int64_t lineNumber, const std::string& why)
@@ -48,16 +57,15 @@ void tRecordingBuilder::setUnread(int64_t lineNumber, const std::string& why)
 
 tRecording tRecordingBuilder::finish(const std::string& name, const std::string& format)
 {
-    const auto matches = [this](const std::string& source) {
-        return source.find(wanted) != std::string::npos;
-    };
-    if (std::count_if(sources.begin(), sources.end(), matches) > 1) {
+    const auto isMatch = [this](const std::string& source) { return matches(source); };
+    if (std::count_if(sources.begin(), sources.end(), isMatch) > 1) {
         throw std::runtime_error(fmt::format("{} has several sources, choose one by --source: {}",
                                              name, listOf(sources)));
     }
     if (pairs.empty() && !sources.empty()) {
-        throw std::runtime_error(
-            fmt::format("{} has no source '{}', but {}", name, wanted, listOf(sources)));
+        const bool named = !sources.front().empty();
+        throw std::runtime_error(fmt::format("{} has no source '{}', but {}", name, wanted,
+                                             named ? listOf(sources) : "one without a name"));
     }
     if (pairs.empty()) throw std::runtime_error(fmt::format("{} has no measurement", name));
     return {name, format, std::move(pairs), unreadLines, std::move(firstUnread)};

@@ -26,8 +26,10 @@ public:
 
 private:
     bool isWanted(std::string_view source);
+    bool matches(std::string_view source) const;
 
     std::string wanted;
+    bool exact = false;               // there is a source of the very name
     std::vector<std::string> sources; // all that were met
     size_t latestSource = 0;
     std::vector<tRecordedPair> pairs;

@@ -30,9 +30,7 @@ tMeasured read(const tOptions& options)
         options.numbersIntervalNs
             ? readNumbers(options.trace.file, *options.numbersIntervalNs * 1e-9, options.frequency)
             : measure(readTrace(options.trace), options.selection);
-    if (!options.removeSlope) return measured;
-    measured.series = withoutSlope(measured.series);
-    measured.errors = measured.series.phase;
+    if (options.removeSlope) measured.removeSlope();
     return measured;
 }
 
@@ -92,10 +90,10 @@ std::string jsonText(const tMeasured& measured)
     std::string text = fmt::format(
         "{{\"points\": {}, \"from\": {}, \"to\": {}, \"mean\": {}, \"rms\": {}, \"peak\": {}, "
         "\"peakToPeak\": {}, \"timeToLock\": {}, \"locksLost\": {}, \"interval\": {}, "
-        "\"stability\": [",
+        "\"stretch\": {}, \"stability\": [",
         measured.errors.size(), measured.fromSeconds, measured.toSeconds, measured.mean(),
         measured.rms(), measured.peak(), measured.peakToPeak(), number(measured.timeToLock),
-        number(locksLost), measured.series.interval);
+        number(locksLost), measured.series.interval, measured.series.phase.size());
     const char* separator = "\n";
     for (const size_t n : octaves(measured.series)) {
         const tStability at = stabilityAt(measured.series, n);
@@ -109,19 +107,23 @@ std::string jsonText(const tMeasured& measured)
     return text + "]}\n";
 }
 
-// One line for each limit; returns how many are broken.
-int reportMasks(const tOptions& options, const tMeasured& measured, tOutputFile& output)
+// One line for each limit; returns what is wrong, "" if all are held.
+std::string reportMasks(const tOptions& options, const tMeasured& measured, tOutputFile& output)
 {
-    int broken = 0;
+    int counts[3] = {};
     for (const std::string& name : options.masks) {
         for (const tMaskLine& line : checkMask(name, measured)) {
             constexpr const char* kVerdicts[] = {"held", "broken", "not checked"};
             output.write(fmt::format("mask {:<10} {:<34} {:<12} {}\n", name, line.limit,
                                      kVerdicts[line.verdict], line.found));
-            broken += line.verdict == tMaskLine::kBroken ? 1 : 0;
+            ++counts[line.verdict];
         }
     }
-    return broken;
+    if (counts[tMaskLine::kBroken] > 0)
+        return fmt::format("limits of masks broken: {}", counts[tMaskLine::kBroken]);
+    if (counts[tMaskLine::kNotChecked] > 0)
+        return fmt::format("limits of masks not checked: {}", counts[tMaskLine::kNotChecked]);
+    return "";
 }
 
 void metrics(const tOptions& options)
@@ -134,10 +136,8 @@ void metrics(const tOptions& options)
     } else {
         output.write(summaryText(options, measured) + tableText(measured));
     }
-    const int brokenMasks = reportMasks(options, measured, options.json ? other : output);
+    std::string failures = reportMasks(options, measured, options.json ? other : output);
     output.flush();
-    std::string failures =
-        brokenMasks > 0 ? fmt::format("limits of masks broken: {}", brokenMasks) : "";
     for (const tAssertion& assertion : options.assertions) {
         const std::string failure = assertion.failure(measured);
         if (failure.empty()) continue;

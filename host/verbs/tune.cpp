@@ -70,6 +70,10 @@ tLoopGains parseController(const std::string& text)
 void requireEnough(const tOptions& options)
 {
     const tGivenNoise& given = options.given;
+    if (options.quickOutput == "-")
+        throw CLI::ValidationError("--quick", "several documents take files");
+    if (options.controller && !options.trace.file.empty())
+        throw CLI::ValidationError("--from-pi", "a trace has no say in it");
     if (options.controller || !options.trace.file.empty()) return;
     if (given.noiseNs && given.wanderPpb && given.intervalNs) return;
     throw CLI::RequiredError("A trace, or --noise, --wander and --interval, or --from-pi");
