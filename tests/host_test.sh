@@ -130,6 +130,7 @@ spikeFilterEnabled is 2 and read as off
 spikeFilterHistorySize is 5.7 and read as 5" "$(notes '{"PHASELOCKGAIN": 1, "phaseLockGain": 2, "gain": 3,
     "snaptimethreshhold": 1, "spikeFilterEnabled": 2, "spikeFilterHistorySize": 5.7}')"
 expect "a flag that is nearly 1" "spikeFilterEnabled is 1.9 and read as 1, on" "$(notes '{"spikeFilterEnabled": 1.9}')"
+expect "two objects" "what stands behind the object sets nothing" "$(notes '{"phaseLockGain": 0.5} {"phaseLockGain": 1}')"
 expect "no object" "it is no JSON object, so it sets nothing" "$(notes '[1]')"
 
 # Advice on the loop: rows of PATTERN|OPTIONS|DOCUMENT on stdin.

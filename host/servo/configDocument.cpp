@@ -130,6 +130,14 @@ std::string readingText(const tKey& key, const cJSON* value)
     return fmt::format("{} is {} and read as {}", key.name, value->valuedouble, meaning);
 }
 
+// What stands behind the JSON value, but for white space.
+bool hasMore(const std::string& document)
+{
+    const char* end = nullptr;
+    const tJson root(cJSON_ParseWithOpts(document.c_str(), &end, 0));
+    return root != nullptr && end[std::strspn(end, " \t\r\n")] != '\0';
+}
+
 void enumerate(std::string& list, const char* name)
 {
     list += fmt::format("{}{}", list.empty() ? "" : ", ", name);
@@ -175,5 +183,6 @@ std::vector<std::string> documentNotes(const std::string& document)
             add(readingText(*key, member));
         }
     }
+    if (hasMore(document)) add("what stands behind the object sets nothing");
     return notes;
 }
