@@ -1,6 +1,5 @@
 #include "clocks/tPtpDevice.h"
 
-#include <algorithm>
 #include <cerrno>
 #include <fcntl.h>
 #include <limits>

@@ -6,7 +6,6 @@
 #include <cmath>
 #include <cstring>
 #include <poll.h>
-#include <stdexcept>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
