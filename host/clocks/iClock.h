@@ -2,6 +2,8 @@
 
 #include <cstdint>
 
+namespace dravikHost {
+
 // A clock that can be disciplined. Any operation may throw; the failure reaches the plug-in as a
 // negative status code. Positive offsets make it run faster, positive steps move it forward.
 class iClock
@@ -18,3 +20,19 @@ public:
     virtual int32_t maxOffsetPpb() = 0;
     virtual int32_t minOffsetPpb() = 0;
 };
+
+// The machine's clock and another one at the same moment, as nearly as can be told.
+struct tCrossReading {
+    uint64_t systemNs; // CLOCK_REALTIME
+    uint64_t clockNs;
+    uint64_t windowNs; // within which both were read; 0: they are one clock, or read in hardware
+};
+
+// A clock that runs in real time.
+class iLiveClock : public iClock
+{
+public:
+    virtual tCrossReading crossRead() = 0;
+};
+
+} // namespace dravikHost

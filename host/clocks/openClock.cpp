@@ -4,12 +4,14 @@
 #include "clocks/tKernelClock.h"
 #include "clocks/tPtpDevice.h"
 #include "clocks/tSoftClock.h"
-#include "text/afterPrefix.h"
+#include "text/words.h"
 
 #include <algorithm>
 #include <cerrno>
 #include <limits>
 #include <system_error>
+
+namespace dravikHost {
 
 namespace {
 
@@ -60,3 +62,5 @@ std::unique_ptr<iLiveClock> openClock(const tClockChoice& choice)
     if (choice.name == "realtime") return openRealtime(choice.limitPpb);
     return startSoft(choice);
 }
+
+} // namespace dravikHost

@@ -1,9 +1,11 @@
 #pragma once
 
-#include "clocks/iLiveClock.h"
+#include "clocks/iClock.h"
 
 #include <memory>
 #include <string>
+
+namespace dravikHost {
 
 // Which clock is disciplined: "soft", "phc:DEVICE" or "realtime".
 struct tClockChoice {
@@ -17,3 +19,5 @@ bool isClockName(const std::string& name);
 
 // Throws std::system_error that names what cannot be opened.
 std::unique_ptr<iLiveClock> openClock(const tClockChoice& choice);
+
+} // namespace dravikHost

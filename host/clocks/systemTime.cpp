@@ -1,15 +1,19 @@
 #include "clocks/systemTime.h"
 
+#include "text/quantity.h"
+
 #include <cerrno>
 #include <limits>
 #include <system_error>
+
+namespace dravikHost {
 
 uint64_t systemTimeNs(clockid_t clock)
 {
     timespec time{};
     if (clock_gettime(clock, &time) != 0)
         throw std::system_error(errno, std::generic_category(), "cannot read a system clock");
-    return static_cast<uint64_t>(time.tv_sec) * 1'000'000'000 + static_cast<uint64_t>(time.tv_nsec);
+    return static_cast<uint64_t>(time.tv_sec) * kSecondNs + static_cast<uint64_t>(time.tv_nsec);
 }
 
 tCrossReading readSystemItself()
@@ -30,3 +34,11 @@ tCrossReading crossReadSystem(clockid_t clock)
     }
     return best;
 }
+
+void nap(int64_t ns)
+{
+    const timespec time{0, static_cast<long>(ns)};
+    (void)nanosleep(&time, nullptr);
+}
+
+} // namespace dravikHost

@@ -2,41 +2,38 @@
 
 #include "clocks/iClock.h"
 
-#include <cstdint>
-#include <optional>
+#include <functional>
+#include <utility>
 
-// What a clock that matters is protected from.
-struct tClockGuards {
-    std::optional<int64_t> maxStepNs; // either way
-    bool noStepAfterLock = false;
-};
+namespace dravikHost {
 
-// A clock behind guards. A step that a guard refuses throws std::runtime_error: an offset that
-// large is no matter for a servo, but for a person.
+// A clock behind a guard, who may refuse a step. In a dry run no order reaches it.
 class tGuardedClock : public iClock
 {
 public:
-    // The clock is borrowed. In a dry run no order reaches it.
-    tGuardedClock(iClock& guarded, const tClockGuards& options, bool isDryRun)
-        : clock(guarded), guards(options), dryRun(isDryRun)
+    // The clock is borrowed. The guard throws if a step by so many nanoseconds is not to be.
+    tGuardedClock(iClock& clock, std::function<void(int64_t deltaNs)> guard, bool dryRun)
+        : clock(clock), guard(std::move(guard)), dryRun(dryRun)
     {}
 
-    void setLocked(bool isLocked) { wasLocked = wasLocked || isLocked; }
-
-    // The sum of all steps, those that a dry run held back apart.
-    int64_t steppedNs() const { return sumNs; }
-
     uint64_t timeNs() override { return clock.timeNs(); }
-    void step(int64_t deltaNs) override;
+    void step(int64_t deltaNs) override
+    {
+        guard(deltaNs);
+        if (!dryRun) clock.step(deltaNs);
+    }
     int32_t offsetPpb() override { return clock.offsetPpb(); }
-    void setOffsetPpb(int32_t offsetPpb) override;
+    void setOffsetPpb(int32_t offsetPpb) override
+    {
+        if (!dryRun) clock.setOffsetPpb(offsetPpb);
+    }
     int32_t maxOffsetPpb() override { return clock.maxOffsetPpb(); }
     int32_t minOffsetPpb() override { return clock.minOffsetPpb(); }
 
 private:
     iClock& clock;
-    tClockGuards guards;
+    std::function<void(int64_t)> guard;
     bool dryRun;
-    bool wasLocked = false;
-    int64_t sumNs = 0;
 };
+
+} // namespace dravikHost

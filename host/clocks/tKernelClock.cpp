@@ -1,6 +1,7 @@
 #include "clocks/tKernelClock.h"
 
 #include "clocks/systemTime.h"
+#include "text/quantity.h"
 
 #include <fmt/format.h>
 
@@ -10,9 +11,10 @@
 #include <system_error>
 #include <utility>
 
+namespace dravikHost {
+
 namespace {
 
-constexpr int64_t kSecondNs = 1'000'000'000;
 constexpr double kKernelUnitsPerPpb = 65.536;
 
 // A time_t may have 32 bits.
@@ -33,9 +35,9 @@ int32_t ppbOfKernelFrequency(long frequency)
     return static_cast<int32_t>(std::lround(static_cast<double>(frequency) / kKernelUnitsPerPpb));
 }
 
-tKernelClock::tKernelClock(clockid_t clock, std::string nameForPeople, int32_t limitPpb,
-                           std::function<tCrossReading()> crossReader)
-    : id(clock), name(std::move(nameForPeople)), limit(limitPpb), reader(std::move(crossReader))
+tKernelClock::tKernelClock(clockid_t id, std::string name, int32_t limitPpb,
+                           std::function<tCrossReading()> reader)
+    : id(id), name(std::move(name)), limitPpb(limitPpb), reader(std::move(reader))
 {}
 
 uint64_t tKernelClock::timeNs() { return systemTimeNs(id); }
@@ -75,3 +77,5 @@ timex tKernelClock::adjust(timex request, const char* deed)
         fmt::format("cannot {} {}{}", deed, name,
                     failure == EPERM && id == CLOCK_REALTIME ? ", which takes CAP_SYS_TIME" : ""));
 }
+
+} // namespace dravikHost

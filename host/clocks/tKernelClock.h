@@ -1,19 +1,21 @@
 #pragma once
 
-#include "clocks/iLiveClock.h"
+#include "clocks/iClock.h"
 
 #include <ctime>
 #include <functional>
 #include <string>
 #include <sys/timex.h>
 
+namespace dravikHost {
+
 // A clock that the kernel keeps: CLOCK_REALTIME, or a PTP hardware clock.
 class tKernelClock : public iLiveClock
 {
 public:
     // The name is for people. The limit is the program's own; the kernel may have a narrower one.
-    tKernelClock(clockid_t clock, std::string name, int32_t limitPpb,
-                 std::function<tCrossReading()> crossReader);
+    tKernelClock(clockid_t id, std::string name, int32_t limitPpb,
+                 std::function<tCrossReading()> reader);
 
     tCrossReading crossRead() override { return reader(); }
 
@@ -21,18 +23,20 @@ public:
     void step(int64_t deltaNs) override;
     int32_t offsetPpb() override;
     void setOffsetPpb(int32_t offsetPpb) override;
-    int32_t maxOffsetPpb() override { return limit; }
-    int32_t minOffsetPpb() override { return -limit; }
+    int32_t maxOffsetPpb() override { return limitPpb; }
+    int32_t minOffsetPpb() override { return -limitPpb; }
 
 private:
     timex adjust(timex request, const char* deed);
 
     clockid_t id;
     std::string name;
-    int32_t limit; // ppb
+    int32_t limitPpb;
     std::function<tCrossReading()> reader;
 };
 
 // The kernel counts in 2^-16 ppm. Rounded both ways, a value that is read back is the one set.
 long kernelFrequency(int32_t offsetPpb);
 int32_t ppbOfKernelFrequency(long frequency);
+
+} // namespace dravikHost

@@ -1,5 +1,7 @@
 #include "clocks/tPtpDevice.h"
 
+#include "text/quantity.h"
+
 #include <cerrno>
 #include <fcntl.h>
 #include <limits>
@@ -7,13 +9,15 @@
 #include <sys/ioctl.h>
 #include <system_error>
 
+namespace dravikHost {
+
 namespace {
 
 constexpr unsigned kSamples = 9;
 
 uint64_t nsOf(const ptp_clock_time& time)
 {
-    return static_cast<uint64_t>(time.sec) * 1'000'000'000 + time.nsec;
+    return static_cast<uint64_t>(time.sec) * kSecondNs + time.nsec;
 }
 
 void keepShortest(tCrossReading& best, const ptp_clock_time& before, const ptp_clock_time& device,
@@ -108,3 +112,5 @@ bool tPtpDevice::ask(unsigned long request, void* argument) const
 {
     return ioctl(file.get(), request, argument) == 0;
 }
+
+} // namespace dravikHost

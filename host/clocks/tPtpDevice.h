@@ -1,11 +1,13 @@
 #pragma once
 
-#include "clocks/tCrossReading.h"
-#include "clocks/tDescriptor.h"
+#include "clocks/iClock.h"
+#include "text/files.h"
 
 #include <ctime>
 #include <optional>
 #include <string>
+
+namespace dravikHost {
 
 // A PTP hardware clock, by the name of its device.
 class tPtpDevice
@@ -34,3 +36,5 @@ private:
     int32_t limitPpb = 0;
     tMethod latest = kPrecise;
 };
+
+} // namespace dravikHost

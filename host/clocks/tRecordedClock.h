@@ -2,15 +2,24 @@
 
 #include "clocks/iClock.h"
 
+#include <algorithm>
+#include <cmath>
+
+namespace dravikHost {
+
 // A clock of the past, which no order reaches any more: it shows what was recorded. What it is
 // ordered counts only where the recording does not say what it ran at.
 class tRecordedClock : public iClock
 {
 public:
-    explicit tRecordedClock(int32_t maximumPpb) : limitPpb(maximumPpb) {}
+    explicit tRecordedClock(int32_t limitPpb) : limitPpb(limitPpb) {}
 
     void showTime(uint64_t recordedNs) { shownNs = recordedNs; }
-    void showOffset(double recordedPpb); // of its rate
+    void showOffset(double recordedPpb) // of its rate
+    {
+        const double limit = limitPpb;
+        shownPpb = static_cast<int32_t>(std::lround(std::clamp(recordedPpb, -limit, limit)));
+    }
 
     uint64_t timeNs() override { return shownNs; }
     void step(int64_t /*deltaNs*/) override {}
@@ -24,3 +33,5 @@ private:
     int32_t shownPpb = 0;
     int32_t limitPpb;
 };
+
+} // namespace dravikHost

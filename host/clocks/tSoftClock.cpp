@@ -2,8 +2,10 @@
 
 #include "clocks/systemTime.h"
 
+namespace dravikHost {
+
 tSoftClock::tSoftClock(uint64_t startNs, double frequencyErrorPpb, int32_t maxOffsetPpb)
-    : clock(startNs, frequencyErrorPpb, maxOffsetPpb), lastRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
+    : clock(startNs, frequencyErrorPpb, maxOffsetPpb), lastRawNs(rawTimeNs())
 {}
 
 tCrossReading tSoftClock::crossRead()
@@ -12,7 +14,7 @@ tCrossReading tSoftClock::crossRead()
     return {raw.systemNs, timeAtRaw(raw.clockNs), raw.windowNs};
 }
 
-uint64_t tSoftClock::timeNs() { return timeAtRaw(systemTimeNs(CLOCK_MONOTONIC_RAW)); }
+uint64_t tSoftClock::timeNs() { return timeAtRaw(rawTimeNs()); }
 
 // The time up to now has passed at the old rate.
 void tSoftClock::setOffsetPpb(int32_t offsetPpb)
@@ -27,3 +29,5 @@ uint64_t tSoftClock::timeAtRaw(uint64_t rawNs)
     lastRawNs = rawNs;
     return clock.timeNs();
 }
+
+} // namespace dravikHost

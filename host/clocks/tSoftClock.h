@@ -1,7 +1,9 @@
 #pragma once
 
-#include "clocks/iLiveClock.h"
+#include "clocks/iClock.h"
 #include "clocks/tSteeredClock.h"
+
+namespace dravikHost {
 
 // A clock of the program's own over CLOCK_MONOTONIC_RAW, which no one else steers. It starts wrong
 // on purpose; no clock of the machine is touched.
@@ -26,3 +28,5 @@ private:
     tSteeredClock clock;
     uint64_t lastRawNs;
 };
+
+} // namespace dravikHost

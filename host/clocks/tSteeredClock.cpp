@@ -1,9 +1,13 @@
 #include "clocks/tSteeredClock.h"
 
+#include "text/quantity.h"
+
 #include <fmt/format.h>
 
 #include <cmath>
 #include <stdexcept>
+
+namespace dravikHost {
 
 tSteeredClock::tSteeredClock(uint64_t startNs, double frequencyErrorPpb, int32_t maxOffsetPpb)
     : frequencyError(frequencyErrorPpb * 1e-9), wholeNs(startNs), limitPpb(maxOffsetPpb)
@@ -35,3 +39,19 @@ void tSteeredClock::pass(int64_t trueNs, double phaseNoiseNs)
     fractionNs -= carryNs;
     wholeNs += static_cast<uint64_t>(trueNs) + static_cast<uint64_t>(static_cast<int64_t>(carryNs));
 }
+
+tSimulatedClock::tSimulatedClock(uint64_t startNs, const tOscillatorModel& model,
+                                 int32_t maxOffsetPpb, tNoise& noise)
+    : tSteeredClock(startNs, model.frequencyErrorPpb, maxOffsetPpb), model(model), noise(noise)
+{}
+
+// White frequency noise adds up to a phase that walks; both walks grow with the root of the time.
+// Numbers are drawn at level 0 too, so that one option does not change the noise of another.
+void tSimulatedClock::advance(int64_t trueNs)
+{
+    const double rootSeconds = std::sqrt(secondsOf(trueNs));
+    pass(trueNs, model.frequencyNoisePpb * rootSeconds * noise.normal()); // ppb * s is ns
+    frequencyError += model.frequencyWanderPpb * 1e-9 * rootSeconds * noise.normal();
+}
+
+} // namespace dravikHost

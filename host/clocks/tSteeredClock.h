@@ -1,6 +1,9 @@
 #pragma once
 
 #include "clocks/iClock.h"
+#include "maths/tNoise.h"
+
+namespace dravikHost {
 
 // A clock that the program keeps itself, on an oscillator that is a little off: it passes
 // (1 + oscillator's error) * (1 + ordered offset) seconds in each true one.
@@ -30,3 +33,45 @@ private:
     int32_t orderedPpb = 0;
     int32_t limitPpb;
 };
+
+struct tOscillatorModel {
+    double frequencyErrorPpb = 0;  // at the start; positive is fast
+    double frequencyNoisePpb = 0;  // white: Allan deviation at 1 s
+    double frequencyWanderPpb = 0; // random walk: standard deviation after 1 s
+};
+
+// A clock on a modelled oscillator. Its time passes only in advance().
+class tSimulatedClock : public tSteeredClock
+{
+public:
+    // The noise is borrowed.
+    tSimulatedClock(uint64_t startNs, const tOscillatorModel& model, int32_t maxOffsetPpb,
+                    tNoise& noise);
+
+    void advance(int64_t trueNs);
+
+private:
+    tOscillatorModel model;
+    tNoise& noise;
+};
+
+// A clock whose oscillator behaves as a recorded one did: its own error is given for each stretch
+// of time, and what it is ordered comes on top.
+class tFreeRunningClock : public tSteeredClock
+{
+public:
+    tFreeRunningClock(uint64_t startNs, int32_t maxOffsetPpb)
+        : tSteeredClock(startNs, 0, maxOffsetPpb)
+    {}
+
+    void advance(int64_t trueNs, double ownErrorNs) { pass(trueNs, ownErrorNs); }
+};
+
+// A clock that stands still, for a servo that is given documents but no pairs.
+class tStillClock : public tSteeredClock
+{
+public:
+    tStillClock() : tSteeredClock(0, 0, 0) {}
+};
+
+} // namespace dravikHost

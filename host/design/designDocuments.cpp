@@ -1,11 +1,13 @@
 #include "design/designDocuments.h"
 
-#include "design/kalmanGains.h"
-#include "design/patternSearch.h"
+#include "design/tLoopGains.h"
+#include "maths/patternSearch.h"
 
 #include <algorithm>
 #include <cmath>
 #include <limits>
+
+namespace dravikHost {
 
 namespace {
 
@@ -29,7 +31,7 @@ void setFilter(tServoParameters& parameters, const tNoiseModel& model, double li
     constexpr int kHistory = 4;
     constexpr double kFloor = 0.9; // of the limit, or a quiet spell would shut the filter
     constexpr double kCeiling = 6; // of the limit, so that a true step opens it
-    const double limitRate = limit * kMeanStep * model.noiseNs * 1e-9 / model.interval();
+    const double limitRate = limit * kMeanStep * secondsOf(model.noiseNs) / model.interval();
     const auto within = [](double rate) { return std::clamp(rate, 1e-9, 10.0); };
     parameters.spikeFilterEnabled = 1;
     parameters.spikeFilterHistorySize = kHistory;
@@ -74,7 +76,7 @@ tServoParameters refined(const tServoLibrary& library, const tNoiseModel& model,
 // deviations wrong; seconds. Half of that frequency over the natural one is what its peak comes to.
 double takeUp(const tLoopGains& gains, const tNoiseModel& model, double measuredOver)
 {
-    const double frequency = 3 * std::sqrt(2.0) * model.noiseNs * 1e-9 / measuredOver;
+    const double frequency = 3 * std::sqrt(2.0) * secondsOf(model.noiseNs) / measuredOver;
     return frequency / 2 / std::sqrt(gains.ki / model.interval());
 }
 
@@ -104,7 +106,7 @@ void addQuick(tDesign& design, const tNoiseModel& model)
         gains.putInto(quick.parameters);
         quick.heldNs = static_cast<int64_t>(std::ceil(3 * pairs)) * model.intervalNs;
         if (design.quick.empty()) {
-            const double seconds = static_cast<double>(design.measureOverNs) * 1e-9;
+            const double seconds = secondsOf(design.measureOverNs);
             double& threshold = quick.parameters.snapTimeThreshold;
             threshold = std::min(10.0, threshold + takeUp(gains, model, seconds));
         }
@@ -118,7 +120,7 @@ double snapThresholdFor(const tNoiseModel& model)
 {
     constexpr double kDeviations = 12; // half of them for what a change of gains leaves
     const double outlierNs = model.outlierRate > 0 ? 1.2 * model.outlierSizeNs : 0;
-    return std::clamp((kDeviations * model.noiseNs + outlierNs) * 1e-9, 1e-8, 10.0);
+    return std::clamp(secondsOf(kDeviations * model.noiseNs + outlierNs), 1e-8, 10.0);
 }
 
 void setSpikeFilter(tServoParameters& parameters, const tNoiseModel& model)
@@ -137,3 +139,5 @@ tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model)
     addQuick(design, model);
     return design;
 }
+
+} // namespace dravikHost

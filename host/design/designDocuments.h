@@ -6,6 +6,8 @@
 
 #include <vector>
 
+namespace dravikHost {
+
 // For some time after the lock, in place of the quiet document.
 struct tQuickDocument {
     tServoParameters parameters;
@@ -31,3 +33,5 @@ double snapThresholdFor(const tNoiseModel& model);
 
 // A filter that lets noise pass and limits outliers.
 void setSpikeFilter(tServoParameters& parameters, const tNoiseModel& model);
+
+} // namespace dravikHost

@@ -1,7 +1,9 @@
 #include "design/estimateNoise.h"
 
-#include "design/patternSearch.h"
-#include "traces/ownError.h"
+#include "maths/median.h"
+#include "maths/patternSearch.h"
+#include "maths/tKalmanFilter.h"
+#include "traces/tRecording.h"
 
 #include <fmt/format.h>
 
@@ -10,40 +12,34 @@
 #include <cmath>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace {
 
 constexpr size_t kLeastPairs = 100;
 constexpr size_t kMostPairs = 100'000; // the latest ones; more would tell little more
 
-struct tFreeError {
+struct tFreeRunningError {
     double seconds; // since the one before
     double errorNs;
 };
 
-std::vector<tFreeError> freeErrors(const tRecording& recording)
+std::vector<tFreeRunningError> freeRunningErrors(const tRecording& recording)
 {
     const auto& pairs = recording.pairs;
-    std::vector<tFreeError> errors;
+    std::vector<tFreeRunningError> errors;
     double errorNs = 0;
     for (size_t i = pairs.size() > kMostPairs ? pairs.size() - kMostPairs : 1; i < pairs.size();
          ++i) {
         errorNs += ownErrorNs(pairs[i - 1], pairs[i]);
-        errors.push_back(
-            {static_cast<double>(pairs[i].elapsedNs - pairs[i - 1].elapsedNs) * 1e-9, errorNs});
+        errors.push_back({secondsOf(pairs[i].elapsedNs - pairs[i - 1].elapsedNs), errorNs});
     }
     return errors;
 }
 
-double median(std::vector<double> values)
-{
-    const auto middle = values.begin() + static_cast<std::ptrdiff_t>(values.size() / 2);
-    std::nth_element(values.begin(), middle, values.end());
-    return *middle;
-}
-
 // A deviation that outliers do not raise, of what a straight line through two errors does not
 // foresee of the third.
-double unforeseenNs(const std::vector<tFreeError>& errors)
+double unforeseenNs(const std::vector<tFreeRunningError>& errors)
 {
     constexpr double kDeviationOfMedian = 1.4826;
     std::vector<double> misses;
@@ -65,8 +61,8 @@ struct tRatios {
 class tLikelihood
 {
 public:
-    tLikelihood(std::vector<tFreeError> freeErrors, double gate)
-        : errors(std::move(freeErrors)), gateNs(gate)
+    tLikelihood(std::vector<tFreeRunningError> errors, double gateNs)
+        : errors(std::move(errors)), gateNs(gateNs)
     {}
 
     // The negative logarithm for each measurement, twice, less what does not depend on the ratios.
@@ -78,20 +74,21 @@ public:
         double logs = 0;
         double count = 0;
         for (size_t i = 1; i < errors.size(); ++i) {
-            predict(errors[i].seconds, ratios);
-            const double innovation = errors[i].errorNs - x;
+            const double t = errors[i].seconds;
+            filter.predict(t, disturbance(ratios.frequencyNoise, ratios.wander, t));
+            const double innovation = errors[i].errorNs - filter.phase;
             if (std::fabs(innovation) > gateNs && i > kSettling) {
                 takeOutlier(i, innovation);
                 continue;
             }
             missed = 0;
-            const double s = p.xx + 1;
+            const double s = filter.covariance.xx + 1;
             if (i > kSettling) {
                 sum += innovation * innovation / s;
                 logs += std::log(s);
                 ++count;
             }
-            update(innovation, s);
+            filter.update(innovation, 1);
         }
         variance = sum / count;
         return std::log(variance) + logs / count;
@@ -106,24 +103,8 @@ private:
     void restart(size_t i)
     {
         constexpr double kUnknown = 1e12;
-        x = errors[i].errorNs;
-        p = {1, 0, kUnknown};
-    }
-
-    void predict(double t, const tRatios& ratios)
-    {
-        const tCovariance q = disturbance(ratios.frequencyNoise, ratios.wander, t);
-        x += y * t;
-        p = {p.xx + t * (2 * p.xy + t * p.yy) + q.xx, p.xy + t * p.yy + q.xy, p.yy + q.yy};
-    }
-
-    void update(double innovation, double s)
-    {
-        const double k1 = p.xx / s;
-        const double k2 = p.xy / s;
-        x += k1 * innovation;
-        y += k2 * innovation;
-        p = {p.xx - k1 * p.xx, p.xy - k1 * p.xy, p.yy - k2 * p.xy};
+        filter.phase = errors[i].errorNs;
+        filter.covariance = {1, 0, kUnknown};
     }
 
     // Several in a row are no outliers but a step.
@@ -137,11 +118,9 @@ private:
         restart(i);
     }
 
-    std::vector<tFreeError> errors;
+    std::vector<tFreeRunningError> errors;
     double gateNs;
-    double x = 0;
-    double y = 0;
-    tCovariance p{};
+    tKalmanFilter filter; // in multiples of the measurements' variance
     int missed = 0;
     double variance = 0;
     std::vector<double> outliersNs;
@@ -185,16 +164,16 @@ tNoiseModel estimateNoise(const tRecording& recording)
         throw std::runtime_error(fmt::format("{} has {} measurements, too few to tell its noise",
                                              recording.name, recording.pairs.size()));
     }
-    const std::vector<tFreeError> errors = freeErrors(recording);
+    const std::vector<tFreeRunningError> errors = freeRunningErrors(recording);
     std::vector<double> intervals(errors.size());
     std::transform(errors.begin(), errors.end(), intervals.begin(),
-                   [](const tFreeError& error) { return error.seconds; });
+                   [](const tFreeRunningError& error) { return error.seconds; });
     const double interval = median(intervals);
     tLikelihood likelihood(errors, kGate * std::max(unforeseenNs(errors), 1.0));
     const tRatios ratios = mostLikely(likelihood, interval);
 
     tNoiseModel model;
-    model.intervalNs = std::llround(interval * 1e9);
+    model.intervalNs = std::llround(nsOf(interval));
     model.noiseNs = std::sqrt(likelihood.varianceNs2());
     model.frequencyNoisePpb = ratios.frequencyNoise * model.noiseNs;
     model.wanderPpb = ratios.wander * model.noiseNs;
@@ -205,3 +184,5 @@ tNoiseModel estimateNoise(const tRecording& recording)
     model.outlierSizeNs = median(likelihood.outliers());
     return model;
 }
+
+} // namespace dravikHost

@@ -9,9 +9,11 @@
 
 #include <cmath>
 
+namespace dravikHost {
+
 namespace {
 
-std::string secondsAsText(double seconds) { return durationText(seconds * 1e9); }
+std::string secondsAsText(double seconds) { return durationText(nsOf(seconds)); }
 
 std::string gainsText(const tServoParameters& parameters)
 {
@@ -68,7 +70,7 @@ std::string thresholdText(const tServoParameters& parameters, const tLoopAnalysi
     constexpr double kPairsToLock = 3;
     constexpr double kSeldom = 1e-3; // per hour
     const double seenNs = noiseNs * std::hypot(1, loop.noiseGain);
-    const double deviations = parameters.snapTimeThreshold * 1e9 / seenNs;
+    const double deviations = nsOf(parameters.snapTimeThreshold) / seenNs;
     const double chance = std::erfc(deviations / std::sqrt(2.0));
     const double perHour = 3600 / interval / (kPairsToLock + 1 / chance);
     const std::string text =
@@ -86,7 +88,7 @@ std::string filterText(const tServoParameters& parameters, double interval, doub
     constexpr double kMeanStep = 1.128379167095513; // 2 / sqrt(pi)
     constexpr double kTight = 1.5;
     if (parameters.spikeFilterEnabled == 0) return "  spike filter off\n";
-    const double meanRate = kMeanStep * noiseNs * 1e-9 / interval;
+    const double meanRate = kMeanStep * secondsOf(noiseNs) / interval;
     const double growth = parameters.spikeFilterGrowthFactor;
     const double limit = std::max(std::min(growth * meanRate, parameters.spikeFilterMaxThreshold),
                                   parameters.spikeFilterMinThreshold);
@@ -110,3 +112,5 @@ std::string loopAdvice(const tServoParameters& parameters, double interval,
     return text + thresholdText(parameters, loop, interval, *noiseNs) +
            filterText(parameters, interval, *noiseNs);
 }
+
+} // namespace dravikHost

@@ -5,6 +5,8 @@
 #include <complex>
 #include <cstdint>
 
+namespace dravikHost {
+
 namespace {
 
 using tPole = std::complex<double>;
@@ -92,3 +94,5 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     }
     noiseGain = std::sqrt(squares);
 }
+
+} // namespace dravikHost

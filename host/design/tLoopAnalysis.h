@@ -4,6 +4,8 @@
 
 #include <optional>
 
+namespace dravikHost {
+
 // The closed loop of the law at an interval of T seconds, the spike filter apart. With phase x and
 // frequency offset u,
 //
@@ -23,3 +25,5 @@ struct tLoopAnalysis {
     double overshoot = 0;          // of a step in phase: share by which it goes beyond
     double noiseGain = 0;          // deviation of the clock per deviation of white measurements
 };
+
+} // namespace dravikHost

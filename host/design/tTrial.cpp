@@ -1,12 +1,14 @@
 #include "design/tTrial.h"
 
-#include "clocks/tSimulatedClock.h"
-#include "loop/tLockObserver.h"
+#include "clocks/tSteeredClock.h"
+#include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
 #include "sources/tSimulatedSource.h"
 
 #include <algorithm>
 #include <cmath>
+
+namespace dravikHost {
 
 namespace {
 
@@ -105,3 +107,5 @@ tTrialOptions trialFor(const tLoopGains& gains, const tNoiseModel& model)
     const auto counted = static_cast<int64_t>(std::clamp(200 * timeConstant, 2000.0, 10000.0));
     return {settling, counted, 32};
 }
+
+} // namespace dravikHost

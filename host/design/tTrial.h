@@ -7,6 +7,8 @@
 #include <cstdint>
 #include <string>
 
+namespace dravikHost {
+
 // What a document is worth: simulations through the plug-in, whole parts per billion and whole
 // nanoseconds included. The lock is acquired without noise, so what counts is how it is held.
 struct tTrialOptions {
@@ -28,3 +30,5 @@ tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
 
 // Enough pairs for a loop of such gains to settle and to show its error.
 tTrialOptions trialFor(const tLoopGains& gains, const tNoiseModel& model);
+
+} // namespace dravikHost

@@ -1,9 +1,21 @@
 #pragma once
 
-#include "doctor/tFinding.h"
-
 #include <string>
 #include <vector>
+
+namespace dravikHost {
+
+// One line of what was looked at.
+struct tFinding {
+    enum tGrade {
+        kGood,
+        kLook, // works, but perhaps not as wished
+        kFault
+    } grade;
+    const char* topic;
+    std::string text;
+};
+using tFindings = std::vector<tFinding>;
 
 // The plug-in: whether it loads, works and finds its default documents.
 tFindings servoFindings(const std::string& libraryFile);
@@ -16,3 +28,5 @@ tFindings ptpClockFindings(std::vector<std::string> devices);
 
 // What this process may do.
 tFindings permissionFindings();
+
+} // namespace dravikHost

@@ -9,6 +9,8 @@
 #include <fstream>
 #include <system_error>
 
+namespace dravikHost {
+
 namespace fs = std::filesystem;
 
 namespace {
@@ -66,3 +68,5 @@ tFindings ptpClockFindings(std::vector<std::string> devices)
         findings.push_back(look(device));
     return findings;
 }
+
+} // namespace dravikHost

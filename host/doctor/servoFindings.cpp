@@ -1,14 +1,52 @@
 #include "clocks/tSteeredClock.h"
 #include "doctor/findings.h"
-#include "doctor/loggedDuring.h"
 #include "servo/tuning.h"
+#include "text/files.h"
 
 #include <fmt/format.h>
 
+#include <cerrno>
+#include <cstdio>
 #include <ctime>
 #include <exception>
+#include <functional>
+#include <string>
+#include <syslog.h>
+#include <system_error>
+
+namespace dravikHost {
 
 namespace {
+
+// What a library writes to the system log meanwhile, which is its only way to say where it looks.
+// Exceptions of the action are caught; their text is in failure.
+struct tLogged {
+    std::string log;
+    std::string failure; // "": none
+};
+
+// The C library copies the system log to the standard error output on request, and that can be led
+// into a file.
+tLogged loggedDuring(const std::function<void()>& action)
+{
+    const tFile file(std::tmpfile());
+    const tDescriptor standardError(dup(STDERR_FILENO));
+    if (!file || standardError.get() < 0)
+        throw std::system_error(errno, std::generic_category(), "cannot catch the system log");
+    openlog("dravik-host", LOG_PERROR, LOG_USER);
+    dup2(fileno(file.get()), STDERR_FILENO);
+    tLogged logged;
+    try {
+        action();
+    } catch (const std::exception& failure) {
+        logged.failure = failure.what();
+    }
+    dup2(standardError.get(), STDERR_FILENO);
+    closelog();
+    std::rewind(file.get());
+    logged.log = readToEnd(file.get(), "the system log");
+    return logged;
+}
 
 // As the plug-in says in the system log: "... configuration from: FILE".
 std::string fileIn(const std::string& log)
@@ -22,7 +60,7 @@ std::string fileIn(const std::string& log)
 
 tFinding documentFinding(const tServoLibrary& library, const std::string& referenceType)
 {
-    tSteeredClock clock(0, 0, 0); // stands still: there are no pairs
+    tStillClock clock;
     tServoHost host(library, clock);
     tTuning tuning;
     tuning.referenceType = referenceType;
@@ -40,7 +78,7 @@ tFinding documentFinding(const tServoLibrary& library, const std::string& refere
 
 void addServo(tFindings& findings, const tServoLibrary& library)
 {
-    tSteeredClock clock(0, 0, 0);
+    tStillClock clock;
     tServoHost host(library, clock);
     host.writeConfig(host.readConfig());
     findings.push_back({tFinding::kGood, "servo", "starts, and takes the document that it gives"});
@@ -68,3 +106,5 @@ tFindings servoFindings(const std::string& libraryFile)
     }
     return findings;
 }
+
+} // namespace dravikHost

@@ -2,70 +2,77 @@
 
 #include "clocks/tSteeredClock.h"
 
+namespace dravikHost {
+
 namespace {
 
-// The servo's calls while it was made are noted before it is tuned.
-tServoHost& tuned(tServoHost& host, tTrace& trace, tSummary& summary, const tTuning& tuning)
+tServoHost& tuned(tServoHost& host, const tTuning& tuning)
 {
-    trace.addCalls(0, host.calls());
-    summary.addCalls(host.calls());
     tune(host, tuning);
     return host;
 }
 
 } // namespace
 
-tDiscipline::tDiscipline(const tServoLibrary& plugIn, iClock& clock,
-                         const tDisciplineOptions& given)
-    : library(plugIn), options(given), trace(options.csv, options.dryRun),
-      report(options.csv == "-"), host(library, clock),
-      observer(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
-      later(tuned(host, trace, summary, options.tuning), options.later)
+tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
+                         const tDisciplineOptions& options)
+    : library(library), options(options), host(library, clock), callsThatMadeIt(host.calls()),
+      lock(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
+      later(tuned(host, options.tuning), options.later), inForcePpb(clock.offsetPpb())
 {}
 
-void tDiscipline::start(const std::string& scenario) { report.print(scenario + "\n"); }
-
-void tDiscipline::take(const tPair& pair)
+tStep tDiscipline::take(const tPair& pair)
 {
-    trace.addPair(pair);
-    if (spacing.holdsBack(pair.elapsedNs)) {
-        summary.addHeldBack(pair);
-        return;
-    }
-    adjust(pair);
-    const tLockEvent event = observer.observe(host.calls());
-    spacing.given(pair.elapsedNs, event, observer.measuring());
-    summary.addCalls(host.calls());
-    summary.addPair(pair, event, observer.locked());
-    report.event(pair, event, host.calls());
-    report.note(pair.elapsedNs, later.observe(host, pair.elapsedNs, observer.locked()));
-    report.progress(pair, observer.locked());
+    tStep step;
+    step.pair = pair;
+    step.heldBack = spacing.holdsBack(pair.elapsedNs);
+    if (!step.heldBack) hand(pair, step);
+    step.locked = lock.locked();
+    step.inForcePpb = inForcePpb;
+    step.steps = steps;
+    step.locksLost = locksLost;
+    return step;
 }
 
-// What the clock was asked is noted also if the plug-in then failed.
-void tDiscipline::adjust(const tPair& pair)
+// What the clock was asked is part of the step also if the plug-in then failed.
+void tDiscipline::hand(const tPair& pair, tStep& step)
 {
     try {
         host.adjustTime(pair.referenceNs, pair.clockNs);
     } catch (...) {
-        trace.addCalls(pair.elapsedNs, host.calls());
-        trace.flush();
-        throw;
+        step.failure = std::current_exception();
     }
-    trace.addCalls(pair.elapsedNs, host.calls());
+    step.calls = host.calls();
+    followOrders(step);
+    if (step.failure) return;
+    step.event = lock.observe(step.calls);
+    spacing.given(pair.elapsedNs, step.event, lock.measuring());
+    if (step.event == kLockLost) ++locksLost;
+    step.tuning = later.observe(host, pair.elapsedNs, lock.locked());
+}
+
+void tDiscipline::followOrders(tStep& step)
+{
+    if (options.dryRun) return;
+    for (const tHostCall& call : step.calls) {
+        if (call.operation == kSetFrequency) inForcePpb = static_cast<double>(call.value);
+        if (call.operation != kStepTime) continue;
+        step.stepNs += call.value;
+        ++steps;
+    }
 }
 
 void tDiscipline::clearHistory()
 {
     host.clearHistory();
-    if (observer.locked()) summary.addLostLock();
-    observer.restart();
+    if (lock.locked()) ++locksLost;
+    lock.restart();
     spacing.restart();
 }
 
 void tDiscipline::retune()
 {
-    tSteeredClock still(0, 0, 0);
+    tStillClock still;
     tServoHost trial(library, still);
     tune(trial, options.tuning);
     tLaterDocuments anew(trial, options.later);
@@ -74,16 +81,19 @@ void tDiscipline::retune()
     later = anew;
 }
 
-void tDiscipline::finish()
+void disciplineAll(tDiscipline& discipline, iPairSource& source, const std::string& scenario,
+                   iStepObserver& observers)
 {
-    report.print(summary.text());
-    trace.flush();
+    observers.begin(scenario, discipline.firstCalls());
+    while (const auto pair = source.next())
+        show(discipline.take(*pair), observers);
+    observers.end("");
 }
 
-void tDiscipline::run(const std::string& scenario, iPairSource& source)
+void show(const tStep& step, iStepObserver& observers)
 {
-    start(scenario);
-    while (const auto pair = source.next())
-        take(*pair);
-    finish();
+    observers.see(step);
+    if (step.failure) std::rethrow_exception(step.failure);
 }
+
+} // namespace dravikHost

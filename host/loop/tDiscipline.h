@@ -1,30 +1,40 @@
 #pragma once
 
 #include "clocks/iClock.h"
-#include "loop/disciplineOptions.h"
 #include "loop/tLaterDocuments.h"
-#include "loop/tLockObserver.h"
 #include "loop/tMeasureSpacing.h"
-#include "loop/tReport.h"
-#include "loop/tSummary.h"
-#include "loop/tTrace.h"
+#include "loop/tStep.h"
+#include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
-#include "sources/iPairSource.h"
+#include "servo/tuning.h"
 
 #include <string>
+#include <vector>
 
-// A clock under discipline, and what people see of it: tunes the servo, hands it pair after pair
-// and reports what happens. Throws std::runtime_error at the first failure, once all that led to it
-// is in the CSV file.
+namespace dravikHost {
+
+// What every verb that disciplines a clock has.
+struct tDisciplineOptions {
+    int32_t maxFrequencyOffsetPpb = 0;
+    int64_t measureOverNs = 0;
+    std::vector<tLaterDocument> later; // in the order of their times
+    std::string csv;                   // "": none; "-": stdout
+    bool dryRun = false;               // no order reaches the clock
+    tTuning tuning;
+    std::string library;
+};
+
+// A clock under discipline: a tuned servo is handed pair after pair, and each becomes one step.
 class tDiscipline
 {
 public:
-    // All are borrowed.
+    // All are borrowed. Throws std::runtime_error if the servo cannot be made or tuned.
     tDiscipline(const tServoLibrary& library, iClock& clock, const tDisciplineOptions& options);
 
-    void start(const std::string& scenario); // one line for people, without its end
-    void take(const tPair& pair);
-    void finish();
+    // The calls that made the servo.
+    const tHostCalls& firstCalls() const { return callsThatMadeIt; }
+
+    tStep take(const tPair& pair);
 
     // Lets the servo measure anew, as if it had just been made, with its tuning.
     void clearHistory();
@@ -33,24 +43,28 @@ public:
     // is as it was.
     void retune();
 
-    void note(int64_t elapsedNs, const std::string& text) { report.note(elapsedNs, text); }
-    bool locked() const { return observer.locked(); }
-    const tSummary& figures() const { return summary; }
-    tReport& reporter() { return report; }
-
-    // All pairs of a source between start and finish.
-    void run(const std::string& scenario, iPairSource& source);
-
 private:
-    void adjust(const tPair& pair);
+    void hand(const tPair& pair, tStep& step);
+    void followOrders(tStep& step);
 
     const tServoLibrary& library;
     const tDisciplineOptions& options;
-    tTrace trace;
-    tReport report;
-    tSummary summary;
     tServoHost host;
-    tLockObserver observer;
+    tHostCalls callsThatMadeIt;
+    tLockObserver lock;
     tMeasureSpacing spacing;
     tLaterDocuments later;
+    double inForcePpb;
+    int64_t steps = 0;
+    int64_t locksLost = 0;
 };
+
+// All pairs of a source, one step each. Throws std::runtime_error at the first failure of the
+// servo, once the observers have seen it.
+void disciplineAll(tDiscipline& discipline, iPairSource& source, const std::string& scenario,
+                   iStepObserver& observers);
+
+// Shows a step, and throws its failure if there is one.
+void show(const tStep& step, iStepObserver& observers);
+
+} // namespace dravikHost

@@ -4,6 +4,8 @@
 
 #include <fmt/format.h>
 
+namespace dravikHost {
+
 // Every document is applied once before the first pair: a file that would be refused in the middle
 // of a run is refused at its start.
 tLaterDocuments::tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& options)
@@ -32,3 +34,5 @@ std::string tLaterDocuments::observe(tServoHost& servo, int64_t elapsedNs, bool 
     servo.writeConfig(next.text);
     return fmt::format("tuned by {}", next.option.file);
 }
+
+} // namespace dravikHost

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace dravikHost {
+
 // A document for a servo that has been locked for some time.
 struct tLaterDocument {
     int64_t afterNs; // from the moment of the lock
@@ -38,3 +40,5 @@ private:
     size_t applied = 0;
     std::optional<int64_t> lockedSinceNs;
 };
+
+} // namespace dravikHost

@@ -6,17 +6,19 @@
 
 #include <stdexcept>
 
-tLiveRun::tLiveRun(const tServoLibrary& plugIn, iClock& guarded, tSignals& watched,
-                   const tLiveRunOptions& given)
-    : signals(watched), options(given), clock(guarded, options.guards, options.discipline.dryRun),
-      discipline(plugIn, clock, options.discipline),
-      heldPpb(options.discipline.dryRun ? guarded.offsetPpb() : 0), sanity(options.sanityLimitPpb),
-      holdover(options.silenceNs), monitor(options.monitor)
+namespace dravikHost {
+
+tLiveRun::tLiveRun(const tServoLibrary& library, iClock& clock, tSignals& signals,
+                   const tLiveRunOptions& options, iStepObserver& observers)
+    : signals(signals), options(options), observers(observers),
+      guarded(
+          clock, [this](int64_t deltaNs) { requireStep(deltaNs); }, options.discipline.dryRun),
+      discipline(library, guarded, options.discipline), sanity(options.sanityLimitPpb)
 {}
 
 void tLiveRun::run(const std::string& scenario, iLiveSource& source)
 {
-    discipline.start(scenario);
+    observers.begin(scenario, discipline.firstCalls());
     while (const auto moment = source.next()) {
         if (signals.takeReload()) reload(moment->elapsedNs);
         if (moment->pair) {
@@ -25,82 +27,76 @@ void tLiveRun::run(const std::string& scenario, iLiveSource& source)
             silence(moment->elapsedNs);
         }
     }
-    const std::string remarks = source.remarks();
-    if (!remarks.empty()) discipline.reporter().print(remarks + "\n");
-    discipline.finish();
+    observers.end(source.remarks());
+}
+
+// A step that a guard refuses ends the run: so large an offset is for a person to judge.
+void tLiveRun::requireStep(int64_t deltaNs) const
+{
+    if (options.maxStepNs && (deltaNs > *options.maxStepNs || deltaNs < -*options.maxStepNs)) {
+        throw std::runtime_error(fmt::format("a step by {} is larger than --max-step allows, {}",
+                                             signedDurationText(deltaNs),
+                                             signedDurationText(*options.maxStepNs)));
+    }
+    if (options.noStepAfterLock && hadLock) {
+        throw std::runtime_error(
+            fmt::format("a step by {} after the first lock", signedDurationText(deltaNs)));
+    }
 }
 
 void tLiveRun::take(const tPair& pair)
 {
-    endHoldover(pair);
-    const std::string wrong =
-        sanity.look(pair.elapsedNs, pair.referenceNs, pair.clockNs, clock.steppedNs());
-    if (!wrong.empty()) {
-        discipline.note(pair.elapsedNs, wrong + ": measuring anew");
-        discipline.clearHistory();
-    }
-    const int64_t steppedNs = clock.steppedNs();
-    discipline.take(pair);
-    clock.setLocked(discipline.locked());
-    holdover.pair(pair, discipline.locked(), inForcePpb());
-    tRunMonitor::tState now = state(pair.elapsedNs);
-    now.stepped = clock.steppedNs() != steppedNs;
-    monitor.pair(pair, now, discipline.reporter());
+    endSilence(pair);
+    checkSanity(pair);
+    const tStep step = discipline.take(pair);
+    hadLock = hadLock || step.locked;
+    steppedNs += step.stepNs;
+    estimate.see(step);
+    show(step, observers);
 }
 
 // What was measured before a long silence says nothing of the clock after it.
-void tLiveRun::endHoldover(const tPair& pair)
+void tLiveRun::endSilence(const tPair& pair)
 {
-    if (!holdover.lasting()) return;
-    const int64_t lengthNs = holdover.lengthNs(pair.elapsedNs);
+    const int64_t lengthNs = pair.elapsedNs - latestNs;
+    latestNs = pair.elapsedNs;
+    if (!inHoldover) return;
+    inHoldover = false;
     const bool tooLong = lengthNs >= options.longHoldoverNs;
-    discipline.note(pair.elapsedNs, fmt::format("reference is back after {}{}",
-                                                durationText(static_cast<double>(lengthNs)),
-                                                tooLong ? ": measuring anew" : ""));
+    observers.note(pair.elapsedNs,
+                   fmt::format("reference is back after {}{}", durationText(lengthNs),
+                               tooLong ? ": measuring anew" : ""));
     if (tooLong) discipline.clearHistory();
+}
+
+void tLiveRun::checkSanity(const tPair& pair)
+{
+    const std::string wrong = sanity.look(pair, steppedNs);
+    if (wrong.empty()) return;
+    observers.note(pair.elapsedNs, wrong + ": measuring anew");
+    discipline.clearHistory();
 }
 
 void tLiveRun::silence(int64_t elapsedNs)
 {
-    if (holdover.silent(elapsedNs)) {
-        discipline.note(elapsedNs, "reference is silent: holding the frequency");
+    const int64_t lengthNs = elapsedNs - latestNs;
+    if (!inHoldover && lengthNs >= options.silenceNs) {
+        inHoldover = true;
+        observers.note(elapsedNs, "reference is silent: holding the frequency");
     }
-    if (holdover.lasting()) {
-        const auto error = holdover.errorNs(elapsedNs);
-        discipline.reporter().progressText(
-            fmt::format("{:>10} s  holdover for {}, error about {}", secondsText(elapsedNs, 3),
-                        durationText(static_cast<double>(holdover.lengthNs(elapsedNs))),
-                        error ? durationText(*error) : "unknown"));
-    }
-    monitor.silence(elapsedNs, state(elapsedNs), discipline.reporter());
+    tSilence silence{elapsedNs, {}, {}};
+    if (inHoldover) silence = {elapsedNs, lengthNs, estimate.errorNs(lengthNs)};
+    observers.see(silence);
 }
 
 void tLiveRun::reload(int64_t elapsedNs)
 {
     try {
         discipline.retune();
-        discipline.note(elapsedNs, "documents read again");
+        observers.note(elapsedNs, "documents read again");
     } catch (const std::runtime_error& failure) {
-        discipline.note(elapsedNs, fmt::format("documents stay as they are: {}", failure.what()));
+        observers.note(elapsedNs, fmt::format("documents stay as they are: {}", failure.what()));
     }
 }
 
-double tLiveRun::inForcePpb() const
-{
-    return options.discipline.dryRun ? heldPpb : discipline.figures().orderedPpb();
-}
-
-tRunMonitor::tState tLiveRun::state(int64_t elapsedNs) const
-{
-    const tSummary& figures = discipline.figures();
-    tRunMonitor::tState state;
-    state.locked = discipline.locked();
-    state.inForcePpb = inForcePpb();
-    state.pairs = figures.pairsTaken();
-    state.locksLost = figures.lostLocks();
-    state.steps = figures.steps();
-    if (!holdover.lasting()) return state;
-    state.holdoverNs = holdover.lengthNs(elapsedNs);
-    state.holdoverErrorNs = holdover.errorNs(elapsedNs);
-    return state;
-}
+} // namespace dravikHost

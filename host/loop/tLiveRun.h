@@ -2,49 +2,54 @@
 
 #include "clocks/tGuardedClock.h"
 #include "loop/tDiscipline.h"
-#include "loop/tHoldover.h"
-#include "loop/tRunMonitor.h"
+#include "loop/tHoldoverEstimate.h"
 #include "loop/tSanityCheck.h"
-#include "loop/tSignals.h"
-#include "sources/iLiveSource.h"
+#include "sources/tSignals.h"
 
 #include <string>
 
+namespace dravikHost {
+
 struct tLiveRunOptions {
     tDisciplineOptions discipline;
-    tClockGuards guards;
-    tRunMonitor::tOptions monitor;
+    std::optional<int64_t> maxStepNs; // either way; a larger one ends the run
+    bool noStepAfterLock = false;     // after the first lock a step ends the run
     double sanityLimitPpb = 0;
     int64_t silenceNs = 0;      // after which it is a holdover
     int64_t longHoldoverNs = 0; // after which the servo begins anew
 };
 
-// A discipline in real time: a reference that may fall silent or leap, a clock that others may
-// touch, people and agents that watch, and documents that change.
+// A discipline in real time, and its policy: what becomes of a reference that falls silent or
+// leaps, of a clock that others touch, of steps that nobody wants, and of documents that change.
 class tLiveRun
 {
 public:
     // All are borrowed.
     tLiveRun(const tServoLibrary& library, iClock& clock, tSignals& signals,
-             const tLiveRunOptions& options);
+             const tLiveRunOptions& options, iStepObserver& observers);
 
     // Until the source ends.
     void run(const std::string& scenario, iLiveSource& source);
 
 private:
+    void requireStep(int64_t deltaNs) const;
     void take(const tPair& pair);
-    void endHoldover(const tPair& pair);
+    void endSilence(const tPair& pair);
+    void checkSanity(const tPair& pair);
     void silence(int64_t elapsedNs);
     void reload(int64_t elapsedNs);
-    double inForcePpb() const;
-    tRunMonitor::tState state(int64_t elapsedNs) const;
 
     tSignals& signals;
     const tLiveRunOptions& options;
-    tGuardedClock clock;
+    iStepObserver& observers;
+    tGuardedClock guarded;
     tDiscipline discipline;
-    double heldPpb; // in a dry run the offset stays what it is
     tSanityCheck sanity;
-    tHoldover holdover;
-    tRunMonitor monitor;
+    tHoldoverEstimate estimate;
+    bool hadLock = false;
+    int64_t steppedNs = 0; // the sum of all steps
+    int64_t latestNs = 0;  // when the latest pair came
+    bool inHoldover = false;
 };
+
+} // namespace dravikHost

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 
+namespace dravikHost {
+
 void tRunningFigures::add(const tPair& pair, double orderedPpb)
 {
     if (pairs++ == 0) firstPpb = orderedPpb;
@@ -30,3 +32,5 @@ double tRunningFigures::deviationPpb() const
     const double mean = sum / static_cast<double>(pairs);
     return std::sqrt(std::max(0.0, sumOfSquares / static_cast<double>(pairs) - mean * mean));
 }
+
+} // namespace dravikHost

@@ -4,6 +4,8 @@
 
 #include <cstdint>
 
+namespace dravikHost {
+
 // Errors and frequencies over a stretch of a run.
 class tRunningFigures
 {
@@ -24,3 +26,5 @@ private:
     double sum = 0;
     double sumOfSquares = 0;
 };
+
+} // namespace dravikHost

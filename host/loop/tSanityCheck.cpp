@@ -1,20 +1,20 @@
 #include "loop/tSanityCheck.h"
 
-#include "text/quantity.h"
-
 #include <fmt/format.h>
 
 #include <cmath>
 
-std::string tSanityCheck::look(int64_t rawNs, uint64_t referenceNs, uint64_t clockNs,
-                               int64_t steppedNs)
+namespace dravikHost {
+
+std::string tSanityCheck::look(const tPair& pair, int64_t steppedNs)
 {
-    const tMoments now = {rawNs, referenceNs, clockNs - static_cast<uint64_t>(steppedNs)};
+    const tMoments now = {pair.elapsedNs, pair.referenceNs,
+                          pair.clockNs - static_cast<uint64_t>(steppedNs)};
     std::string wrong;
     if (last) {
-        const int64_t passedNs = now.rawNs - last->rawNs;
-        wrong = compare("the reference", now.referenceNs - last->referenceNs, passedNs);
-        if (wrong.empty()) wrong = compare("the clock", now.clockNs - last->clockNs, passedNs);
+        const int64_t rawNs = now.rawNs - last->rawNs;
+        wrong = compare("the reference", now.referenceNs - last->referenceNs, rawNs);
+        if (wrong.empty()) wrong = compare("the clock", now.clockNs - last->clockNs, rawNs);
     }
     last = now;
     return wrong;
@@ -29,3 +29,5 @@ std::string tSanityCheck::compare(const char* name, uint64_t passedNs, int64_t r
     return fmt::format("{} leapt by {} against CLOCK_MONOTONIC_RAW", name,
                        signedDurationText(leapNs));
 }
+
+} // namespace dravikHost

@@ -1,19 +1,23 @@
 #pragma once
 
-#include <cstdint>
+#include "sources/iPairSource.h"
+#include "text/quantity.h"
+
 #include <optional>
 #include <string>
 
+namespace dravikHost {
+
 // Watches reference and clock against CLOCK_MONOTONIC_RAW, which nobody steers or steps: either of
-// them may be off by a rate, but what leaps is not what it says to be.
+// them may be off by a rate, but neither may leap.
 class tSanityCheck
 {
 public:
-    explicit tSanityCheck(double limitPpb) : limit(limitPpb * 1e-9) {}
+    explicit tSanityCheck(double limitPpb) : limit(secondsOf(limitPpb)) {}
 
-    // Moments of one pair; what the servo itself has stepped the clock by in all is taken out.
-    // Returns what is wrong with it, for people; mostly "".
-    std::string look(int64_t rawNs, uint64_t referenceNs, uint64_t clockNs, int64_t steppedNs);
+    // A pair's elapsed time is CLOCK_MONOTONIC_RAW's. The servo's own steps of the clock, their sum
+    // so far, are taken out. Returns what is wrong with it, for people; mostly "".
+    std::string look(const tPair& pair, int64_t steppedNs);
 
 private:
     struct tMoments {
@@ -23,6 +27,8 @@ private:
     };
     std::string compare(const char* name, uint64_t passedNs, int64_t rawNs) const;
 
-    double limit;
+    double limit; // a fraction
     std::optional<tMoments> last;
 };
+
+} // namespace dravikHost

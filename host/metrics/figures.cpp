@@ -2,12 +2,15 @@
 
 #include "metrics/stability.h"
 #include "text/quantity.h"
+#include "text/words.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
 #include <cmath>
 #include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
@@ -58,7 +61,7 @@ tFigure parseFigure(const std::string& text)
     if (open == std::string::npos && plain != nullptr) return {name, 0, plain->isTime};
     if (open != std::string::npos && text.back() == ')' && overTau != nullptr) {
         const std::string tau = text.substr(open + 1, text.size() - open - 2);
-        return {name, parseQuantity(tau, kDuration) * 1e-9, overTau->isTime};
+        return {name, secondsOf(parseQuantity(tau, kDuration)), overTau->isTime};
     }
     throw std::invalid_argument(fmt::format(
         "'{}' is none of rms, peak, peak-to-peak, mean, time-to-lock, locks-lost, nor adev, oadev, "
@@ -81,3 +84,33 @@ std::optional<double> valueOf(const tFigure& figure, const tMeasured& measured)
         return std::nullopt;
     return stabilityAt(measured.series, static_cast<size_t>(std::llround(n))).*overTau->value;
 }
+
+tAssertion::tAssertion(const std::string& text) : text(text)
+{
+    const size_t at = text.find_first_of("<>");
+    if (at == std::string::npos)
+        throw std::invalid_argument(fmt::format("'{}' is not FIGURE<LIMIT", text));
+    figure = parseFigure(text.substr(0, at));
+    less = text[at] == '<';
+    orEqual = text.compare(at + 1, 1, "=") == 0;
+    const std::string value = text.substr(at + (orEqual ? 2 : 1));
+    if (figure.isTime) {
+        limit = secondsOf(parseQuantity(value, kDuration));
+        return;
+    }
+    const auto number = numberIn<double>(value);
+    if (!number) throw std::invalid_argument(fmt::format("'{}' is no plain number", value));
+    limit = *number;
+}
+
+std::string tAssertion::failure(const tMeasured& measured) const
+{
+    const auto found = valueOf(figure, measured);
+    if (!found) return fmt::format("{} cannot be told from these data", text);
+    const bool holds = (less ? *found < limit : *found > limit) || (orEqual && *found == limit);
+    if (holds) return "";
+    return fmt::format("{} does not hold: it is {}", text,
+                       figure.isTime ? durationText(nsOf(*found)) : fmt::format("{:.4g}", *found));
+}
+
+} // namespace dravikHost

@@ -9,6 +9,8 @@
 #include <numeric>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace {
 
 // Limits in ns; 0: there is none. The low-passed ones are of the error behind a filter of 0.1 Hz,
@@ -52,13 +54,13 @@ double largestNs(const std::vector<double>& errors)
     double largest = 0;
     for (const double error : errors)
         largest = std::max(largest, std::fabs(error));
-    return largest * 1e9;
+    return nsOf(largest);
 }
 
 double peakToPeakNs(const std::vector<double>& errors)
 {
     const auto extremes = std::minmax_element(errors.begin(), errors.end());
-    return (*extremes.second - *extremes.first) * 1e9;
+    return nsOf(*extremes.second - *extremes.first);
 }
 
 // Octaves, and the longest tau up to the mask's end that a figure may be told for.
@@ -83,7 +85,7 @@ std::optional<double> largestMeanNs(const tSeries& series, double seconds)
     double largest = 0;
     for (size_t end = n; end < sums.size(); ++end)
         largest = std::max(largest, std::fabs(sums[end] - sums[end - n]));
-    return largest / static_cast<double>(n) * 1e9;
+    return nsOf(largest / static_cast<double>(n));
 }
 
 // The largest share of its limit that a figure takes over the taus of a mask.
@@ -103,7 +105,7 @@ std::optional<tWorst> worstOf(const tSeries& series, std::optional<double> tStab
         if (n < 1 || tau < kShortestTau || tau > longestTau) continue;
         const auto found = stabilityAt(series, n).*figure;
         if (!found) continue;
-        const tWorst here = {tau, *found * 1e9, limitNs(tau)};
+        const tWorst here = {tau, nsOf(*found), limitNs(tau)};
         if (!worst || here.foundNs * worst->limitNs > worst->foundNs * here.limitNs) worst = here;
     }
     return worst;
@@ -114,7 +116,7 @@ tMaskLine comparedWorst(const std::string& limit, const std::optional<tWorst>& w
     if (!worst) return {limit, "too few points", tMaskLine::kNotChecked};
     const bool held = worst->foundNs <= worst->limitNs;
     return {limit,
-            fmt::format("{} at {}", durationText(worst->foundNs), durationText(worst->tau * 1e9)),
+            fmt::format("{} at {}", durationText(worst->foundNs), durationText(nsOf(worst->tau))),
             held ? tMaskLine::kHeld : tMaskLine::kBroken};
 }
 
@@ -221,3 +223,5 @@ std::vector<tMaskLine> checkMask(const std::string& name, const tMeasured& measu
     }
     return lines;
 }
+
+} // namespace dravikHost

@@ -7,6 +7,8 @@
 #include <string>
 #include <vector>
 
+namespace dravikHost {
+
 // One limit of a mask, and what was found.
 struct tMaskLine {
     std::string limit; // in words
@@ -38,3 +40,5 @@ tSeries behindMaskFilter(const tSeries& series);
 
 // Compares the phase error with one of them.
 std::vector<tMaskLine> checkMask(const std::string& name, const tMeasured& measured);
+
+} // namespace dravikHost

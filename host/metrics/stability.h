@@ -1,8 +1,27 @@
 #pragma once
 
-#include "metrics/tSeries.h"
-
 #include <optional>
+#include <vector>
+
+namespace dravikHost {
+
+// A phase error, evenly spaced.
+struct tSeries {
+    double interval = 0;       // s
+    std::vector<double> phase; // s
+};
+
+// The phase of a frequency, a fraction for each interval: one point more.
+tSeries phaseOf(const tSeries& frequency);
+
+// Without the straight line from the first point to the last.
+tSeries withoutSlope(const tSeries& series);
+
+// Through a first-order filter of that corner, in Hz, that starts at the first point.
+tSeries lowPass(const tSeries& series, double corner);
+
+// What that takes away.
+tSeries highPass(const tSeries& series, double corner);
 
 // How stable a phase is over tau, n intervals. Nothing if the series is too short for it.
 struct tStability {
@@ -20,3 +39,5 @@ size_t largestAveraging(const tSeries& series);
 
 // 1, 2, 4 ... as far as the series allows.
 std::vector<size_t> octaves(const tSeries& series);
+
+} // namespace dravikHost

@@ -1,7 +1,9 @@
 #include "metrics/tMeasured.h"
 
-#include "text/readText.h"
-#include "traces/fields.h"
+#include "maths/median.h"
+#include "text/files.h"
+#include "text/quantity.h"
+#include "text/words.h"
 
 #include <fmt/format.h>
 
@@ -9,6 +11,8 @@
 #include <cmath>
 #include <numeric>
 #include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
@@ -22,7 +26,7 @@ void lookAtLocks(tMeasured& measured, const std::vector<tRecordedPair>& pairs)
     measured.locksLost = 0;
     for (size_t i = 0; i < pairs.size(); ++i) {
         if (isLocked(pairs[i]) && !measured.timeToLock)
-            measured.timeToLock = static_cast<double>(pairs[i].elapsedNs) * 1e-9;
+            measured.timeToLock = secondsOf(pairs[i].elapsedNs);
         if (i > 0 && isLocked(pairs[i - 1]) && !isLocked(pairs[i])) ++*measured.locksLost;
     }
 }
@@ -47,9 +51,7 @@ int64_t medianSpacingNs(const tPairs& pairs)
     spacings.reserve(pairs.size());
     for (size_t i = 1; i < pairs.size(); ++i)
         spacings.push_back(pairs[i]->elapsedNs - pairs[i - 1]->elapsedNs);
-    const auto middle = spacings.begin() + static_cast<std::ptrdiff_t>(spacings.size() / 2);
-    std::nth_element(spacings.begin(), middle, spacings.end());
-    return *middle;
+    return median(std::move(spacings));
 }
 
 // Moments are rounded in logs, so half of the spacing more or less is still the same one.
@@ -75,7 +77,7 @@ tSeries longestStretch(const tPairs& pairs, const std::vector<double>& errors)
     const auto lengthNs =
         static_cast<double>(pairs[bestEnd - 1]->elapsedNs - pairs[bestStart]->elapsedNs);
     const double intervalNs = lengthNs / static_cast<double>(bestEnd - bestStart - 1);
-    return {intervalNs * 1e-9, {at(bestStart), at(bestEnd)}};
+    return {secondsOf(intervalNs), {at(bestStart), at(bestEnd)}};
 }
 
 } // namespace
@@ -91,13 +93,14 @@ tMeasured measure(const tRecording& recording, const tSelection& selection)
     const bool isTrue = !selection.measured && allTrue;
     tMeasured measured;
     measured.what = isTrue ? "true error" : "measured error";
-    measured.fromSeconds = static_cast<double>(pairs.front()->elapsedNs) * 1e-9;
-    measured.toSeconds = static_cast<double>(pairs.back()->elapsedNs) * 1e-9;
+    measured.fromSeconds = secondsOf(pairs.front()->elapsedNs);
+    measured.toSeconds = secondsOf(pairs.back()->elapsedNs);
     measured.errors.reserve(pairs.size());
     measured.times.reserve(pairs.size());
     for (const tRecordedPair* const pair : pairs) {
-        measured.errors.push_back((isTrue ? pair->trueErrorNs.value_or(0) : pair->errorNs) * 1e-9);
-        measured.times.push_back(static_cast<double>(pair->elapsedNs) * 1e-9);
+        measured.errors.push_back(
+            secondsOf(isTrue ? pair->trueErrorNs.value_or(0) : pair->errorNs));
+        measured.times.push_back(secondsOf(pair->elapsedNs));
     }
     measured.series = longestStretch(pairs, measured.errors);
     lookAtLocks(measured, recording.pairs);
@@ -161,3 +164,5 @@ double tMeasured::peakToPeak() const
     const auto extremes = std::minmax_element(errors.begin(), errors.end());
     return *extremes.second - *extremes.first;
 }
+
+} // namespace dravikHost

@@ -1,10 +1,12 @@
 #pragma once
 
-#include "metrics/tSeries.h"
+#include "metrics/stability.h"
 #include "traces/tRecording.h"
 
 #include <optional>
 #include <string>
+
+namespace dravikHost {
 
 // What of a trace is looked at.
 struct tSelection {
@@ -40,3 +42,5 @@ tMeasured measure(const tRecording& recording, const tSelection& selection);
 // Of a file of numbers, one a line, "#" beginning a comment: phase in seconds, or fractional
 // frequency. Throws std::runtime_error that names a line that is no number.
 tMeasured readNumbers(const std::string& file, double interval, bool frequency);
+
+} // namespace dravikHost

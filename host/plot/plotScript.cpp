@@ -1,7 +1,9 @@
 #include "plot/plotScript.h"
 
+#include "maths/median.h"
 #include "metrics/tMeasured.h"
 #include "plot/stabilityPanels.h"
+#include "text/quantity.h"
 
 #include <fmt/format.h>
 
@@ -9,6 +11,8 @@
 #include <cmath>
 #include <iterator>
 #include <limits>
+
+namespace dravikHost {
 
 namespace {
 
@@ -33,9 +37,9 @@ std::string quoted(const std::string& text)
 void addRow(std::string& rows, const tRecordedPair& pair)
 {
     const double nan = std::nan("");
-    fmt::format_to(std::back_inserter(rows), "{:.9g} {:.6g} {:.9g} {}\n",
-                   static_cast<double>(pair.elapsedNs) * 1e-9, errorOf(pair),
-                   pair.orderedPpb.value_or(nan) / 1e3, pair.locked.value_or(true) ? 0 : 1);
+    fmt::format_to(std::back_inserter(rows), "{:.9g} {:.6g} {:.9g} {}\n", secondsOf(pair.elapsedNs),
+                   errorOf(pair), pair.orderedPpb.value_or(nan) / 1e3,
+                   pair.locked.value_or(true) ? 0 : 1);
 }
 
 // Of a long trace the least and the largest error of each stretch, in their order.
@@ -66,9 +70,7 @@ double typicalErrorNs(const std::vector<tRecordedPair>& pairs)
     errors.reserve(pairs.size());
     for (const tRecordedPair& pair : pairs)
         errors.push_back(std::fabs(errorOf(pair)));
-    const auto middle = errors.begin() + static_cast<std::ptrdiff_t>(errors.size() / 2);
-    std::nth_element(errors.begin(), middle, errors.end());
-    return std::max(*middle, 0.1);
+    return std::max(median(std::move(errors)), 0.1);
 }
 
 // Decades, from the typical error on, up to minutes.
@@ -168,3 +170,5 @@ std::string plotScript(const tRecording& recording, const tPlotOptions& options)
     if (hasStability(series)) script += stabilityPanels(series, options.mask, {0, height});
     return script + "unset multiplot\n";
 }
+
+} // namespace dravikHost

@@ -4,6 +4,8 @@
 
 #include <string>
 
+namespace dravikHost {
+
 struct tPlotOptions {
     std::string picture; // the file that gnuplot writes; its ending, .svg or .png, says what kind
     std::string mask;    // beside the stability curves; "": none
@@ -16,3 +18,5 @@ std::string plotScript(const tRecording& recording, const tPlotOptions& options)
 
 // Whether a picture of that name can be drawn.
 bool isPictureName(const std::string& file);
+
+} // namespace dravikHost

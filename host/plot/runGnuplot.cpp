@@ -1,5 +1,7 @@
 #include "plot/runGnuplot.h"
 
+#include "text/files.h"
+
 #include <cerrno>
 #include <csignal>
 #include <cstdio>
@@ -11,9 +13,9 @@
 #include <system_error>
 #include <unistd.h>
 
-namespace {
+namespace dravikHost {
 
-using tFile = std::unique_ptr<std::FILE, decltype(&std::fclose)>;
+namespace {
 
 // The status of a child that became no other program, where its start told nothing else.
 constexpr int kNotStarted = 127;
@@ -62,8 +64,8 @@ void runGnuplot(const std::string& script)
     int ends[2];
     if (pipe2(ends, O_CLOEXEC) != 0)
         throw std::system_error(errno, std::generic_category(), "cannot make a pipe");
-    tFile output(fdopen(ends[0], "r"), std::fclose);
-    tFile input(fdopen(ends[1], "w"), std::fclose);
+    tFile output(fdopen(ends[0], "r"));
+    tFile input(fdopen(ends[1], "w"));
     const tChild gnuplot(ends[0]);
     output.reset(); // now it is gnuplot's alone, or the pipe would never break
     (void)std::signal(SIGPIPE, SIG_IGN);
@@ -71,3 +73,5 @@ void runGnuplot(const std::string& script)
     input.reset();
     gnuplot.requireSuccess();
 }
+
+} // namespace dravikHost

@@ -1,6 +1,7 @@
 #include "plot/stabilityPanels.h"
 
 #include "metrics/masks.h"
+#include "text/quantity.h"
 
 #include <fmt/format.h>
 
@@ -8,9 +9,11 @@
 #include <cmath>
 #include <iterator>
 
+namespace dravikHost {
+
 namespace {
 
-double nsOf(std::optional<double> seconds) { return seconds.value_or(std::nan("")) * 1e9; }
+double nsOrNan(std::optional<double> seconds) { return nsOf(seconds.value_or(std::nan(""))); }
 
 // One line for each tau: tau in s, TDEV and MTIE in ns, ADEV and MDEV.
 std::string rowsOf(const char* block, const tSeries& series)
@@ -19,7 +22,7 @@ std::string rowsOf(const char* block, const tSeries& series)
     for (const size_t n : octaves(series)) {
         const tStability at = stabilityAt(series, n);
         fmt::format_to(std::back_inserter(text), "{:g} {:.4g} {:.4g} {:.4g} {:.4g}\n",
-                       static_cast<double>(n) * series.interval, nsOf(at.tdev), nsOf(at.mtie),
+                       static_cast<double>(n) * series.interval, nsOrNan(at.tdev), nsOrNan(at.mtie),
                        at.adev.value_or(std::nan("")), at.mdev.value_or(std::nan("")));
     }
     return text + "END\n";
@@ -91,3 +94,5 @@ std::string stabilityPanels(const tSeries& series, const std::string& mask, cons
                   "'ADEV', \\\n    '' using 1:5 with linespoints pt 7 ps 0.4 lc rgb '#9a6700' "
                   "title 'MDEV'\n";
 }
+
+} // namespace dravikHost

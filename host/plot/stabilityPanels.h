@@ -1,8 +1,10 @@
 #pragma once
 
-#include "metrics/tSeries.h"
+#include "metrics/stability.h"
 
 #include <string>
+
+namespace dravikHost {
 
 // Where panels are: fractions of the picture's height.
 struct tPanelRow {
@@ -17,3 +19,5 @@ bool hasStability(const tSeries& series);
 // of a mask unless that is "", and ADEV and MDEV beside them. Throws std::runtime_error if the
 // series is not made for the mask.
 std::string stabilityPanels(const tSeries& series, const std::string& mask, const tPanelRow& row);
+
+} // namespace dravikHost

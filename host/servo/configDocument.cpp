@@ -1,6 +1,6 @@
 #include "servo/configDocument.h"
 
-#include "servo/json.h"
+#include "text/json.h"
 
 #include <fmt/format.h>
 
@@ -10,6 +10,8 @@
 #include <numeric>
 #include <string_view>
 #include <strings.h>
+
+namespace dravikHost {
 
 namespace {
 
@@ -186,3 +188,5 @@ std::vector<std::string> documentNotes(const std::string& document)
     if (hasMore(document)) add("what stands behind the object sets nothing");
     return notes;
 }
+
+} // namespace dravikHost

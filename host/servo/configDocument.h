@@ -3,6 +3,8 @@
 #include <string>
 #include <vector>
 
+namespace dravikHost {
+
 // What a person is told of a configuration document that the plug-in took or refused.
 
 // Why it was refused: the key, its value, what is wrong with it, and which keys had been applied
@@ -13,3 +15,5 @@ std::string refusalText(const std::string& document, const std::string& payload)
 // What a document that was taken does otherwise than it looks: members that set nothing, as they
 // are misspelt or stand there twice, and values that are read as others.
 std::vector<std::string> documentNotes(const std::string& document);
+
+} // namespace dravikHost

@@ -4,6 +4,8 @@
 #include <cstdint>
 #include <vector>
 
+namespace dravikHost {
+
 // The operations of a clock that the plug-in calls, in the order of the table.
 enum tHostOperation {
     kGetTime,
@@ -43,3 +45,5 @@ inline const tHostCall* findCall(const tHostCalls& calls, tHostOperation operati
         if (call.operation == operation) return &call;
     return nullptr;
 }
+
+} // namespace dravikHost

@@ -8,6 +8,8 @@
 #include <exception>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace {
 
 // Code of this host for a failure of its clock; the payload has the reason.
@@ -94,8 +96,8 @@ zvckmservo_HostTable newTable()
 
 } // namespace
 
-tServoHost::tServoHost(const tServoLibrary& plugIn, iClock& clock)
-    : library(plugIn), subject{clock, {}}, table(newTable())
+tServoHost::tServoHost(const tServoLibrary& library, iClock& clock)
+    : library(library), subject{clock, {}}, table(newTable())
 {
     tStatus status;
     const tCurrentScope scope(subject);
@@ -154,3 +156,5 @@ void tServoHost::applyMetaData(const std::string& metaData)
     library.applyMetaData(&table, metaData.c_str(), &status);
     status.check("applyMetaData");
 }
+
+} // namespace dravikHost

@@ -6,12 +6,14 @@
 
 #include <string>
 
+namespace dravikHost {
+
 // One clock under the plug-in's discipline: initialised with the scope, finalised at its end.
 class tServoHost
 {
 public:
     // Library and clock are borrowed. Throws std::runtime_error with the plug-in's code.
-    tServoHost(const tServoLibrary& plugIn, iClock& clock);
+    tServoHost(const tServoLibrary& library, iClock& clock);
     tServoHost(const tServoHost&) = delete; // the plug-in keeps the address of the table
     tServoHost& operator=(const tServoHost&) = delete;
     ~tServoHost();
@@ -41,3 +43,5 @@ private:
     tSubject subject;
     zvckmservo_HostTable table;
 };
+
+} // namespace dravikHost

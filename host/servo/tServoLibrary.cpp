@@ -7,6 +7,8 @@
 #include <filesystem>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace fs = std::filesystem;
 
 namespace {
@@ -51,3 +53,5 @@ template <typename Function> void tServoLibrary::bind(Function& function, const 
 }
 
 void tServoLibrary::tCloser::operator()(void* opened) const { dlclose(opened); }
+
+} // namespace dravikHost

@@ -5,6 +5,8 @@
 #include <memory>
 #include <string>
 
+namespace dravikHost {
+
 // The plug-in, loaded at run time and unloaded at the end of the scope.
 class tServoLibrary
 {
@@ -37,3 +39,5 @@ private:
     };
     std::unique_ptr<void, tCloser> handle;
 };
+
+} // namespace dravikHost

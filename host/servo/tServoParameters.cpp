@@ -1,10 +1,12 @@
 #include "servo/tServoParameters.h"
 
-#include "servo/json.h"
+#include "text/json.h"
 
 #include <fmt/format.h>
 
 #include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
@@ -37,16 +39,15 @@ constexpr tWholeKey kWholes[] = {
 
 std::string tServoParameters::documentText() const
 {
-    std::string text;
+    tJsonObject document;
     for (const tNumberKey& key : kNumbers) {
         const bool isRatio = key.value == &tServoParameters::phaseLockCoefficientA;
         const int digits = isRatio ? 12 : 6; // A - B may be a small part of A
-        text += fmt::format("  \"{}\": {:.{}g},\n", key.name, this->*key.value, digits);
+        document.add(key.name, fmt::format("{:.{}g}", this->*key.value, digits));
     }
     for (const tWholeKey& key : kWholes)
-        text += fmt::format("  \"{}\": {},\n", key.name, this->*key.value);
-    text.resize(text.size() - 2);
-    return "{\n" + text + "\n}\n";
+        document.add(key.name, std::to_string(this->*key.value));
+    return document.lines();
 }
 
 tServoParameters tServoParameters::of(const std::string& document)
@@ -65,3 +66,5 @@ tServoParameters tServoParameters::of(const std::string& document)
         parameters.*key.value = static_cast<int>(number(key.name));
     return parameters;
 }
+
+} // namespace dravikHost

@@ -2,6 +2,8 @@
 
 #include <string>
 
+namespace dravikHost {
+
 // The eleven parameters of a servo.
 struct tServoParameters {
     double frequencyLockGain = 1;
@@ -22,3 +24,5 @@ struct tServoParameters {
     // Of a document with all eleven keys, as the plug-in gives it out. Throws std::runtime_error.
     static tServoParameters of(const std::string& document);
 };
+
+} // namespace dravikHost

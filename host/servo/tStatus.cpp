@@ -1,5 +1,7 @@
 #include "servo/tStatus.h"
 
+#include "text/json.h"
+
 #include <fmt/format.h>
 
 #include <algorithm>
@@ -7,7 +9,8 @@
 #include <cstring>
 #include <stdexcept>
 #include <string>
-#include <string_view>
+
+namespace dravikHost {
 
 namespace {
 
@@ -36,16 +39,6 @@ extern "C" bool hostReallocJson(zverr_Status* status, uint32_t size)
     return true;
 }
 
-std::string toPayload(std::string_view message)
-{
-    std::string text = R"({"message":")";
-    for (const char c : message) {
-        if (c == '"' || c == '\\') text += '\\';
-        text += static_cast<unsigned char>(c) < ' ' ? ' ' : c;
-    }
-    return text + "\"}";
-}
-
 void writePayload(zverr_Status* status, const std::string& text)
 {
     if (!status->reallocJson(status, static_cast<uint32_t>(text.size() + 2))) return;
@@ -72,7 +65,9 @@ void setFailure(zverr_Status* status, int32_t code, const char* message) noexcep
     if (status->code < 0) return;
     status->code = code;
     try {
-        writePayload(status, toPayload(message));
+        writePayload(status, tJsonObject().add("message", jsonQuoted(message)).line());
     } catch (...) { // NOLINT(bugprone-empty-catch): the code stands without its details
     }
 }
+
+} // namespace dravikHost

@@ -4,6 +4,8 @@
 
 #include <string>
 
+namespace dravikHost {
+
 // A status record of this host, with a buffer of its own. It is empty at first.
 struct tStatus : zverr_Status {
     tStatus();
@@ -19,3 +21,5 @@ struct tStatus : zverr_Status {
 
 // Reports a failure in a record of either side, unless it already holds one.
 void setFailure(zverr_Status* status, int32_t code, const char* message) noexcept;
+
+} // namespace dravikHost

@@ -2,10 +2,10 @@
 
 #include "servo/tServoHost.h"
 
-#include <CLI/CLI.hpp>
-
 #include <optional>
 #include <string>
+
+namespace dravikHost {
 
 // What a servo is told before its first pair. Files may be "-", the standard input.
 struct tTuning {
@@ -14,11 +14,11 @@ struct tTuning {
     std::optional<std::string> configFile;
 };
 
-void addTuningOptions(CLI::App& app, tTuning& tuning);
-
 // The metadata come first, so that the document given wins over the default one of their type.
 // Throws std::runtime_error that tells what could not be read, or was refused and why.
 void tune(tServoHost& host, const tTuning& tuning);
 
 // Returns the text of the file.
 std::string applyConfigFile(tServoHost& host, const std::string& path);
+
+} // namespace dravikHost

@@ -2,6 +2,9 @@
 
 #include <cstdint>
 #include <optional>
+#include <string>
+
+namespace dravikHost {
 
 // The time of the reference and of the clock at one moment.
 struct tPair {
@@ -23,3 +26,24 @@ public:
     // Blocks until the next pair is due; nothing at the end.
     virtual std::optional<tPair> next() = 0;
 };
+
+// Now, and what there is.
+struct tLiveMoment {
+    int64_t elapsedNs; // since the start, by CLOCK_MONOTONIC_RAW
+    std::optional<tPair> pair;
+};
+
+// Where pairs come from at the pace of real time, or do not.
+class iLiveSource
+{
+public:
+    virtual ~iLiveSource() = default;
+
+    // Waits for the next pair, but for 100 ms at the most; nothing at the end.
+    virtual std::optional<tLiveMoment> next() = 0;
+
+    // What people should know of it in the end; "": nothing.
+    virtual std::string remarks() const = 0;
+};
+
+} // namespace dravikHost

@@ -3,6 +3,8 @@
 #include <cstdint>
 #include <optional>
 
+namespace dravikHost {
+
 // What a reference said, and when.
 struct tReferenceSample {
     uint64_t systemNs; // CLOCK_REALTIME at that moment
@@ -22,3 +24,5 @@ public:
     // Samples so far that could not be used as they came.
     virtual int64_t unusable() const { return 0; }
 };
+
+} // namespace dravikHost

@@ -5,9 +5,11 @@
 #include "sources/tClockReference.h"
 #include "sources/tSharedMemoryReference.h"
 #include "sources/tSocketReference.h"
-#include "text/afterPrefix.h"
+#include "text/words.h"
 
 #include <charconv>
+
+namespace dravikHost {
 
 namespace {
 
@@ -49,3 +51,5 @@ std::unique_ptr<iReference> openReference(const std::string& name, int64_t inter
     }
     return std::make_unique<tClockReference>(intervalNs, readSystemItself);
 }
+
+} // namespace dravikHost

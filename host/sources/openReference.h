@@ -5,6 +5,8 @@
 #include <memory>
 #include <string>
 
+namespace dravikHost {
+
 // "realtime", "phc:DEVICE", "shm:UNIT" or "sock:PATH".
 bool isReferenceName(const std::string& name);
 
@@ -13,3 +15,5 @@ bool isReadOnDemand(const std::string& name);
 
 // Throws std::runtime_error that names what cannot be opened.
 std::unique_ptr<iReference> openReference(const std::string& name, int64_t intervalNs);
+
+} // namespace dravikHost

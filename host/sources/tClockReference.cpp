@@ -1,14 +1,15 @@
 #include "sources/tClockReference.h"
 
 #include "clocks/systemTime.h"
-#include "sources/nap.h"
 
 #include <system_error>
+
+namespace dravikHost {
 
 // A machine that slept through several readings leaves them out instead of crowding them.
 std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
 {
-    const auto rawNs = [] { return static_cast<int64_t>(systemTimeNs(CLOCK_MONOTONIC_RAW)); };
+    const auto rawNs = [] { return static_cast<int64_t>(rawTimeNs()); };
     if (!dueNs) dueNs = rawNs();
     const int64_t remainingNs = *dueNs - rawNs();
     if (remainingNs > 0) nap(remainingNs < atMostNs ? remainingNs : atMostNs);
@@ -23,3 +24,5 @@ std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
         return std::nullopt;
     }
 }
+
+} // namespace dravikHost

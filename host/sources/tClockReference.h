@@ -1,17 +1,19 @@
 #pragma once
 
-#include "clocks/tCrossReading.h"
+#include "clocks/iClock.h"
 #include "sources/iReference.h"
 
 #include <functional>
 #include <utility>
 
+namespace dravikHost {
+
 // A clock of this machine, read at a pace of our own.
 class tClockReference : public iReference
 {
 public:
-    tClockReference(int64_t paceNs, std::function<tCrossReading()> crossReader)
-        : intervalNs(paceNs), reader(std::move(crossReader))
+    tClockReference(int64_t intervalNs, std::function<tCrossReading()> reader)
+        : intervalNs(intervalNs), reader(std::move(reader))
     {}
 
     // A reading that fails is a reference that is silent.
@@ -24,3 +26,5 @@ private:
     std::optional<int64_t> dueNs; // by CLOCK_MONOTONIC_RAW
     int64_t failures = 0;
 };
+
+} // namespace dravikHost

@@ -1,6 +1,6 @@
 #include "sources/tLiveSource.h"
 
-#include "clocks/systemTime.h"
+#include "text/quantity.h"
 
 #include <fmt/format.h>
 
@@ -8,10 +8,12 @@
 #include <cmath>
 #include <cstdlib>
 
-tLiveSource::tLiveSource(iLiveClock& liveClock, iReference& liveReference, const tSignals& watched,
-                         const tOptions& given)
-    : clock(liveClock), reference(liveReference), signals(watched), options(given),
-      startRawNs(systemTimeNs(CLOCK_MONOTONIC_RAW))
+namespace dravikHost {
+
+tLiveSource::tLiveSource(iLiveClock& clock, iReference& reference, const tSignals& signals,
+                         const tOptions& options)
+    : clock(clock), reference(reference), signals(signals), options(options),
+      startRawNs(options.rawNs())
 {}
 
 // A signal may also come between the test and the wait, where it interrupts nothing: hence naps.
@@ -48,7 +50,7 @@ std::string tLiveSource::remarks() const
 
 int64_t tLiveSource::elapsedNs() const
 {
-    return static_cast<int64_t>(systemTimeNs(CLOCK_MONOTONIC_RAW) - startRawNs);
+    return static_cast<int64_t>(options.rawNs() - startRawNs);
 }
 
 tLiveSource::tMoment tLiveSource::crossRead()
@@ -70,7 +72,6 @@ bool tLiveSource::ranEvenly(const tMoment& now) const
 // The clock has run evenly since it was last ordered anything.
 tPair tLiveSource::pairAt(const tReferenceSample& sample, const tMoment& now) const
 {
-    constexpr double kSecondNs = 1e9;
     const tCrossReading& from = ordered->reading;
     const tCrossReading& to = now.reading;
     const auto agoNs = static_cast<double>(to.systemNs - sample.systemNs);
@@ -82,7 +83,10 @@ tPair tLiveSource::pairAt(const tReferenceSample& sample, const tMoment& now) co
     pair.clockNs = to.clockNs - static_cast<uint64_t>(std::llround(agoNs * rate));
     pair.referenceNs = sample.referenceNs + static_cast<uint64_t>(options.referenceOffsetNs);
     if (!sample.pulse) return pair;
-    const double seconds = std::round(static_cast<double>(pair.errorNs()) / kSecondNs);
-    pair.referenceNs += static_cast<uint64_t>(std::llround(seconds * kSecondNs));
+    constexpr double kWholeNs = kSecondNs;
+    const double seconds = std::round(static_cast<double>(pair.errorNs()) / kWholeNs);
+    pair.referenceNs += static_cast<uint64_t>(std::llround(seconds * kWholeNs));
     return pair;
 }
+
+} // namespace dravikHost

@@ -1,9 +1,11 @@
 #pragma once
 
-#include "clocks/iLiveClock.h"
-#include "loop/tSignals.h"
-#include "sources/iLiveSource.h"
+#include "clocks/systemTime.h"
+#include "sources/iPairSource.h"
 #include "sources/iReference.h"
+#include "sources/tSignals.h"
+
+namespace dravikHost {
 
 // Pairs measured on this machine, at the pace of real time: what a reference says, and what the
 // clock showed at that moment.
@@ -13,11 +15,12 @@ public:
     struct tOptions {
         int64_t referenceOffsetNs = 0;     // added to what the reference says
         std::optional<int64_t> durationNs; // else the signal is the only end
+        uint64_t (*rawNs)() = rawTimeNs;   // CLOCK_MONOTONIC_RAW
     };
 
     // All are borrowed.
-    tLiveSource(iLiveClock& liveClock, iReference& liveReference, const tSignals& watched,
-                const tOptions& given);
+    tLiveSource(iLiveClock& clock, iReference& reference, const tSignals& signals,
+                const tOptions& options);
 
     std::optional<tLiveMoment> next() override;
     std::string remarks() const override;
@@ -41,3 +44,5 @@ private:
     std::optional<tMoment> ordered; // since when the clock has not been ordered anything
     int64_t outOfDate = 0;          // samples
 };
+
+} // namespace dravikHost

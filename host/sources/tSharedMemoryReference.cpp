@@ -1,6 +1,7 @@
 #include "sources/tSharedMemoryReference.h"
 
-#include "sources/nap.h"
+#include "clocks/systemTime.h"
+#include "text/quantity.h"
 
 #include <fmt/format.h>
 
@@ -12,6 +13,8 @@
 #include <sys/ipc.h>
 #include <sys/shm.h>
 #include <system_error>
+
+namespace dravikHost {
 
 namespace {
 
@@ -77,7 +80,7 @@ private:
         const uint32_t nanoseconds = word(nanosecond);
         if (whole > kLastSecond || microseconds >= 1'000'000) return std::nullopt;
         const bool finer = nanoseconds / 1000 == microseconds;
-        return whole * 1'000'000'000 + (finer ? nanoseconds : microseconds * 1000);
+        return whole * kSecondNs + (finer ? nanoseconds : microseconds * 1000);
     }
 
     unsigned char* start;
@@ -156,3 +159,5 @@ std::optional<tReferenceSample> tSharedMemoryReference::take()
     ++unusableCount;
     return std::nullopt;
 }
+
+} // namespace dravikHost

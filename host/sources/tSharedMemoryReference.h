@@ -4,6 +4,8 @@
 
 #include <cstddef>
 
+namespace dravikHost {
+
 // Samples in a shared memory segment as NTP servers' drivers read it: one at a time, which the
 // producer marks as valid and the consumer as taken. The producer may have a time_t of 32 or of 64
 // bits, which the size of the segment tells.
@@ -27,3 +29,5 @@ private:
     bool wide = false; // time_t of 64 bits
     int64_t unusableCount = 0;
 };
+
+} // namespace dravikHost

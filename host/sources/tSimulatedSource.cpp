@@ -2,6 +2,8 @@
 
 #include <cmath>
 
+namespace dravikHost {
+
 // One number decides whether the measurement is an outlier, and of which sign.
 double measurementErrorNs(const tMeasurementModel& model, tNoise& noise)
 {
@@ -12,9 +14,9 @@ double measurementErrorNs(const tMeasurementModel& model, tNoise& noise)
     return sumNs;
 }
 
-tSimulatedSource::tSimulatedSource(tSimulatedClock& simulated, const tMeasurementModel& measurement,
-                                   tNoise& randomness)
-    : clock(simulated), model(measurement), noise(randomness), elapsedNs(-measurement.intervalNs)
+tSimulatedSource::tSimulatedSource(tSimulatedClock& clock, const tMeasurementModel& model,
+                                   tNoise& noise)
+    : clock(clock), model(model), noise(noise), elapsedNs(-model.intervalNs)
 {}
 
 std::optional<tPair> tSimulatedSource::next()
@@ -29,3 +31,5 @@ std::optional<tPair> tSimulatedSource::next()
     const uint64_t seenNs = trueNs + static_cast<uint64_t>(static_cast<int64_t>(errorNs));
     return tPair{elapsedNs, cut(seenNs), cut(clock.timeNs()), clock.aheadOfNs(trueNs)};
 }
+
+} // namespace dravikHost

@@ -1,8 +1,10 @@
 #pragma once
 
-#include "clocks/tSimulatedClock.h"
+#include "clocks/tSteeredClock.h"
+#include "maths/tNoise.h"
 #include "sources/iPairSource.h"
-#include "sources/tNoise.h"
+
+namespace dravikHost {
 
 struct tMeasurementModel {
     int64_t intervalNs = 0;
@@ -23,8 +25,7 @@ public:
     static constexpr uint64_t kStartNs = 1'700'000'000'000'000'000;
 
     // Clock and noise are borrowed; the clock is moved on from pair to pair.
-    tSimulatedSource(tSimulatedClock& simulated, const tMeasurementModel& measurement,
-                     tNoise& randomness);
+    tSimulatedSource(tSimulatedClock& clock, const tMeasurementModel& model, tNoise& noise);
 
     std::optional<tPair> next() override;
 
@@ -34,3 +35,5 @@ private:
     tNoise& noise;
     int64_t elapsedNs; // of the pair given last
 };
+
+} // namespace dravikHost

@@ -1,5 +1,7 @@
 #include "sources/tSocketReference.h"
 
+#include "text/quantity.h"
+
 #include <fmt/format.h>
 
 #include <cerrno>
@@ -10,6 +12,8 @@
 #include <sys/stat.h>
 #include <sys/un.h>
 #include <system_error>
+
+namespace dravikHost {
 
 namespace {
 
@@ -47,8 +51,8 @@ std::optional<tReferenceSample> decode(const unsigned char* datagram, size_t siz
     const bool plausible = seconds <= kLastSecond && microseconds < 1'000'000 &&
                            std::fabs(rest.offset) <= kLargestOffset;
     if (!plausible || rest.magic != kMagic || rest.leap == kNotSynchronised) return std::nullopt;
-    const uint64_t systemNs = seconds * 1'000'000'000 + microseconds * 1000;
-    const auto offsetNs = static_cast<uint64_t>(std::llround(rest.offset * 1e9));
+    const uint64_t systemNs = seconds * kSecondNs + microseconds * 1000;
+    const auto offsetNs = static_cast<uint64_t>(std::llround(nsOf(rest.offset)));
     return tReferenceSample{systemNs, systemNs + offsetNs, rest.pulse != 0};
 }
 
@@ -106,3 +110,5 @@ std::optional<tReferenceSample> tSocketReference::next(int64_t atMostNs)
     if (!sample) ++unusableCount;
     return sample;
 }
+
+} // namespace dravikHost

@@ -1,9 +1,11 @@
 #pragma once
 
-#include "clocks/tDescriptor.h"
 #include "sources/iReference.h"
+#include "text/files.h"
 
 #include <string>
+
+namespace dravikHost {
 
 // Samples as datagrams, in the form that refclock producers write into the socket of a time server:
 // when it was, by the machine's clock, and by how much the true time was later.
@@ -25,3 +27,5 @@ private:
     tDescriptor socket;
     int64_t unusableCount = 0;
 };
+
+} // namespace dravikHost

@@ -6,6 +6,8 @@
 #include <cmath>
 #include <stdexcept>
 
+namespace dravikHost {
+
 const tQuantityKind kDuration = {
     "TIME", {{"ns", 1}, {"us", 1e3}, {"ms", 1e6}, {"s", 1e9}, {"min", 60e9}, {"h", 3600e9}, {}}};
 const tQuantityKind kFrequency = {"OFFSET", {{"ppb", 1}, {"ppm", 1e3}, {}}};
@@ -44,7 +46,7 @@ double takeNumber(std::string_view& rest)
 std::string inFittingUnit(double ns, bool withSign)
 {
     const tUnit* unit = kDuration.units;
-    while (unit[1].size <= 1e9 && std::fabs(ns) >= unit[1].size) // up to seconds
+    while (unit[1].size <= kSecondNs && std::fabs(ns) >= unit[1].size) // up to seconds
         ++unit;
     return fmt::format(withSign ? "{:+.4g} {}" : "{:.4g} {}", ns / unit->size, unit->name);
 }
@@ -70,6 +72,8 @@ std::string offsetText(double offsetPpb) { return fmt::format("{:+.3f} ppm", off
 
 std::string secondsText(int64_t ns, int digits)
 {
-    const std::string text = fmt::format("{}.{:09}", ns / 1'000'000'000, ns % 1'000'000'000);
+    const std::string text = fmt::format("{}.{:09}", ns / kSecondNs, ns % kSecondNs);
     return text.substr(0, text.size() - static_cast<size_t>(9 - digits));
 }
+
+} // namespace dravikHost

@@ -4,6 +4,17 @@
 #include <string>
 #include <string_view>
 
+namespace dravikHost {
+
+constexpr int64_t kSecondNs = 1'000'000'000;
+
+// Timestamps are in nanoseconds, control laws and statistics in seconds.
+template <typename Number> constexpr double secondsOf(Number ns)
+{
+    return static_cast<double>(ns) * 1e-9;
+}
+constexpr double nsOf(double seconds) { return seconds * 1e9; }
+
 // A kind of quantity: its units as the command line takes them, and their size in the base unit.
 struct tUnit {
     const char* name;
@@ -25,5 +36,12 @@ double parseQuantity(std::string_view text, const tQuantityKind& kind);
 // For people: "1.012 ms", "+11.980 ppm", "2.125" (seconds).
 std::string durationText(double ns);
 std::string signedDurationText(double ns);
+inline std::string durationText(int64_t ns) { return durationText(static_cast<double>(ns)); }
+inline std::string signedDurationText(int64_t ns)
+{
+    return signedDurationText(static_cast<double>(ns));
+}
 std::string offsetText(double offsetPpb);
 std::string secondsText(int64_t ns, int digits);
+
+} // namespace dravikHost

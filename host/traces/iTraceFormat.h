@@ -2,8 +2,11 @@
 
 #include "traces/tRecordingBuilder.h"
 
+#include <cstdint>
 #include <string>
 #include <string_view>
+
+namespace dravikHost {
 
 // One way in which traces are written, line by line.
 class iTraceFormat
@@ -22,3 +25,9 @@ public:
     // All lines have been taken.
     virtual void finish(tRecordingBuilder& /*builder*/) {}
 };
+
+// Logs tell differences of time and moments of their own. Their references start here, so that no
+// difference, however negative, takes a clock below zero.
+constexpr uint64_t kMadeUpStartNs = 1'700'000'000'000'000'000;
+
+} // namespace dravikHost

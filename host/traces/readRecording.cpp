@@ -1,5 +1,5 @@
-#include "text/readText.h"
-#include "traces/fields.h"
+#include "text/files.h"
+#include "text/words.h"
 #include "traces/iTraceFormat.h"
 #include "traces/tCsvFormat.h"
 #include "traces/tDaemonLogFormat.h"
@@ -9,6 +9,8 @@
 
 #include <array>
 #include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
@@ -55,3 +57,5 @@ tRecording readRecording(const std::string& path, const std::string& sourceName)
     format->finish(builder);
     return builder.finish(name, format->name());
 }
+
+} // namespace dravikHost

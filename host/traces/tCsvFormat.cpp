@@ -1,11 +1,13 @@
 #include "traces/tCsvFormat.h"
 
-#include "traces/fields.h"
+#include "text/words.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
 #include <cmath>
+
+namespace dravikHost {
 
 namespace {
 
@@ -149,3 +151,5 @@ void tCsvFormat::finish(tRecordingBuilder& builder)
         pair.orderedPpb = initialPpb;
     }
 }
+
+} // namespace dravikHost

@@ -1,10 +1,12 @@
 #pragma once
 
-#include "loop/tLockObserver.h"
+#include "servo/tLockObserver.h"
 #include "traces/iTraceFormat.h"
 
 #include <array>
 #include <optional>
+
+namespace dravikHost {
 
 // CSV with a header that names at least reference_ns and clock_ns, in any order. Also read are
 // elapsed_s, true_error_ns, frequency_ppb (in force from this pair on), step_ns (by which the clock
@@ -49,3 +51,5 @@ private:
     std::optional<double> orderedPpb;
     std::optional<double> initialPpb; // before anything was ordered
 };
+
+} // namespace dravikHost

@@ -1,9 +1,11 @@
 #include "traces/tDaemonLogFormat.h"
 
-#include "traces/fields.h"
-#include "traces/madeUpStart.h"
+#include "text/words.h"
+#include "traces/iTraceFormat.h"
 
 #include <array>
+
+namespace dravikHost {
 
 namespace {
 
@@ -100,3 +102,5 @@ std::string tDaemonLogFormat::read(std::string_view line, tRecordingBuilder& bui
     pair.locked = measurement->state >= kLocked;
     return builder.add(measurement->source, pair);
 }
+
+} // namespace dravikHost

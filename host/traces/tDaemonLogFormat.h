@@ -2,6 +2,8 @@
 
 #include "traces/iTraceFormat.h"
 
+namespace dravikHost {
+
 // What ptp4l, phc2sys and ts2phc, and this program's own run, print for each measurement, with or
 // without the prefix of a system log:
 //
@@ -17,3 +19,5 @@ public:
     bool recognises(std::string_view line) const override;
     std::string read(std::string_view line, tRecordingBuilder& builder) override;
 };
+
+} // namespace dravikHost

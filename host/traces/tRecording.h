@@ -5,6 +5,8 @@
 #include <string>
 #include <vector>
 
+namespace dravikHost {
+
 // One measurement of a trace, and what was done to the clock because of it.
 struct tRecordedPair {
     int64_t elapsedNs;    // since the first measurement
@@ -36,3 +38,14 @@ struct tRecording {
 // lines of ptp4l, phc2sys or ts2phc, or chrony's refclocks.log. A log of several sources needs the
 // name of one. Throws std::runtime_error if the file cannot be read or has not one measurement.
 tRecording readRecording(const std::string& path, const std::string& sourceName = "");
+
+// What remains of a recording without its corrections.
+
+// Throws std::runtime_error if the recording does not tell what frequency its clock was given.
+void requireCorrections(const tRecording& recording);
+
+// By how many ns the oscillator and the noise, without the corrections, changed the error from one
+// measurement to another, a later one that follows it.
+double ownErrorNs(const tRecordedPair& from, const tRecordedPair& to);
+
+} // namespace dravikHost

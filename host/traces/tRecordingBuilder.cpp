@@ -5,6 +5,8 @@
 #include <algorithm>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace {
 
 constexpr size_t kUnreadKept = 3;
@@ -70,3 +72,5 @@ tRecording tRecordingBuilder::finish(const std::string& name, const std::string&
     if (pairs.empty()) throw std::runtime_error(fmt::format("{} has no measurement", name));
     return {name, format, std::move(pairs), unreadLines, std::move(firstUnread)};
 }
+
+} // namespace dravikHost

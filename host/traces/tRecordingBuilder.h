@@ -6,6 +6,8 @@
 #include <string_view>
 #include <vector>
 
+namespace dravikHost {
+
 // Collects the measurements of one source out of a trace that may have several.
 class tRecordingBuilder
 {
@@ -37,3 +39,5 @@ private:
     int64_t unreadLines = 0;
     std::vector<tUnreadLine> firstUnread;
 };
+
+} // namespace dravikHost

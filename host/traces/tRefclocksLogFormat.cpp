@@ -1,9 +1,12 @@
 #include "traces/tRefclocksLogFormat.h"
 
-#include "traces/fields.h"
+#include "text/quantity.h"
+#include "text/words.h"
 
 #include <array>
 #include <cmath>
+
+namespace dravikHost {
 
 namespace {
 
@@ -70,8 +73,10 @@ std::string tRefclocksLogFormat::read(std::string_view line, tRecordingBuilder& 
     if (words[kPlace] == "-") return "made of several measurements";
     tRecordedPair pair{};
     pair.elapsedNs = *timeNs;
-    pair.errorNs = -*slowSeconds * 1e9;
+    pair.errorNs = -nsOf(*slowSeconds);
     pair.referenceNs = static_cast<uint64_t>(*timeNs);
     pair.clockNs = pair.referenceNs + static_cast<uint64_t>(std::llround(pair.errorNs));
     return builder.add(words[kName], pair);
 }
+
+} // namespace dravikHost

@@ -2,6 +2,8 @@
 
 #include "traces/iTraceFormat.h"
 
+namespace dravikHost {
+
 // chrony's refclocks.log, one line a measurement:
 //
 //     2026-11-23 14:33:27.000000 PPS0    7 N 1  4.900000e-07 -6.741777e-07  1.000e-06
@@ -18,3 +20,5 @@ public:
     bool recognises(std::string_view line) const override;
     std::string read(std::string_view line, tRecordingBuilder& builder) override;
 };
+
+} // namespace dravikHost

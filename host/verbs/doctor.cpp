@@ -1,25 +1,27 @@
-#include "verbs/doctor.h"
+#include "verbs/verbs.h"
 
 #include "doctor/findings.h"
 #include "servo/tServoLibrary.h"
-#include "text/tOutputFile.h"
+#include "text/files.h"
 
 #include <fmt/format.h>
 
 #include <memory>
 #include <stdexcept>
 
+namespace dravikHost {
+
 namespace {
 
-struct tOptions {
+struct tDoctor {
     std::vector<std::string> devices; // none: all
     std::string library;
 };
 
-void doctor(const tOptions& options)
+void run(const tDoctor& options)
 {
     constexpr const char* kGrades[] = {"ok", "look", "FAULT"};
-    tOutputFile output(stdout, "the standard output");
+    tOutputFile output("-");
     int faults = 0;
     for (const tFindings& findings :
          {servoFindings(tServoLibrary::find(options.library)), kernelClockFindings(),
@@ -36,13 +38,12 @@ void doctor(const tOptions& options)
 
 } // namespace
 
-tVerb addDoctor(CLI::App& app)
+std::function<void()> addDoctor(tOptionSet& options)
 {
-    CLI::App* const verb =
-        app.add_subcommand("doctor", "Look at the plug-in and at the clocks of this machine");
-    const auto options = std::make_shared<tOptions>();
-    verb->add_option("devices", options->devices, "PTP clocks to look at; else all in /dev")
-        ->type_name("DEVICE");
-    addLibraryOption(*verb, options->library);
-    return {verb, [options] { doctor(*options); }};
+    const auto doctor = std::make_shared<tDoctor>();
+    options.texts("devices", "DEVICE", doctor->devices, "PTP clocks to look at; else all in /dev");
+    options.library(doctor->library);
+    return [doctor] { run(*doctor); };
 }
+
+} // namespace dravikHost

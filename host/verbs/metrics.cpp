@@ -1,19 +1,21 @@
-#include "verbs/metrics.h"
+#include "verbs/verbs.h"
 
+#include "metrics/figures.h"
 #include "metrics/masks.h"
 #include "metrics/stability.h"
-#include "metrics/tAssertion.h"
-#include "text/tLimitBroken.h"
-#include "text/tOutputFile.h"
-#include "traces/traceOptions.h"
+#include "text/files.h"
+#include "text/json.h"
+#include "verbs/shared.h"
 
 #include <fmt/format.h>
 
 #include <memory>
 
+namespace dravikHost {
+
 namespace {
 
-struct tOptions {
+struct tMetrics {
     tTraceOptions trace;
     tSelection selection;
     std::optional<double> numbersIntervalNs; // then the file is plain numbers
@@ -24,25 +26,25 @@ struct tOptions {
     std::vector<std::string> masks;
 };
 
-tMeasured read(const tOptions& options)
+tMeasured read(const tMetrics& options)
 {
-    tMeasured measured =
-        options.numbersIntervalNs
-            ? readNumbers(options.trace.file, *options.numbersIntervalNs * 1e-9, options.frequency)
-            : measure(readTrace(options.trace), options.selection);
+    tMeasured measured = options.numbersIntervalNs
+                             ? readNumbers(options.trace.file,
+                                           secondsOf(*options.numbersIntervalNs), options.frequency)
+                             : measure(readTrace(options.trace), options.selection);
     if (options.removeSlope) measured.removeSlope();
     return measured;
 }
 
-std::string durationOf(double seconds) { return durationText(seconds * 1e9); }
+std::string durationOf(double seconds) { return durationText(nsOf(seconds)); }
 
-std::string summaryText(const tOptions& options, const tMeasured& measured)
+std::string summaryText(const tMetrics& options, const tMeasured& measured)
 {
     std::string text = fmt::format("{}: {}, {} points from {:.3f} s to {:.3f} s\n",
                                    options.trace.file, measured.what, measured.errors.size(),
                                    measured.fromSeconds, measured.toSeconds);
     text += fmt::format("mean {}, RMS {}, peak {}, peak to peak {}\n",
-                        signedDurationText(measured.mean() * 1e9), durationOf(measured.rms()),
+                        signedDurationText(nsOf(measured.mean())), durationOf(measured.rms()),
                         durationOf(measured.peak()), durationOf(measured.peakToPeak()));
     if (measured.locksLost) {
         text += measured.timeToLock
@@ -79,36 +81,49 @@ std::string tableText(const tMeasured& measured)
     return text;
 }
 
+std::string stabilityJson(const tSeries& series)
+{
+    std::string rows;
+    for (const size_t n : octaves(series)) {
+        const tStability at = stabilityAt(series, n);
+        rows += rows.empty() ? "\n  " : ",\n  ";
+        rows += tJsonObject()
+                    .add("n", std::to_string(n))
+                    .add("tau", static_cast<double>(n) * series.interval)
+                    .add("adev", at.adev)
+                    .add("oadev", at.oadev)
+                    .add("mdev", at.mdev)
+                    .add("tdev", at.tdev)
+                    .add("mtie", at.mtie)
+                    .line();
+    }
+    return "[" + rows + "]";
+}
+
 // SI units; what is not known is null.
 std::string jsonText(const tMeasured& measured)
 {
-    const auto number = [](const std::optional<double>& value) {
-        return value ? fmt::format("{}", *value) : "null";
-    };
     const auto locksLost =
         measured.locksLost ? std::optional(static_cast<double>(*measured.locksLost)) : std::nullopt;
-    std::string text = fmt::format(
-        "{{\"points\": {}, \"from\": {}, \"to\": {}, \"mean\": {}, \"rms\": {}, \"peak\": {}, "
-        "\"peakToPeak\": {}, \"timeToLock\": {}, \"locksLost\": {}, \"interval\": {}, "
-        "\"stretch\": {}, \"stability\": [",
-        measured.errors.size(), measured.fromSeconds, measured.toSeconds, measured.mean(),
-        measured.rms(), measured.peak(), measured.peakToPeak(), number(measured.timeToLock),
-        number(locksLost), measured.series.interval, measured.series.phase.size());
-    const char* separator = "\n";
-    for (const size_t n : octaves(measured.series)) {
-        const tStability at = stabilityAt(measured.series, n);
-        text += fmt::format(
-            "{}  {{\"n\": {}, \"tau\": {}, \"adev\": {}, \"oadev\": {}, \"mdev\": {}, "
-            "\"tdev\": {}, \"mtie\": {}}}",
-            separator, n, static_cast<double>(n) * measured.series.interval, number(at.adev),
-            number(at.oadev), number(at.mdev), number(at.tdev), number(at.mtie));
-        separator = ",\n";
-    }
-    return text + "]}\n";
+    return tJsonObject()
+               .add("points", std::to_string(measured.errors.size()))
+               .add("from", measured.fromSeconds)
+               .add("to", measured.toSeconds)
+               .add("mean", measured.mean())
+               .add("rms", measured.rms())
+               .add("peak", measured.peak())
+               .add("peakToPeak", measured.peakToPeak())
+               .add("timeToLock", measured.timeToLock)
+               .add("locksLost", locksLost)
+               .add("interval", measured.series.interval)
+               .add("stretch", std::to_string(measured.series.phase.size()))
+               .add("stability", stabilityJson(measured.series))
+               .line() +
+           "\n";
 }
 
 // One line for each limit; returns what is wrong, "" if all are held.
-std::string reportMasks(const tOptions& options, const tMeasured& measured, tOutputFile& output)
+std::string reportMasks(const tMetrics& options, const tMeasured& measured, tOutputFile& output)
 {
     int counts[3] = {};
     for (const std::string& name : options.masks) {
@@ -126,11 +141,11 @@ std::string reportMasks(const tOptions& options, const tMeasured& measured, tOut
     return "";
 }
 
-void metrics(const tOptions& options)
+void run(const tMetrics& options)
 {
     const tMeasured measured = read(options);
-    tOutputFile output(stdout, "the standard output");
-    tOutputFile other(stderr, "the standard error output");
+    tOutputFile output("-");
+    tOutputFile other = tOutputFile::standardError();
     if (options.json) {
         output.write(jsonText(measured));
     } else {
@@ -146,51 +161,43 @@ void metrics(const tOptions& options)
     if (!failures.empty()) throw tLimitBroken(failures);
 }
 
-void addSelection(CLI::App& app, tOptions& options)
+void addSelection(tOptionSet& options, tMetrics& metrics)
 {
-    addQuantity(app, options.selection.fromNs,
-                {"--from", kDuration, "", "0ns", "438300h",
-                 "Elapsed time to begin at; else the first lock,\nif the trace tells of locks"});
-    addQuantity(app, options.selection.toNs,
-                {"--to", kDuration, "", "0ns", "438300h", "Elapsed time to end at"});
-    app.add_flag("--measured", options.selection.measured,
+    options.quantity(metrics.selection.fromNs,
+                     {"--from", kDuration, "", "0ns", "438300h",
+                      "Elapsed time to begin at; else the first lock,\nif the trace tells of "
+                      "locks"});
+    options.quantity(metrics.selection.toNs,
+                     {"--to", kDuration, "", "0ns", "438300h", "Elapsed time to end at"});
+    options.flag("--measured", metrics.selection.measured,
                  "The measured error, even if the true one is\nknown");
-    addQuantity(app, options.numbersIntervalNs,
-                {"--interval", kDuration, "", "1ns", "438300h",
-                 "The file is plain numbers, so far apart:\nphase in seconds"});
-    app.add_flag("--frequency", options.frequency, "They are fractional frequency")
-        ->needs("--interval");
-    app.add_flag("--remove-slope", options.removeSlope,
+    const tOption interval = options.quantity(
+        metrics.numbersIntervalNs, {"--interval", kDuration, "", "1ns", "438300h",
+                                    "The file is plain numbers, so far apart:\nphase in seconds"});
+    options.flag("--frequency", metrics.frequency, "They are fractional frequency").needs(interval);
+    options.flag("--remove-slope", metrics.removeSlope,
                  "Without the line from the first point to the last");
 }
 
 } // namespace
 
-tVerb addMetrics(CLI::App& app)
+std::function<void()> addMetrics(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("metrics", "Tell what a trace is worth");
-    const auto options = std::make_shared<tOptions>();
-    addTraceOptions(*verb, options->trace)->required();
-    addSelection(*verb, *options);
-    verb->add_flag("--json", options->json, "One JSON object in SI units instead of a table");
-    const auto addAssertion = [options](const std::vector<std::string>& texts) {
-        for (const std::string& text : texts) {
-            try {
-                options->assertions.emplace_back(text);
-            } catch (const std::invalid_argument& failure) {
-                throw CLI::ValidationError("--assert", failure.what());
-            }
-        }
-    };
-    verb->add_option_function<std::vector<std::string>>(
-            "--assert", addAssertion, "Such as 'rms<20ns' or 'tdev(10s)<=1ns'; repeatable")
-        ->type_name("FIGURE<LIMIT")
-        ->expected(1)
-        ->take_all();
-    verb->add_option("--mask", options->masks, "g8273.2-a, -b, -c, -d or 802.1as; repeatable")
-        ->type_name("NAME")
-        ->expected(1)
-        ->take_all()
-        ->check(CLI::IsMember(maskNames()));
-    return {verb, [options] { metrics(*options); }};
+    const auto metrics = std::make_shared<tMetrics>();
+    addTraceOptions(options, metrics->trace).require();
+    addSelection(options, *metrics);
+    options.flag("--json", metrics->json, "One JSON object in SI units instead of a table");
+    options.repeatable(
+        "--assert", "FIGURE<LIMIT",
+        [metrics](const std::string& text) { metrics->assertions.emplace_back(text); },
+        "Such as 'rms<20ns' or 'tdev(10s)<=1ns'; repeatable");
+    options
+        .repeatable(
+            "--mask", "NAME",
+            [metrics](const std::string& name) { metrics->masks.push_back(name); },
+            "g8273.2-a, -b, -c, -d or 802.1as; repeatable")
+        .oneOf(maskNames());
+    return [metrics] { run(*metrics); };
 }
+
+} // namespace dravikHost

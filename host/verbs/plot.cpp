@@ -1,22 +1,25 @@
-#include "verbs/plot.h"
+#include "verbs/verbs.h"
 
 #include "metrics/masks.h"
 #include "plot/plotScript.h"
 #include "plot/runGnuplot.h"
-#include "text/tOutputFile.h"
-#include "traces/traceOptions.h"
+#include "text/files.h"
+#include "verbs/shared.h"
 
 #include <memory>
+#include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
-struct tOptions {
+struct tPlot {
     tTraceOptions trace;
     tPlotOptions plot;
     std::string script; // "": none; "-": stdout
 };
 
-void plot(const tOptions& options)
+void run(const tPlot& options)
 {
     const std::string script = plotScript(readTrace(options.trace), options.plot);
     if (options.script.empty()) {
@@ -25,10 +28,7 @@ void plot(const tOptions& options)
         runGnuplot(script);
         return;
     }
-    tOutputFile output = options.script == "-" ? tOutputFile(stdout, "the standard output")
-                                               : tOutputFile(options.script);
-    output.write(script);
-    output.flush();
+    writeText(options.script, script);
 }
 
 // Other masks limit single figures only.
@@ -43,31 +43,31 @@ std::vector<std::string> curvedMaskNames()
 void requirePictureName(const std::string& file)
 {
     if (!isPictureName(file))
-        throw CLI::ValidationError("--output", "'" + file + "' does not end in .svg or .png");
+        throw std::invalid_argument("'" + file + "' does not end in .svg or .png");
 }
 
 } // namespace
 
-tVerb addPlot(CLI::App& app)
+std::function<void()> addPlot(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("plot", "Draw a trace");
-    const auto options = std::make_shared<tOptions>();
-    addTraceOptions(*verb, options->trace)->required();
-    verb->add_option_function<std::string>(
-            "-o,--output",
-            [options](const std::string& file) {
+    const auto plot = std::make_shared<tPlot>();
+    addTraceOptions(options, plot->trace).require();
+    options
+        .parsed(
+            "-o,--output", "FILE",
+            [plot](const std::string& file) {
                 requirePictureName(file);
-                options->plot.picture = file;
+                plot->plot.picture = file;
             },
             "The picture; its ending, .svg or .png,\nsays what kind")
-        ->type_name("FILE")
-        ->required();
-    verb->add_option("--mask", options->plot.mask,
-                     "Limits beside the stability curves, as of metrics")
-        ->type_name("NAME")
-        ->check(CLI::IsMember(curvedMaskNames()));
-    verb->add_option("--script", options->script,
-                     "Write the script for gnuplot instead; - is\nstdout")
-        ->type_name("FILE");
-    return {verb, [options] { plot(*options); }};
+        .require();
+    options
+        .text("--mask", "NAME", plot->plot.mask,
+              "Limits beside the stability curves, as of metrics")
+        .oneOf(curvedMaskNames());
+    options.text("--script", "FILE", plot->script,
+                 "Write the script for gnuplot instead; - is\nstdout");
+    return [plot] { run(*plot); };
 }
+
+} // namespace dravikHost

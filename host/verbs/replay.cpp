@@ -1,22 +1,23 @@
-#include "verbs/replay.h"
+#include "verbs/verbs.h"
 
 #include "loop/tDiscipline.h"
-#include "sources/tFreedSource.h"
-#include "sources/tRecordedSource.h"
-#include "traces/traceOptions.h"
+#include "sources/recordedSources.h"
+#include "verbs/shared.h"
 
 #include <fmt/format.h>
 
 #include <memory>
 
+namespace dravikHost {
+
 namespace {
 
-struct tOptions : tDisciplineOptions {
+struct tReplay : tDisciplineOptions {
     tTraceOptions trace;
     bool reDiscipline = false;
 };
 
-std::string scenarioText(const tRecording& recording, const char* mode, const tOptions& options)
+std::string scenarioText(const tRecording& recording, const char* mode, const tReplay& options)
 {
     return fmt::format("replay: {}, {} measurements from {};\n        {}; {}", recording.name,
                        recording.pairs.size(), recording.format, mode,
@@ -24,24 +25,24 @@ std::string scenarioText(const tRecording& recording, const char* mode, const tO
 }
 
 void replayVerbatim(const tServoLibrary& library, const tRecording& recording,
-                    const tOptions& options)
+                    const tReplay& options)
 {
     tRecordedClock clock(options.maxFrequencyOffsetPpb);
     tRecordedSource source(recording, clock);
     const char* const mode = "verbatim: errors as recorded, on which the orders have no effect";
-    tDiscipline(library, clock, options).run(scenarioText(recording, mode, options), source);
+    runInMadeTime(library, clock, source, scenarioText(recording, mode, options), options);
 }
 
 void replayReDisciplined(const tServoLibrary& library, const tRecording& recording,
-                         const tOptions& options)
+                         const tReplay& options)
 {
-    tFreedClock clock(recording.pairs[0].clockNs, options.maxFrequencyOffsetPpb);
-    tFreedSource source(recording, clock);
+    tFreeRunningClock clock(recording.pairs[0].clockNs, options.maxFrequencyOffsetPpb);
+    tFreeRunningSource source(recording, clock);
     const char* const mode = "re-disciplined: recorded corrections undone, the loop closed anew";
-    tDiscipline(library, clock, options).run(scenarioText(recording, mode, options), source);
+    runInMadeTime(library, clock, source, scenarioText(recording, mode, options), options);
 }
 
-void replay(const tOptions& options)
+void run(const tReplay& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
     const tRecording recording = readTrace(options.trace);
@@ -54,15 +55,17 @@ void replay(const tOptions& options)
 
 } // namespace
 
-tVerb addReplay(CLI::App& app)
+std::function<void()> addReplay(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("replay", "Run the plug-in on a recorded trace");
-    const auto options = std::make_shared<tOptions>();
-    addTraceOptions(*verb, options->trace)->required();
-    verb->add_flag("--re-discipline", options->reDiscipline,
-                   "Undo the recorded corrections and close the\n"
-                   "loop; else pairs as recorded, verbatim");
-    addFreeRunningOption(*verb, options->trace);
-    addDisciplineOptions(*verb, *options);
-    return {verb, [options] { replay(*options); }};
+    const auto replay = std::make_shared<tReplay>();
+    addTraceOptions(options, replay->trace).require();
+    options.flag("--re-discipline", replay->reDiscipline,
+                 "Undo the recorded corrections and close the\n"
+                 "loop; else pairs as recorded, verbatim");
+    addFreeRunningOption(options, replay->trace);
+    addDisciplineOptions(options, *replay);
+    options.finally([replay] { requireOneInput(replay->tuning); });
+    return [replay] { run(*replay); };
 }
+
+} // namespace dravikHost

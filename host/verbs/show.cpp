@@ -1,34 +1,39 @@
-#include "verbs/show.h"
+#include "verbs/verbs.h"
 
 #include "clocks/tSteeredClock.h"
-#include "servo/printConfig.h"
 #include "servo/tuning.h"
+#include "text/files.h"
+#include "verbs/shared.h"
 
 #include <memory>
 
+namespace dravikHost {
+
 namespace {
 
-struct tOptions {
+struct tShow {
     std::string library;
     tTuning tuning;
 };
 
-void show(const tOptions& options)
+void run(const tShow& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
-    tSteeredClock clock(0, 0, 0); // stands still: there are no pairs
+    tStillClock clock;
     tServoHost host(library, clock);
     tune(host, options.tuning);
-    printConfig(host);
+    writeText("-", host.readConfig() + "\n");
 }
 
 } // namespace
 
-tVerb addShow(CLI::App& app)
+std::function<void()> addShow(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("show", "Print the configuration document in force");
-    const auto options = std::make_shared<tOptions>();
-    addTuningOptions(*verb, options->tuning);
-    addLibraryOption(*verb, options->library);
-    return {verb, [options] { show(*options); }};
+    const auto show = std::make_shared<tShow>();
+    addTuningOptions(options, show->tuning);
+    options.library(show->library);
+    options.finally([show] { requireOneInput(show->tuning); });
+    return [show] { run(*show); };
 }
+
+} // namespace dravikHost

@@ -1,63 +1,61 @@
-#include "verbs/simulate.h"
+#include "verbs/verbs.h"
 
 #include "loop/tDiscipline.h"
 #include "sources/tSimulatedSource.h"
+#include "verbs/shared.h"
 
 #include <fmt/format.h>
 
 #include <charconv>
 #include <memory>
+#include <stdexcept>
+
+namespace dravikHost {
 
 namespace {
 
-struct tOptions : tDisciplineOptions {
+struct tSimulation : tDisciplineOptions {
     tInitialError initialError;
     tOscillatorModel oscillator;
     tMeasurementModel measurement;
     uint64_t seed = 1;
 };
 
-void addMeasurementOptions(CLI::App& app, tMeasurementModel& model)
+void addMeasurementOptions(tOptionSet& options, tMeasurementModel& model)
 {
-    addQuantity(app, model.intervalNs,
-                {"--interval", kDuration, "1s", "1ns", "24h", "Time from pair to pair"});
-    addQuantity(app, model.durationNs,
-                {"--duration", kDuration, "5min", "1ns", "438300h", "Simulated time"});
-    addQuantity(app, model.noiseNs,
-                {"--noise", kDuration, "20ns", "0ns", "24h", "White, of measurements; deviation"});
-    addQuantity(app, model.outlierRate,
-                {"--outlier-rate", kRatio, "0%", "0%", "100%", "Share of measurements far off"});
-    addQuantity(app, model.outlierSizeNs,
-                {"--outlier-size", kDuration, "0ns", "0ns", "24h", "How far they are off"});
-    addQuantity(app, model.granularityNs,
-                {"--granularity", kDuration, "1ns", "1ns", "24h",
-                 "Timestamps are cut down to its multiples"});
+    options.quantity(model.intervalNs,
+                     {"--interval", kDuration, "1s", "1ns", "24h", "Time from pair to pair"});
+    options.quantity(model.durationNs,
+                     {"--duration", kDuration, "5min", "1ns", "438300h", "Simulated time"});
+    options.quantity(model.noiseNs, {"--noise", kDuration, "20ns", "0ns", "24h",
+                                     "White, of measurements; deviation"});
+    options.quantity(model.outlierRate, {"--outlier-rate", kRatio, "0%", "0%", "100%",
+                                         "Share of measurements far off"});
+    options.quantity(model.outlierSizeNs,
+                     {"--outlier-size", kDuration, "0ns", "0ns", "24h", "How far they are off"});
+    options.quantity(model.granularityNs, {"--granularity", kDuration, "1ns", "1ns", "24h",
+                                           "Timestamps are cut down to its multiples"});
 }
 
-void addOscillatorOptions(CLI::App& app, tOscillatorModel& model)
+void addOscillatorOptions(tOptionSet& options, tOscillatorModel& model)
 {
-    addQuantity(app, model.frequencyNoisePpb,
-                {"--frequency-noise", kFrequency, "0.1ppb", "0ppb", "1000ppm",
-                 "White; Allan deviation at 1 s"});
-    addQuantity(app, model.frequencyWanderPpb,
-                {"--frequency-wander", kFrequency, "0.01ppb", "0ppb", "1000ppm",
-                 "Random walk, per root second"});
+    options.quantity(model.frequencyNoisePpb, {"--frequency-noise", kFrequency, "0.1ppb", "0ppb",
+                                               "1000ppm", "White; Allan deviation at 1 s"});
+    options.quantity(model.frequencyWanderPpb, {"--frequency-wander", kFrequency, "0.01ppb", "0ppb",
+                                                "1000ppm", "Random walk, per root second"});
 }
 
-void addSeed(CLI::App& app, uint64_t& seed)
+uint64_t parseSeed(const std::string& text)
 {
-    const auto parse = [&seed](const std::string& text) {
-        const char* const end = text.data() + text.size();
-        const auto result = std::from_chars(text.data(), end, seed);
-        if (result.ec != std::errc() || result.ptr != end)
-            throw CLI::ValidationError("--seed", "'" + text + "' is no whole number of 64 bits");
-    };
-    app.add_option_function<std::string>("--seed", parse, "Same seed, same bytes of output")
-        ->type_name("NUMBER")
-        ->default_str(std::to_string(seed));
+    uint64_t seed = 0;
+    const char* const end = text.data() + text.size();
+    const auto result = std::from_chars(text.data(), end, seed);
+    if (result.ec != std::errc() || result.ptr != end)
+        throw std::invalid_argument("'" + text + "' is not a whole number of 64 bits");
+    return seed;
 }
 
-void simulate(const tOptions& options)
+void run(const tSimulation& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
     tOscillatorModel oscillator = options.oscillator;
@@ -67,22 +65,27 @@ void simulate(const tOptions& options)
                               static_cast<uint64_t>(options.initialError.offsetNs),
                           oscillator, options.maxFrequencyOffsetPpb, noise);
     tSimulatedSource source(clock, options.measurement, noise);
-    tDiscipline(library, clock, options)
-        .run(fmt::format("simulate: clock {}, seed {}; {}", options.initialError.text(),
-                         options.seed, library.path),
-             source);
+    runInMadeTime(library, clock, source,
+                  fmt::format("simulate: clock {}, seed {}; {}", options.initialError.text(),
+                              options.seed, library.path),
+                  options);
 }
 
 } // namespace
 
-tVerb addSimulate(CLI::App& app)
+std::function<void()> addSimulate(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("simulate", "Discipline a simulated clock");
-    const auto options = std::make_shared<tOptions>();
-    addInitialErrorOptions(*verb, options->initialError, "1ms");
-    addDisciplineOptions(*verb, *options);
-    addMeasurementOptions(*verb, options->measurement);
-    addOscillatorOptions(*verb, options->oscillator);
-    addSeed(*verb, options->seed);
-    return {verb, [options] { simulate(*options); }};
+    const auto simulation = std::make_shared<tSimulation>();
+    addInitialErrorOptions(options, simulation->initialError, "1ms");
+    addDisciplineOptions(options, *simulation);
+    addMeasurementOptions(options, simulation->measurement);
+    addOscillatorOptions(options, simulation->oscillator);
+    options.parsed(
+        "--seed", "NUMBER",
+        [simulation](const std::string& text) { simulation->seed = parseSeed(text); },
+        "Same seed, same bytes of output", std::to_string(simulation->seed));
+    options.finally([simulation] { requireOneInput(simulation->tuning); });
+    return [simulation] { run(*simulation); };
 }
+
+} // namespace dravikHost

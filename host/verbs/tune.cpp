@@ -1,18 +1,22 @@
-#include "verbs/tune.h"
+#include "verbs/verbs.h"
 
 #include "clocks/tSteeredClock.h"
 #include "design/designDocuments.h"
 #include "design/estimateNoise.h"
 #include "design/tLoopAnalysis.h"
 #include "servo/tServoHost.h"
-#include "text/tOutputFile.h"
-#include "traces/fields.h"
-#include "traces/traceOptions.h"
+#include "text/files.h"
+#include "text/words.h"
+#include "verbs/shared.h"
 
 #include <fmt/format.h>
 
+#include <array>
 #include <filesystem>
 #include <memory>
+#include <stdexcept>
+
+namespace dravikHost {
 
 // From the noise, given in numbers or found in a trace, to the document that suits it.
 
@@ -28,7 +32,7 @@ struct tGivenNoise {
     std::optional<double> outlierSizeNs;
 };
 
-struct tOptions {
+struct tTune {
     tTraceOptions trace;
     tGivenNoise given;
     std::optional<tLoopGains> controller;
@@ -37,22 +41,21 @@ struct tOptions {
     std::string library;
 };
 
-void addGivenNoise(CLI::App& app, tGivenNoise& given)
+void addGivenNoise(tOptionSet& options, tGivenNoise& given)
 {
-    addQuantity(app, given.intervalNs,
-                {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair"});
-    addQuantity(app, given.noiseNs,
-                {"--noise", kDuration, "", "0ns", "1s", "White, of measurements; deviation"});
-    addQuantity(app, given.wanderPpb,
-                {"--wander", kFrequency, "", "0ppb", "1000ppm",
-                 "Random walk of the frequency, per root second"});
-    addQuantity(app, given.frequencyNoisePpb,
-                {"--frequency-noise", kFrequency, "", "0ppb", "1000ppm",
-                 "White; Allan deviation at 1 s; else 0.1ppb"});
-    addQuantity(app, given.outlierRate,
-                {"--outlier-rate", kRatio, "", "0%", "100%", "Share of measurements far off"});
-    addQuantity(app, given.outlierSizeNs,
-                {"--outlier-size", kDuration, "", "0ns", "1s", "How far they are off"});
+    options.quantity(given.intervalNs,
+                     {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair"});
+    options.quantity(given.noiseNs,
+                     {"--noise", kDuration, "", "0ns", "1s", "White, of measurements; deviation"});
+    options.quantity(given.wanderPpb, {"--wander", kFrequency, "", "0ppb", "1000ppm",
+                                       "Random walk of the frequency, per root second"});
+    options.quantity(given.frequencyNoisePpb,
+                     {"--frequency-noise", kFrequency, "", "0ppb", "1000ppm",
+                      "White; Allan deviation at 1 s; else 0.1ppb"});
+    options.quantity(given.outlierRate,
+                     {"--outlier-rate", kRatio, "", "0%", "100%", "Share of measurements far off"});
+    options.quantity(given.outlierSizeNs,
+                     {"--outlier-size", kDuration, "", "0ns", "1s", "How far they are off"});
 }
 
 tLoopGains parseController(const std::string& text)
@@ -61,25 +64,25 @@ tLoopGains parseController(const std::string& text)
     const auto kp = numberIn<double>(takeField(rest));
     const auto ki = numberIn<double>(takeField(rest));
     if (!kp || !ki || !(*kp > 0) || !(*ki > 0) || !rest.empty()) {
-        throw CLI::ValidationError("--from-pi",
-                                   "'" + text + "' is not KP,KI, two positive numbers");
+        throw std::invalid_argument("'" + text + "' is not KP,KI, two positive numbers");
     }
     return {*kp, *ki};
 }
 
-void requireEnough(const tOptions& options)
+void requireEnough(const tTune& options)
 {
     const tGivenNoise& given = options.given;
     if (options.quickOutput == "-")
-        throw CLI::ValidationError("--quick", "several documents take files");
+        throw std::invalid_argument("--quick: several documents take files");
     if (options.controller && !options.trace.file.empty())
-        throw CLI::ValidationError("--from-pi", "a trace has no say in it");
+        throw std::invalid_argument("--from-pi: a trace has no say in it");
     if (options.controller || !options.trace.file.empty()) return;
     if (given.noiseNs && given.wanderPpb && given.intervalNs) return;
-    throw CLI::RequiredError("A trace, or --noise, --wander and --interval, or --from-pi");
+    throw std::invalid_argument(
+        "A trace, or --noise, --wander and --interval, or --from-pi is required");
 }
 
-tNoiseModel noiseModel(const tOptions& options)
+tNoiseModel noiseModel(const tTune& options)
 {
     constexpr double kUsualFrequencyNoisePpb = 0.1;
     tNoiseModel model;
@@ -108,7 +111,7 @@ std::string noiseText(const tNoiseModel& model)
         "measurements of {} every {}{};\n"
         "oscillator with {:.3g} ppb of white noise at 1 s and {:.3g} ppb of wander per "
         "root second\n",
-        durationText(model.noiseNs), durationText(model.interval() * 1e9), outliers,
+        durationText(model.noiseNs), durationText(nsOf(model.interval())), outliers,
         model.frequencyNoisePpb, model.wanderPpb);
 }
 
@@ -144,7 +147,7 @@ public:
                      }) +
                rowOf("settles within",
                      [&](auto& p) {
-                         return loop(p).stable ? durationText(loop(p).settling * 1e9) : "never";
+                         return loop(p).stable ? durationText(nsOf(loop(p).settling)) : "never";
                      }) +
                rowOf("noise that passes", [&](auto& p) {
                    return loop(p).stable ? fmt::format("{:.0f} %", loop(p).noiseGain * 100) : "-";
@@ -177,7 +180,7 @@ std::string quickName(const std::string& file, size_t index)
 }
 
 // The options with which a host acquires the lock quickly and holds it quietly.
-std::string quickText(const tDesign& design, const tOptions& options)
+std::string quickText(const tDesign& design, const tTune& options)
 {
     if (design.quick.empty()) return "";
     const std::string quick = options.quickOutput.empty() ? "QUICK" : options.quickOutput;
@@ -200,14 +203,11 @@ std::string quickText(const tDesign& design, const tOptions& options)
 
 void writeDocument(const std::string& file, const tServoParameters& parameters)
 {
-    tOutputFile output = file.empty() || file == "-" ? tOutputFile(stdout, "the standard output")
-                                                     : tOutputFile(file);
-    output.write(parameters.documentText());
-    output.flush();
+    writeText(file.empty() ? "-" : file, parameters.documentText());
 }
 
 // Without a noise the filter stays off and the threshold as it is.
-tServoParameters convertedDocument(const tOptions& options, const tServoParameters& builtIn)
+tServoParameters convertedDocument(const tTune& options, const tServoParameters& builtIn)
 {
     tServoParameters parameters = builtIn;
     options.controller->putInto(parameters);
@@ -218,10 +218,10 @@ tServoParameters convertedDocument(const tOptions& options, const tServoParamete
     return parameters;
 }
 
-void tune(const tOptions& options)
+void run(const tTune& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
-    tSteeredClock clock(0, 0, 0); // stands still: there are no pairs
+    tStillClock clock;
     tServoHost host(library, clock);
     const auto builtIn = tServoParameters::of(host.readConfig());
     if (options.controller) {
@@ -231,7 +231,7 @@ void tune(const tOptions& options)
     const tNoiseModel model = noiseModel(options);
     const tDesign design = designDocuments(library, model);
     const bool toStdout = options.output.empty() || options.output == "-";
-    tOutputFile report(toStdout ? stderr : stdout, "the report");
+    tOutputFile report = toStdout ? tOutputFile::standardError() : tOutputFile("-");
     report.write(noiseText(model));
     report.write(tComparison(library, model, builtIn, design.quiet).text());
     report.write(
@@ -246,24 +246,22 @@ void tune(const tOptions& options)
 
 } // namespace
 
-tVerb addTune(CLI::App& app)
+std::function<void()> addTune(tOptionSet& options)
 {
-    CLI::App* const verb = app.add_subcommand("tune", "Write the document that suits a noise");
-    const auto options = std::make_shared<tOptions>();
-    addTraceOptions(*verb, options->trace);
-    addFreeRunningOption(*verb, options->trace);
-    addGivenNoise(*verb, options->given);
-    verb->add_option_function<std::string>(
-            "--from-pi",
-            [options](const std::string& text) { options->controller = parseController(text); },
-            "Convert a proportional-integral controller,\nwhose constants are per second and pair")
-        ->type_name("KP,KI");
-    verb->add_option("-o,--output", options->output, "The document; else it goes to stdout")
-        ->type_name("FILE");
-    verb->add_option("--quick", options->quickOutput,
-                     "Also those to acquire the lock with, if any:\nFILE, then numbered ones")
-        ->type_name("FILE");
-    addLibraryOption(*verb, options->library);
-    verb->final_callback([options] { requireEnough(*options); });
-    return {verb, [options] { tune(*options); }};
+    const auto tune = std::make_shared<tTune>();
+    addTraceOptions(options, tune->trace);
+    addFreeRunningOption(options, tune->trace);
+    addGivenNoise(options, tune->given);
+    options.parsed(
+        "--from-pi", "KP,KI",
+        [tune](const std::string& text) { tune->controller = parseController(text); },
+        "Convert a proportional-integral controller,\nwhose constants are per second and pair");
+    options.text("-o,--output", "FILE", tune->output, "The document; else it goes to stdout");
+    options.text("--quick", "FILE", tune->quickOutput,
+                 "Also those to acquire the lock with, if any:\nFILE, then numbered ones");
+    options.library(tune->library);
+    options.finally([tune] { requireEnough(*tune); });
+    return [tune] { run(*tune); };
 }
+
+} // namespace dravikHost

@@ -1,0 +1,30 @@
+#pragma once
+
+#include "loop/tRunningFigures.h"
+#include "loop/tStep.h"
+
+#include <optional>
+
+namespace dravikHost {
+
+// A clock whose reference is silent keeps the frequency that it was last given, and its error grows
+// with what that frequency was unsure by.
+class tHoldoverEstimate : public iStepObserver
+{
+public:
+    void see(const tStep& step) override;
+    using iStepObserver::see;
+
+    // By how far the clock may be off after so long, one deviation; nothing if it has not been
+    // locked for long enough to know.
+    std::optional<double> errorNs(int64_t lengthNs) const;
+
+private:
+    static constexpr int64_t kWindow = 64; // pairs that show how sure the frequency is
+    static constexpr int64_t kLeast = 8;   // fewer do not
+
+    tRunningFigures window;   // being filled
+    tRunningFigures previous; // full
+};
+
+} // namespace dravikHost

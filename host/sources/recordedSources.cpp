@@ -1,0 +1,40 @@
+#include "sources/recordedSources.h"
+
+namespace dravikHost {
+
+std::optional<tPair> tRecordedSource::next()
+{
+    if (index == recording.pairs.size()) return std::nullopt;
+    if (index > 0 && recording.pairs[index - 1].orderedPpb)
+        clock.showOffset(*recording.pairs[index - 1].orderedPpb);
+    const tRecordedPair& pair = recording.pairs[index++];
+    clock.showTime(pair.clockNs);
+    return tPair{pair.elapsedNs, pair.referenceNs, pair.clockNs, pair.trueErrorNs};
+}
+
+tFreeRunningSource::tFreeRunningSource(const tRecording& recording, tFreeRunningClock& clock)
+    : recording(recording), clock(clock)
+{
+    requireCorrections(recording);
+}
+
+std::optional<tPair> tFreeRunningSource::next()
+{
+    if (index == recording.pairs.size()) return std::nullopt;
+    const tRecordedPair& pair = recording.pairs[index];
+    if (index > 0) {
+        const tRecordedPair& before = recording.pairs[index - 1];
+        clock.advance(pair.elapsedNs - before.elapsedNs, ownErrorNs(before, pair));
+    }
+    ++index;
+    // The clock passed the elapsed time, whatever steps the reference may have made of its own.
+    const uint64_t nominalNs =
+        recording.pairs[0].referenceNs + static_cast<uint64_t>(pair.elapsedNs);
+    const uint64_t clockNs = clock.timeNs() - nominalNs + pair.referenceNs;
+    std::optional<double> trueErrorNs;
+    if (pair.trueErrorNs)
+        trueErrorNs = clock.aheadOfNs(nominalNs) - (pair.errorNs - *pair.trueErrorNs);
+    return tPair{pair.elapsedNs, pair.referenceNs, clockNs, trueErrorNs};
+}
+
+} // namespace dravikHost

@@ -1,5 +1,0 @@
-#pragma once
-
-#include "text/options.h"
-
-tVerb addDoctor(CLI::App& app);

@@ -1,0 +1,135 @@
+#include "verbs/shared.h"
+
+#include "watchers/tReport.h"
+#include "watchers/tSummary.h"
+#include "watchers/tTraceFile.h"
+
+#include <fmt/format.h>
+
+#include <cstdio>
+#include <stdexcept>
+
+namespace dravikHost {
+
+namespace {
+
+tLaterDocument parseLater(const std::string& text)
+{
+    const size_t equals = text.find('=');
+    if (equals == std::string::npos || equals + 1 == text.size())
+        throw std::invalid_argument("'" + text + "' is not AFTER=FILE, such as 60s=a.json");
+    const tQuantityOption after = {"--then", kDuration, "", "0ns", "438300h", ""};
+    return {static_cast<int64_t>(parseWithin(after, text.substr(0, equals))),
+            text.substr(equals + 1)};
+}
+
+void addLater(std::vector<tLaterDocument>& later, const std::string& text)
+{
+    const tLaterDocument document = parseLater(text);
+    if (!later.empty() && document.afterNs <= later.back().afterNs)
+        throw std::invalid_argument("'" + text + "' does not come after the one before");
+    later.push_back(document);
+}
+
+void printUnread(const tRecording& recording)
+{
+    if (recording.unreadLines == 0) return;
+    std::string examples;
+    for (const tUnreadLine& line : recording.firstUnread)
+        examples += fmt::format("{}{} ({})", examples.empty() ? "" : ", ", line.number, line.why);
+    const bool all = recording.unreadLines == static_cast<int64_t>(recording.firstUnread.size());
+    fmt::print(stderr, "dravik-host: {}: {} lines are not used, {} {}\n", recording.name,
+               recording.unreadLines, all ? "lines" : "the first are lines", examples);
+}
+
+} // namespace
+
+void addTuningOptions(tOptionSet& options, tTuning& tuning)
+{
+    const tOption metaData =
+        options.text("--metadata", "FILE", tuning.metaDataFile, "Metadata of the time reference");
+    options
+        .text("--reference-type", "TEXT", tuning.referenceType,
+              "Metadata with no more than this type")
+        .excludes(metaData);
+    options.text("--config", "FILE", tuning.configFile,
+                 "Configuration document; goes last, so it\n"
+                 "wins over a default document of the type");
+}
+
+void requireOneInput(const tTuning& tuning)
+{
+    if (tuning.metaDataFile == "-" && tuning.configFile == "-")
+        throw std::invalid_argument("--config: the standard input is taken by --metadata");
+}
+
+void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline)
+{
+    options.quantity(discipline.maxFrequencyOffsetPpb,
+                     {"--max-frequency-offset", kFrequency, "500ppm", "1ppb", "100000ppm",
+                      "How far its rate can be changed"});
+    options.quantity(discipline.measureOverNs,
+                     {"--measure-over", kDuration, "0ns", "0ns", "24h",
+                      "Least time over which the frequency is\nmeasured; pairs between are held "
+                      "back"});
+    options.repeatable(
+        "--then", "AFTER=FILE",
+        [&later = discipline.later](const std::string& text) { addLater(later, text); },
+        "A further document once the lock has held\nso long; repeatable");
+    options.text("--csv", "FILE", discipline.csv, "Every pair and host call; - is stdout");
+    addTuningOptions(options, discipline.tuning);
+    options.library(discipline.library);
+}
+
+// The bounds keep all times of a run within 64 bits: 438300 h are fifty years.
+void addInitialErrorOptions(tOptionSet& options, tInitialError& error, const char* defaultOffset)
+{
+    options.quantity(error.offsetNs, {"--initial-offset", kDuration, defaultOffset, "-438300h",
+                                      "438300h", "How far the clock is ahead at the start"});
+    options.quantity(error.frequencyPpb, {"--frequency-error", kFrequency, "12ppm", "-100000ppm",
+                                          "100000ppm", "How much too fast its oscillator is"});
+}
+
+std::string tInitialError::text() const
+{
+    return fmt::format("{} and {} off", signedDurationText(offsetNs), offsetText(frequencyPpb));
+}
+
+tOption addTraceOptions(tOptionSet& options, tTraceOptions& trace)
+{
+    options.text("--source", "NAME", trace.source,
+                 "Which one, if the trace has several; a part of its name");
+    return options.text("trace", "FILE", trace.file,
+                        "CSV, lines of ptp4l, phc2sys or ts2phc,\nor chrony's refclocks.log; - is "
+                        "stdin");
+}
+
+void addFreeRunningOption(tOptionSet& options, tTraceOptions& trace)
+{
+    options.flag("--free-running", trace.freeRunning,
+                 "Where the trace tells no frequency and no\nsteps, the clock was given none");
+}
+
+tRecording readTrace(const tTraceOptions& options)
+{
+    tRecording recording = readRecording(options.file, options.source);
+    printUnread(recording);
+    if (!options.freeRunning) return recording;
+    for (tRecordedPair& pair : recording.pairs)
+        pair.orderedPpb = pair.orderedPpb.value_or(0);
+    return recording;
+}
+
+void runInMadeTime(const tServoLibrary& library, iClock& clock, iPairSource& source,
+                   const std::string& scenario, const tDisciplineOptions& options)
+{
+    tConsole console(options.csv == "-");
+    tTraceFile trace(options.csv, options.dryRun);
+    tReport report(console);
+    tSummary summary(console);
+    tObservers observers = {&trace, &report, &summary};
+    tDiscipline discipline(library, clock, options);
+    disciplineAll(discipline, source, scenario, observers);
+}
+
+} // namespace dravikHost

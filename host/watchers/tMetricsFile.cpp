@@ -1,0 +1,76 @@
+#include "watchers/tMetricsFile.h"
+
+#include "text/quantity.h"
+
+#include <fmt/format.h>
+
+#include <cmath>
+#include <stdexcept>
+
+namespace dravikHost {
+
+namespace {
+
+struct tMetric {
+    const char* name;
+    const char* type; // counter or gauge
+    const char* help;
+    double value;
+};
+
+} // namespace
+
+void tMetricsFile::see(const tStep& step)
+{
+    if (step.failure) return;
+    latest = step;
+    pairs += step.heldBack ? 0 : 1;
+    write({step.pair.elapsedNs, {}, {}});
+}
+
+void tMetricsFile::see(const tSilence& silence) { write(silence); }
+
+void tMetricsFile::write(const tSilence& now)
+{
+    if (path.empty()) return;
+    if (writtenNs && now.elapsedNs - *writtenNs < kSecondNs) return;
+    const bool isFirst = !writtenNs;
+    writtenNs = now.elapsedNs;
+    try {
+        replaceText(path, text(now));
+        failing = false;
+    } catch (const std::runtime_error& failure) {
+        if (isFirst) throw;
+        if (!failing) console.note(now.elapsedNs, failure.what());
+        failing = true;
+    }
+}
+
+std::string tMetricsFile::text(const tSilence& now) const
+{
+    const double unknown = std::nan("");
+    const double errorNs = now.holdoverNs ? now.errorNs.value_or(unknown) : 0;
+    const tMetric metrics[] = {
+        {"dravik_offset_seconds", "gauge", "Clock minus reference, as measured last.",
+         secondsOf(latest.pair.errorNs())},
+        {"dravik_frequency_offset", "gauge", "Offset of the clock's rate in force, a fraction.",
+         latest.inForcePpb * 1e-9},
+        {"dravik_locked", "gauge", "Whether the servo is locked.", latest.locked ? 1.0 : 0.0},
+        {"dravik_holdover_seconds", "gauge", "Since the reference fell silent, 0 if it has not.",
+         secondsOf(now.holdoverNs.value_or(0))},
+        {"dravik_estimated_error_seconds", "gauge",
+         "Deviation of the clock's error in holdover, 0 outside of it.", secondsOf(errorNs)},
+        {"dravik_pairs_total", "counter", "Pairs handed to the servo.", static_cast<double>(pairs)},
+        {"dravik_locks_lost_total", "counter", "Locks lost.",
+         static_cast<double>(latest.locksLost)},
+        {"dravik_steps_total", "counter", "Steps of the clock.", static_cast<double>(latest.steps)},
+    };
+    std::string text;
+    for (const tMetric& metric : metrics) {
+        text += fmt::format("# HELP {0} {1}\n# TYPE {0} {2}\n{0} {3:.9g}\n", metric.name,
+                            metric.help, metric.type, metric.value);
+    }
+    return text;
+}
+
+} // namespace dravikHost

@@ -1,0 +1,79 @@
+#include "watchers/tReport.h"
+
+#include "text/quantity.h"
+
+#include <fmt/format.h>
+
+namespace dravikHost {
+
+namespace {
+
+double valueOf(const tHostCalls& calls, tHostOperation operation)
+{
+    const tHostCall* const call = findCall(calls, operation);
+    return call != nullptr ? static_cast<double>(call->value) : 0;
+}
+
+std::string eventText(const tStep& step)
+{
+    const double orderedPpb = valueOf(step.calls, kSetFrequency);
+    const std::string error = signedDurationText(step.pair.errorNs());
+    switch (step.event) {
+    case kFrequencyMeasured: // the correction, the other way round, is how far it had been off
+        return fmt::format("frequency measured: {} off, now steered by {}",
+                           offsetText(valueOf(step.calls, kGetFrequency) - orderedPpb),
+                           offsetText(orderedPpb));
+    case kFrequencyAtLimit:
+        return fmt::format("frequency at its limit, {}", offsetText(orderedPpb));
+    case kStepped:
+        return fmt::format("stepped by {}", signedDurationText(valueOf(step.calls, kStepTime)));
+    case kNotStepped:
+        return fmt::format("no step needed, error {}", error);
+    case kLockGained:
+        return fmt::format("locked, error {}", error);
+    case kLockMissed:
+        return fmt::format("lock missed, error {}", error);
+    case kLockLost:
+        return fmt::format("lock lost, error {}", error);
+    case kNothingNew:
+        break;
+    }
+    return "";
+}
+
+} // namespace
+
+void tReport::begin(const std::string& scenario, const tHostCalls& /*calls*/)
+{
+    console.print(scenario + "\n");
+}
+
+void tReport::see(const tStep& step)
+{
+    if (step.heldBack || step.failure) return;
+    const int64_t elapsedNs = step.pair.elapsedNs;
+    if (step.event != kNothingNew) console.note(elapsedNs, eventText(step));
+    if (!step.tuning.empty()) console.note(elapsedNs, step.tuning);
+    console.progress(elapsedNs, [&step] {
+        return fmt::format("{}, error {}", step.locked ? "locked" : "not locked",
+                           signedDurationText(step.pair.errorNs()));
+    });
+}
+
+void tReport::see(const tSilence& silence)
+{
+    if (!silence.holdoverNs) return;
+    console.progress(silence.elapsedNs, [&silence] {
+        return fmt::format("holdover for {}, error about {}", durationText(*silence.holdoverNs),
+                           silence.errorNs ? durationText(*silence.errorNs) : "unknown");
+    });
+}
+
+void tReport::note(int64_t elapsedNs, const std::string& text) { console.note(elapsedNs, text); }
+
+void tReport::end(const std::string& remarks)
+{
+    if (!remarks.empty()) console.print(remarks + "\n");
+}
+
+} // namespace dravikHost

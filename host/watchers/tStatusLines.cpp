@@ -1,0 +1,68 @@
+#include "watchers/tStatusLines.h"
+
+#include "text/quantity.h"
+
+#include <fmt/format.h>
+
+#include <algorithm>
+
+namespace dravikHost {
+
+namespace {
+
+std::string headText(int64_t elapsedNs)
+{
+    return fmt::format("dravik-host[{}]:", secondsText(elapsedNs, 3));
+}
+
+int stateOf(const tStep& step)
+{
+    if (step.locked) return 2;
+    return step.stepNs != 0 ? 1 : 0;
+}
+
+} // namespace
+
+void tStatusLines::see(const tStep& step)
+{
+    if (!intervalNs || step.failure) return;
+    if (*intervalNs == 0) {
+        printPair(step);
+    } else {
+        printStretch(step);
+    }
+}
+
+void tStatusLines::printPair(const tStep& step)
+{
+    console.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}\n",
+                              headText(step.pair.elapsedNs), step.pair.errorNs(), stateOf(step),
+                              0 - step.inForcePpb));
+}
+
+void tStatusLines::printStretch(const tStep& step)
+{
+    const int64_t elapsedNs = step.pair.elapsedNs;
+    figures.add(step.pair, step.inForcePpb);
+    if (!lineNs) lineNs = elapsedNs;
+    if (elapsedNs - *lineNs < *intervalNs) return;
+    console.print(fmt::format("{} rms {:>4.0f} max {:>4.0f} freq {:>+7.0f} +/- {:>3.0f}\n",
+                              headText(elapsedNs), figures.rmsNs(), figures.peakNs(),
+                              0 - figures.meanPpb(), figures.deviationPpb()));
+    lineNs = elapsedNs;
+    figures = {};
+}
+
+// At most once a second.
+void tStatusLines::see(const tSilence& silence)
+{
+    if (!intervalNs || !silence.holdoverNs) return;
+    if (lineNs && silence.elapsedNs - *lineNs < std::max(*intervalNs, kSecondNs)) return;
+    lineNs = silence.elapsedNs;
+    console.print(
+        fmt::format("{} holdover for {}, error {}\n", headText(silence.elapsedNs),
+                    durationText(*silence.holdoverNs),
+                    silence.errorNs ? "about " + durationText(*silence.errorNs) : "unknown"));
+}
+
+} // namespace dravikHost

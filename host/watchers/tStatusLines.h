@@ -1,0 +1,41 @@
+#pragma once
+
+#include "loop/tRunningFigures.h"
+#include "loop/tStep.h"
+#include "watchers/tConsole.h"
+
+#include <optional>
+
+namespace dravikHost {
+
+// Status lines in the manner of the field's tools, for each pair or for all pairs of a stretch:
+//
+//     dravik-host[12.345]: offset        -23 s2 freq  +12345
+//     dravik-host[60.000]: rms   23 max   45 freq  +12345 +/-   12
+//     dravik-host[90.000]: holdover for 20 s, error about 34 ns
+//
+// The offset is clock minus reference, in ns. The state is s0 before the lock, s1 if the clock was
+// stepped, s2 when locked. Freq is by how many ppb the clock was found to be fast: minus the offset
+// in force.
+class tStatusLines : public iStepObserver
+{
+public:
+    // A line at most each time; 0: for each pair; nothing: never. The console is borrowed.
+    tStatusLines(std::optional<int64_t> intervalNs, tConsole& console)
+        : intervalNs(intervalNs), console(console)
+    {}
+
+    void see(const tStep& step) override;
+    void see(const tSilence& silence) override;
+
+private:
+    void printPair(const tStep& step);
+    void printStretch(const tStep& step);
+
+    std::optional<int64_t> intervalNs;
+    tConsole& console;
+    tRunningFigures figures; // since the last line
+    std::optional<int64_t> lineNs;
+};
+
+} // namespace dravikHost

@@ -1,0 +1,30 @@
+#pragma once
+
+#include "loop/tStep.h"
+#include "text/files.h"
+
+#include <optional>
+#include <string>
+
+namespace dravikHost {
+
+// Every pair and every host call as one row of a CSV file, in the order they happened. What did not
+// reach the clock in a dry run is an order held back, not a call.
+class tTraceFile : public iStepObserver
+{
+public:
+    tTraceFile(const std::string& path, bool dryRun); // "": none is written; "-": stdout
+
+    void begin(const std::string& scenario, const tHostCalls& calls) override;
+    void see(const tStep& step) override;
+    void end(const std::string& remarks) override;
+    using iStepObserver::see;
+
+private:
+    void addCalls(int64_t elapsedNs, const tHostCalls& calls);
+
+    std::optional<tOutputFile> file;
+    bool dryRun;
+};
+
+} // namespace dravikHost
