@@ -237,7 +237,7 @@ for name in isSeeded clearHistory getTime writeServoConfigJson readServoConfigJs
 done > "$scratch/rest.c"
 "$cc" -shared -fPIC -I "$include" -o "$scratch/bad.so" "$scratch/bad.c" "$scratch/rest.c"
 check "refused by the clock" 1 \
-    'adjustTime failed with -1: \{"message":"an offset of 2000000000 ppb is beyond the clock.s 500000 ppb"\}$' \
+    'adjustTime failed with -1: \{"message": "an offset of 2000000000 ppb is beyond the clock.s 500000 ppb"\}$' \
     simulate --library "$scratch/bad.so"
 
 # A plug-in that gives back all that it was told, in one document of any length.
@@ -265,7 +265,7 @@ printf 'int zvckmservo_%s;\n' isSeeded clearHistory getTime adjustTime > "$scrat
 "$cc" -shared -fPIC -I "$include" -o "$scratch/echo.so" "$scratch/echo.c" "$scratch/rest.c"
 show() { "${host[@]}" show --library "$scratch/echo.so" "$@"; }
 expect "metadata made of a type" \
-    '{"selectedTRInstID":"selected","TRs":{"selected":{"type":"a \"b\" \\ \n"}}}' \
+    '{"selectedTRInstID": "selected", "TRs": {"selected": {"type": "a \"b\" \\ \n"}}}' \
     "$(show --reference-type $'a "b" \\ \n')"
 printf '%5000s' end > "$scratch/long"
 expect "metadata first, and no limit of length" "meta$(cat "$scratch/long")" \

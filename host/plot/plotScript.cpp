@@ -1,8 +1,7 @@
-#include "plot/plotScript.h"
+#include "plot/plot.h"
 
 #include "maths/median.h"
 #include "metrics/tMeasured.h"
-#include "plot/stabilityPanels.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>

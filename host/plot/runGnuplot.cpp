@@ -1,4 +1,4 @@
-#include "plot/runGnuplot.h"
+#include "plot/plot.h"
 
 #include "text/files.h"
 

@@ -1,4 +1,4 @@
-#include "plot/stabilityPanels.h"
+#include "plot/plot.h"
 
 #include "metrics/masks.h"
 #include "text/quantity.h"

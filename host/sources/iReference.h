@@ -1,7 +1,12 @@
 #pragma once
 
+#include "clocks/iClock.h"
+
 #include <cstdint>
+#include <functional>
+#include <memory>
 #include <optional>
+#include <string>
 
 namespace dravikHost {
 
@@ -24,5 +29,21 @@ public:
     // Samples so far that could not be used as they came.
     virtual int64_t unusable() const { return 0; }
 };
+
+// "realtime", "phc:DEVICE", "shm:UNIT" or "sock:PATH".
+bool isReferenceName(const std::string& name);
+
+// Whether it is read at the pace of this program; the others come at the producer's.
+bool isReadOnDemand(const std::string& name);
+
+// Throws std::runtime_error that names what cannot be opened.
+std::unique_ptr<iReference> openReference(const std::string& name, int64_t intervalNs);
+
+// The kinds of references, each in the file of its name. Their constructors may throw
+// std::runtime_error.
+std::unique_ptr<iReference> clockReference(int64_t intervalNs,
+                                           std::function<tCrossReading()> reader);
+std::unique_ptr<iReference> sharedMemoryReference(int unit);
+std::unique_ptr<iReference> socketReference(const std::string& path);
 
 } // namespace dravikHost

@@ -1,10 +1,7 @@
-#include "sources/openReference.h"
+#include "sources/iReference.h"
 
 #include "clocks/systemTime.h"
 #include "clocks/tPtpDevice.h"
-#include "sources/tClockReference.h"
-#include "sources/tSharedMemoryReference.h"
-#include "sources/tSocketReference.h"
 #include "text/words.h"
 
 #include <charconv>
@@ -40,16 +37,14 @@ bool isReadOnDemand(const std::string& name)
 
 std::unique_ptr<iReference> openReference(const std::string& name, int64_t intervalNs)
 {
-    if (const auto unit = unitIn(name)) return std::make_unique<tSharedMemoryReference>(*unit);
-    if (const auto path = afterPrefix(name, "sock:"))
-        return std::make_unique<tSocketReference>(*path);
+    if (const auto unit = unitIn(name)) return sharedMemoryReference(*unit);
+    if (const auto path = afterPrefix(name, "sock:")) return socketReference(*path);
     if (const auto path = afterPrefix(name, "phc:")) {
         const auto device = std::make_shared<tPtpDevice>(*path);
         device->crossRead(); // one that cannot be read at all is told at once
-        return std::make_unique<tClockReference>(intervalNs,
-                                                 [device] { return device->crossRead(); });
+        return clockReference(intervalNs, [device] { return device->crossRead(); });
     }
-    return std::make_unique<tClockReference>(intervalNs, readSystemItself);
+    return clockReference(intervalNs, readSystemItself);
 }
 
 } // namespace dravikHost

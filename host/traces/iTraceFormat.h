@@ -3,6 +3,7 @@
 #include "traces/tRecordingBuilder.h"
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <string_view>
 
@@ -29,5 +30,10 @@ public:
 // Logs tell differences of time and moments of their own. Their references start here, so that no
 // difference, however negative, takes a clock below zero.
 constexpr uint64_t kMadeUpStartNs = 1'700'000'000'000'000'000;
+
+// The formats that there are, each in the file of its name.
+std::unique_ptr<iTraceFormat> csvFormat();
+std::unique_ptr<iTraceFormat> daemonLogFormat();
+std::unique_ptr<iTraceFormat> refclocksLogFormat();
 
 } // namespace dravikHost

@@ -1,36 +1,34 @@
 #include "text/files.h"
 #include "text/words.h"
 #include "traces/iTraceFormat.h"
-#include "traces/tCsvFormat.h"
-#include "traces/tDaemonLogFormat.h"
-#include "traces/tRefclocksLogFormat.h"
 
 #include <fmt/format.h>
 
-#include <array>
+#include <memory>
 #include <stdexcept>
+#include <vector>
 
 namespace dravikHost {
 
 namespace {
 
-class tFormats
-{
-public:
-    // Null if no format recognises the line.
-    iTraceFormat* of(std::string_view line)
-    {
-        for (iTraceFormat* const format : formats)
-            if (format->recognises(line)) return format;
-        return nullptr;
-    }
+using tFormats = std::vector<std::unique_ptr<iTraceFormat>>;
 
-private:
-    tCsvFormat csv;
-    tDaemonLogFormat daemonLog;
-    tRefclocksLogFormat refclocksLog;
-    const std::array<iTraceFormat*, 3> formats = {&csv, &daemonLog, &refclocksLog};
-};
+tFormats allFormats()
+{
+    tFormats formats;
+    for (const auto make : {csvFormat, daemonLogFormat, refclocksLogFormat})
+        formats.push_back(make());
+    return formats;
+}
+
+// Null if no format recognises the line.
+iTraceFormat* formatOf(std::string_view line, const tFormats& formats)
+{
+    for (const auto& format : formats)
+        if (format->recognises(line)) return format.get();
+    return nullptr;
+}
 
 } // namespace
 
@@ -39,13 +37,13 @@ tRecording readRecording(const std::string& path, const std::string& sourceName)
 {
     const std::string text = readText(path);
     const std::string name = path == "-" ? "the standard input" : path;
-    tFormats formats;
+    const tFormats formats = allFormats();
     iTraceFormat* format = nullptr;
     tRecordingBuilder builder(sourceName);
     std::string_view rest = text;
     for (int64_t number = 1; !rest.empty(); ++number) {
         const std::string_view line = takeLine(rest);
-        if (format == nullptr) format = formats.of(line);
+        if (format == nullptr) format = formatOf(line, formats);
         const std::string why =
             format != nullptr ? format->read(line, builder) : "in front of the first measurement";
         if (!why.empty()) builder.setUnread(number, why);

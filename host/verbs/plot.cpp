@@ -1,8 +1,7 @@
 #include "verbs/verbs.h"
 
 #include "metrics/masks.h"
-#include "plot/plotScript.h"
-#include "plot/runGnuplot.h"
+#include "plot/plot.h"
 #include "text/files.h"
 #include "verbs/shared.h"
 

@@ -2,7 +2,7 @@
 
 #include "clocks/openClock.h"
 #include "loop/tLiveRun.h"
-#include "sources/openReference.h"
+#include "sources/iReference.h"
 #include "sources/tLiveSource.h"
 #include "verbs/shared.h"
 #include "watchers/tMetricsFile.h"

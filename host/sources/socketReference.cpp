@@ -1,5 +1,6 @@
-#include "sources/tSocketReference.h"
+#include "sources/iReference.h"
 
+#include "text/files.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
@@ -8,6 +9,7 @@
 #include <cmath>
 #include <cstring>
 #include <poll.h>
+#include <string>
 #include <sys/socket.h>
 #include <sys/stat.h>
 #include <sys/un.h>
@@ -16,6 +18,27 @@
 namespace dravikHost {
 
 namespace {
+
+// Samples as datagrams, in the form that refclock producers write into the socket of a time server:
+// when it was, by the machine's clock, and by how much the true time was later.
+class tSocketReference : public iReference
+{
+public:
+    // Makes the socket, which ends with the object. One that nobody listens to any more is
+    // replaced. Throws std::runtime_error.
+    explicit tSocketReference(const std::string& path);
+    tSocketReference(const tSocketReference&) = delete;
+    tSocketReference& operator=(const tSocketReference&) = delete;
+    ~tSocketReference() override;
+
+    std::optional<tReferenceSample> next(int64_t atMostNs) override;
+    int64_t unusable() const override { return unusableCount; }
+
+private:
+    std::string name;
+    tDescriptor socket;
+    int64_t unusableCount = 0;
+};
 
 // The members after the time, which has 32 or 64 bits for seconds and as many for microseconds.
 struct tRest {
@@ -83,8 +106,6 @@ bool isAbandoned(const sockaddr_un& address)
     return connect(probe.get(), general, sizeof address) != 0 && errno == ECONNREFUSED;
 }
 
-} // namespace
-
 tSocketReference::tSocketReference(const std::string& path) : name(path), socket(openSocket())
 {
     if (socket.get() < 0) fail(errno, path);
@@ -109,6 +130,13 @@ std::optional<tReferenceSample> tSocketReference::next(int64_t atMostNs)
     const auto sample = decode(datagram, static_cast<size_t>(size));
     if (!sample) ++unusableCount;
     return sample;
+}
+
+} // namespace
+
+std::unique_ptr<iReference> socketReference(const std::string& path)
+{
+    return std::make_unique<tSocketReference>(path);
 }
 
 } // namespace dravikHost

@@ -1,4 +1,4 @@
-#include "sources/tSharedMemoryReference.h"
+#include "sources/iReference.h"
 
 #include "clocks/systemTime.h"
 #include "text/quantity.h"
@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cstddef>
 #include <cstring>
 #include <ctime>
 #include <stdexcept>
@@ -17,6 +18,30 @@
 namespace dravikHost {
 
 namespace {
+
+// Samples in a shared memory segment as NTP servers' drivers read it: one at a time, which the
+// producer marks as valid and the consumer as taken. The producer may have a time_t of 32 or of 64
+// bits, which the size of the segment tells.
+class tSharedMemoryReference : public iReference
+{
+public:
+    // Attaches the segment of that unit, or makes one for the producer to find. Throws
+    // std::runtime_error.
+    explicit tSharedMemoryReference(int unit);
+    tSharedMemoryReference(const tSharedMemoryReference&) = delete;
+    tSharedMemoryReference& operator=(const tSharedMemoryReference&) = delete;
+    ~tSharedMemoryReference() override;
+
+    std::optional<tReferenceSample> next(int64_t atMostNs) override;
+    int64_t unusable() const override { return unusableCount; }
+
+private:
+    std::optional<tReferenceSample> take();
+
+    unsigned char* segment = nullptr;
+    bool wide = false; // time_t of 64 bits
+    int64_t unusableCount = 0;
+};
 
 // The members of the segment, by their offsets in bytes. Reference is the true time of an event
 // and system the machine's at the same moment; both have microseconds, and nanoseconds that older
@@ -112,8 +137,6 @@ int openSegment(int unit)
     return made;
 }
 
-} // namespace
-
 tSharedMemoryReference::tSharedMemoryReference(int unit)
 {
     const int id = openSegment(unit);
@@ -158,6 +181,13 @@ std::optional<tReferenceSample> tSharedMemoryReference::take()
         return tReferenceSample{*systemNs, *referenceNs, false};
     ++unusableCount;
     return std::nullopt;
+}
+
+} // namespace
+
+std::unique_ptr<iReference> sharedMemoryReference(int unit)
+{
+    return std::make_unique<tSharedMemoryReference>(unit);
 }
 
 } // namespace dravikHost

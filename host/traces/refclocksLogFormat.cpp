@@ -1,4 +1,4 @@
-#include "traces/tRefclocksLogFormat.h"
+#include "traces/iTraceFormat.h"
 
 #include "text/quantity.h"
 #include "text/words.h"
@@ -9,6 +9,23 @@
 namespace dravikHost {
 
 namespace {
+
+// chrony's refclocks.log, one line a measurement:
+//
+//     2026-11-23 14:33:27.000000 PPS0    7 N 1  4.900000e-07 -6.741777e-07  1.000e-06
+//
+// with date and time, the name of the reference clock, its place in the polling interval, leap
+// status, pulse, raw offset, cooked offset, dispersion. Cooked is corrected by the configured
+// offset; it is in seconds and positive if the local clock is slow. Lines with "-" in place of the
+// place are what the filter made of several measurements. What was done to the clock is told
+// elsewhere.
+class tRefclocksLogFormat : public iTraceFormat
+{
+public:
+    const char* name() const override { return "chrony's refclocks.log"; }
+    bool recognises(std::string_view line) const override;
+    std::string read(std::string_view line, tRecordingBuilder& builder) override;
+};
 
 enum tWord { kDate, kTime, kName, kPlace, kLeap, kPulse, kRaw, kCooked, kDispersion, kWords };
 
@@ -53,8 +70,6 @@ std::optional<int64_t> momentNs(std::string_view date, std::string_view time)
     return minutes * 60'000'000'000 + *secondNs;
 }
 
-} // namespace
-
 bool tRefclocksLogFormat::recognises(std::string_view line) const
 {
     const tWords words = split(line);
@@ -77,6 +92,13 @@ std::string tRefclocksLogFormat::read(std::string_view line, tRecordingBuilder& 
     pair.referenceNs = static_cast<uint64_t>(*timeNs);
     pair.clockNs = pair.referenceNs + static_cast<uint64_t>(std::llround(pair.errorNs));
     return builder.add(words[kName], pair);
+}
+
+} // namespace
+
+std::unique_ptr<iTraceFormat> refclocksLogFormat()
+{
+    return std::make_unique<tRefclocksLogFormat>();
 }
 
 } // namespace dravikHost
