@@ -1,4 +1,4 @@
-# What an installation has: the library, its two headers, a pkg-config file and a CMake package for
+# What an installation has: the library, its three headers, a pkg-config file and a CMake package for
 # hosts, the default documents, and the reference host. All of it follows DESTDIR.
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)

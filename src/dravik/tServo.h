@@ -7,6 +7,7 @@
 #include "dravik/tServoStateIdle.h"
 #include "dravik/tServoStatePhaseLock.h"
 #include "dravik/tServoStateSnapTime.h"
+#include "zvckmservo/parameters.h"
 #include "zvckmservo/servo.h"
 #include "zvplat/quarks/synchronization.h"
 
@@ -76,6 +77,11 @@ protected:
 private:
     iServoState& stateOf(tServoStateId id);
 
+    static constexpr double initial(zvckmservo_ParameterIndex index)
+    {
+        return zvckmservo_parameters[index].initial;
+    }
+
     // One member under the lock; nothing can throw in between.
     template <class T> T read(const T& member) const;
     template <class T> void write(T& member, T value);
@@ -89,19 +95,20 @@ private:
     tServoStateSnapTime snapTimeState;
     iServoState* currentState; // one of the four above, never null
 
-    double frequencyLockGain = 1.0;
-    double phaseLockGain = 0.55;
-    double phaseLockCoefficientA = 2.0;
-    double phaseLockCoefficientB = 1.0;
-    double phaseLockCoefficientC = 1.0;
-    double snapTimeThreshold = 1e-6;
+    double frequencyLockGain = initial(zvckmservo_kFrequencyLockGain);
+    double phaseLockGain = initial(zvckmservo_kPhaseLockGain);
+    double phaseLockCoefficientA = initial(zvckmservo_kPhaseLockCoefficientA);
+    double phaseLockCoefficientB = initial(zvckmservo_kPhaseLockCoefficientB);
+    double phaseLockCoefficientC = initial(zvckmservo_kPhaseLockCoefficientC);
+    double snapTimeThreshold = initial(zvckmservo_kSnapTimeThreshold);
     double maxFrequencyOffset = 0.0; // from the host, at construction
     double minFrequencyOffset = 0.0;
-    bool spikeFilterEnabled = false;
-    uint32_t spikeFilterHistorySize = 5;
-    double spikeFilterMaxThreshold = 1.0;
-    double spikeFilterMinThreshold = 2.5e-8;
-    double spikeFilterGrowthFactor = 3.0;
+    bool spikeFilterEnabled = initial(zvckmservo_kSpikeFilterEnabled) != 0;
+    uint32_t spikeFilterHistorySize =
+        static_cast<uint32_t>(initial(zvckmservo_kSpikeFilterHistorySize));
+    double spikeFilterMaxThreshold = initial(zvckmservo_kSpikeFilterMaxThreshold);
+    double spikeFilterMinThreshold = initial(zvckmservo_kSpikeFilterMinThreshold);
+    double spikeFilterGrowthFactor = initial(zvckmservo_kSpikeFilterGrowthFactor);
 
     std::string timeReferenceType; // of the last metadata applied; empty at first
 };

@@ -7,8 +7,8 @@
 #include <fstream>
 
 // The configuration document, in and out, and the file that one is loaded from. It is one JSON
-// object of numbers, the flag included; the order below is the order in which a document is applied
-// and given out. Every operation holds the lock from end to end.
+// object of numbers, the flag included, applied and given out in the order of the table of
+// parameters. Every operation holds the lock from end to end.
 
 namespace zvckmDravik {
 
@@ -43,34 +43,18 @@ void tServo::writeServoConfigJson(const std::string& json)
     const auto apply = [&](const char* key, auto get, auto set) {
         if (config.hasKey(key)) (this->*set)((config.*get)(key));
     };
-    apply("frequencyLockGain", &tJsonConfig::getDouble, &tServo::setFrequencyLockGain);
-    apply("phaseLockGain", &tJsonConfig::getDouble, &tServo::setPhaseLockGain);
-    apply("phaseLockCoefficientA", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientA);
-    apply("phaseLockCoefficientB", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientB);
-    apply("phaseLockCoefficientC", &tJsonConfig::getDouble, &tServo::setPhaseLockCoefficientC);
-    apply("snapTimeThreshold", &tJsonConfig::getDouble, &tServo::setSnapTimeThreshold);
-    apply("spikeFilterEnabled", &tJsonConfig::getBool, &tServo::setSpikeFilterEnabled);
-    apply("spikeFilterHistorySize", &tJsonConfig::getInteger, &tServo::setSpikeFilterHistorySize);
-    apply("spikeFilterMaxThreshold", &tJsonConfig::getDouble, &tServo::setSpikeFilterMaxThreshold);
-    apply("spikeFilterMinThreshold", &tJsonConfig::getDouble, &tServo::setSpikeFilterMinThreshold);
-    apply("spikeFilterGrowthFactor", &tJsonConfig::getDouble, &tServo::setSpikeFilterGrowthFactor);
+#define APPLY(key, Key, Kind, ...) apply(#key, &tJsonConfig::get##Kind, &tServo::set##Key);
+    ZVCKMSERVO_PARAMETERS(APPLY)
+#undef APPLY
 }
 
 std::string tServo::readServoConfigJson()
 {
     const tMutexGuard lock(mutex);
     tJsonConfig config;
-    config.setDouble("frequencyLockGain", frequencyLockGain);
-    config.setDouble("phaseLockGain", phaseLockGain);
-    config.setDouble("phaseLockCoefficientA", phaseLockCoefficientA);
-    config.setDouble("phaseLockCoefficientB", phaseLockCoefficientB);
-    config.setDouble("phaseLockCoefficientC", phaseLockCoefficientC);
-    config.setDouble("snapTimeThreshold", snapTimeThreshold);
-    config.setBool("spikeFilterEnabled", spikeFilterEnabled);
-    config.setInteger("spikeFilterHistorySize", spikeFilterHistorySize);
-    config.setDouble("spikeFilterMaxThreshold", spikeFilterMaxThreshold);
-    config.setDouble("spikeFilterMinThreshold", spikeFilterMinThreshold);
-    config.setDouble("spikeFilterGrowthFactor", spikeFilterGrowthFactor);
+#define ADD(key, Key, Kind, ...) config.set##Kind(#key, key);
+    ZVCKMSERVO_PARAMETERS(ADD)
+#undef ADD
     return config.toString();
 }
 

@@ -1,4 +1,5 @@
 #include "dravik/tServo.h"
+#include "zvckmservo/parameters.h"
 #include "zverr/Exception.h"
 
 // The eleven tuning parameters: each getter and setter under the lock for its one member, with the
@@ -8,22 +9,14 @@ namespace zvckmDravik {
 
 namespace {
 
-template <class T> struct tBounds {
-    T lowest;
-    T highest;
-};
-
-constexpr tBounds<double> kGain{1e-9, 10.0};
-constexpr tBounds<double> kCoefficient{-10.0, 10.0};
-constexpr tBounds<double> kSnapTimeThreshold{1e-8, 10.0}; // seconds
-constexpr tBounds<uint32_t> kHistorySize{2, 100};
-constexpr tBounds<double> kThreshold{1e-9, 10.0}; // seconds per second
-constexpr tBounds<double> kGrowthFactor{1.001, 100.0};
-
 // Refuses a value that is not a number too.
-template <class T> void check(T value, const tBounds<T>& bounds, const zverr_RaisingSite& site)
+template <class T>
+void check(T value, zvckmservo_ParameterIndex index, const zverr_RaisingSite& site)
 {
-    if (!(value >= bounds.lowest && value <= bounds.highest)) zverr::raise(site);
+    const zvckmservo_Parameter& bounds = zvckmservo_parameters[index];
+    if (!(value >= static_cast<T>(bounds.lowest) && value <= static_cast<T>(bounds.highest))) {
+        zverr::raise(site);
+    }
 }
 
 } // namespace
@@ -71,37 +64,37 @@ double tServo::getSpikeFilterGrowthFactor() const { return read(spikeFilterGrowt
 
 void tServo::setFrequencyLockGain(double value)
 {
-    check(value, kGain, zverr::kAtFrequencyLockGain);
+    check(value, zvckmservo_kFrequencyLockGain, zverr::kAtFrequencyLockGain);
     write(frequencyLockGain, value);
 }
 
 void tServo::setPhaseLockGain(double value)
 {
-    check(value, kGain, zverr::kAtPhaseLockGain);
+    check(value, zvckmservo_kPhaseLockGain, zverr::kAtPhaseLockGain);
     write(phaseLockGain, value);
 }
 
 void tServo::setPhaseLockCoefficientA(double value)
 {
-    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientA);
+    check(value, zvckmservo_kPhaseLockCoefficientA, zverr::kAtPhaseLockCoefficientA);
     write(phaseLockCoefficientA, value);
 }
 
 void tServo::setPhaseLockCoefficientB(double value)
 {
-    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientB);
+    check(value, zvckmservo_kPhaseLockCoefficientB, zverr::kAtPhaseLockCoefficientB);
     write(phaseLockCoefficientB, value);
 }
 
 void tServo::setPhaseLockCoefficientC(double value)
 {
-    check(value, kCoefficient, zverr::kAtPhaseLockCoefficientC);
+    check(value, zvckmservo_kPhaseLockCoefficientC, zverr::kAtPhaseLockCoefficientC);
     write(phaseLockCoefficientC, value);
 }
 
 void tServo::setSnapTimeThreshold(double value)
 {
-    check(value, kSnapTimeThreshold, zverr::kAtSnapTimeThreshold);
+    check(value, zvckmservo_kSnapTimeThreshold, zverr::kAtSnapTimeThreshold);
     write(snapTimeThreshold, value);
 }
 
@@ -109,25 +102,25 @@ void tServo::setSpikeFilterEnabled(bool value) { write(spikeFilterEnabled, value
 
 void tServo::setSpikeFilterHistorySize(uint32_t value)
 {
-    check(value, kHistorySize, zverr::kAtSpikeFilterHistorySize);
+    check(value, zvckmservo_kSpikeFilterHistorySize, zverr::kAtSpikeFilterHistorySize);
     write(spikeFilterHistorySize, value);
 }
 
 void tServo::setSpikeFilterMaxThreshold(double value)
 {
-    check(value, kThreshold, zverr::kAtSpikeFilterMaxThreshold);
+    check(value, zvckmservo_kSpikeFilterMaxThreshold, zverr::kAtSpikeFilterMaxThreshold);
     write(spikeFilterMaxThreshold, value);
 }
 
 void tServo::setSpikeFilterMinThreshold(double value)
 {
-    check(value, kThreshold, zverr::kAtSpikeFilterMinThreshold);
+    check(value, zvckmservo_kSpikeFilterMinThreshold, zverr::kAtSpikeFilterMinThreshold);
     write(spikeFilterMinThreshold, value);
 }
 
 void tServo::setSpikeFilterGrowthFactor(double value)
 {
-    check(value, kGrowthFactor, zverr::kAtSpikeFilterGrowthFactor);
+    check(value, zvckmservo_kSpikeFilterGrowthFactor, zverr::kAtSpikeFilterGrowthFactor);
     write(spikeFilterGrowthFactor, value);
 }
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "zvckmservo/parameters.h"
 #include "zverr/status.h"
 
 // Every place of the plug-in that raises a failure and says so in the payload, with the code.
@@ -96,16 +97,19 @@ constexpr zverr_RaisingSite kAtGetOptionalString = {
     jsonErrorsTypeMismatch, "errCode", {"zvsynctools_cjson/jsonHelperFunctions", 50, kComponent}};
 
 // The setters of the tuning parameters.
-constexpr const char* kServoFile = "dravik/tServo";
-constexpr auto kAtFrequencyLockGain = invalidParameterAt(kServoFile, 77);
-constexpr auto kAtPhaseLockGain = invalidParameterAt(kServoFile, 98);
-constexpr auto kAtPhaseLockCoefficientA = invalidParameterAt(kServoFile, 119);
-constexpr auto kAtPhaseLockCoefficientB = invalidParameterAt(kServoFile, 140);
-constexpr auto kAtPhaseLockCoefficientC = invalidParameterAt(kServoFile, 161);
-constexpr auto kAtSnapTimeThreshold = invalidParameterAt(kServoFile, 182);
-constexpr auto kAtSpikeFilterHistorySize = invalidParameterAt(kServoFile, 235);
-constexpr auto kAtSpikeFilterMaxThreshold = invalidParameterAt(kServoFile, 256);
-constexpr auto kAtSpikeFilterMinThreshold = invalidParameterAt(kServoFile, 277);
-constexpr auto kAtSpikeFilterGrowthFactor = invalidParameterAt(kServoFile, 298);
+constexpr auto outOfBounds(zvckmservo_ParameterIndex index)
+{
+    return invalidParameterAt("dravik/tServo", zvckmservo_parameters[index].line);
+}
+constexpr auto kAtFrequencyLockGain = outOfBounds(zvckmservo_kFrequencyLockGain);
+constexpr auto kAtPhaseLockGain = outOfBounds(zvckmservo_kPhaseLockGain);
+constexpr auto kAtPhaseLockCoefficientA = outOfBounds(zvckmservo_kPhaseLockCoefficientA);
+constexpr auto kAtPhaseLockCoefficientB = outOfBounds(zvckmservo_kPhaseLockCoefficientB);
+constexpr auto kAtPhaseLockCoefficientC = outOfBounds(zvckmservo_kPhaseLockCoefficientC);
+constexpr auto kAtSnapTimeThreshold = outOfBounds(zvckmservo_kSnapTimeThreshold);
+constexpr auto kAtSpikeFilterHistorySize = outOfBounds(zvckmservo_kSpikeFilterHistorySize);
+constexpr auto kAtSpikeFilterMaxThreshold = outOfBounds(zvckmservo_kSpikeFilterMaxThreshold);
+constexpr auto kAtSpikeFilterMinThreshold = outOfBounds(zvckmservo_kSpikeFilterMinThreshold);
+constexpr auto kAtSpikeFilterGrowthFactor = outOfBounds(zvckmservo_kSpikeFilterGrowthFactor);
 
 } // namespace zverr
