@@ -1,9 +1,9 @@
 #include "zvhostq/stdpath.h"
 
+#include "zverr/tLocalStatus.h"
 #include "zverr/tStatusGuard.h"
 #include "zvhostq/stdpath_table.h"
 #include "zvhostq/stdpath_util.h"
-#include "zvhostq/tLocalStatus.h"
 
 #include <algorithm>
 #include <cctype>
@@ -19,7 +19,7 @@ constexpr const char* kSharedDirFallback = "/usr/local/zvcorp/share";
 // nothing may be thrown out of an initialiser.
 [[maybe_unused]] const bool tableIsThere = [] {
     try {
-        tLocalStatus status;
+        zverr::tLocalStatus status;
         stdpath_table::instance(&status);
         return true;
     } catch (...) {
@@ -66,7 +66,7 @@ void read_shared_dir(std::string& path, zverr_Status* status)
 {
     if (status->code < 0) return;
     zvktl::err::vector<char> content;
-    tLocalStatus reading;
+    zverr::tLocalStatus reading;
     read_whole_file(kSharedDirFile, &content, &reading);
     if (reading.code < 0) {
         path = kSharedDirFallback;

@@ -1,7 +1,7 @@
 #include "zvhostq/stdpath_table.h"
 
 #include "zvdynlib/dynload.h"
-#include "zvhostq/tLocalStatus.h"
+#include "zverr/tLocalStatus.h"
 #include "zvplat/protons/cppNewDelete/memoryAllocation.h"
 #include "zvplat/tFixedStatusAdapter.h"
 
@@ -63,7 +63,7 @@ int ask(tRelocate relocate, const char* name, char* answer)
 // What went wrong in building the table, for the life of the process.
 zverr_Status& initialisationStatus()
 {
-    static tLocalStatus status;
+    static zverr::tLocalStatus status;
     return status;
 }
 
@@ -109,7 +109,7 @@ void stdpath_table::get(const zvktl::err::string& name, zvktl::err::string* valu
 // That there is no such library or symbol is no failure: the defaults stand.
 void stdpath_table::relocateAll(zverr_Status* status)
 {
-    tLocalStatus loading;
+    zverr::tLocalStatus loading;
     const tLibrary library(zvdynlib_load(kRelocationLibrary, RTLD_NOW | RTLD_GLOBAL, &loading));
     relocate =
         reinterpret_cast<tRelocate>(zvdynlib_symbol(library.get(), kRelocationSymbol, &loading));

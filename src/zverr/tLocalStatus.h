@@ -2,7 +2,7 @@
 
 #include "zverr/errStatus.h"
 
-namespace zvhostq {
+namespace zverr {
 
 // A status that starts clean and gives its payload back at the end of its scope, raising nothing.
 struct tLocalStatus : zverr_Status {
@@ -12,4 +12,4 @@ struct tLocalStatus : zverr_Status {
     ~tLocalStatus() { zverr_releaseJson(this); }
 };
 
-} // namespace zvhostq
+} // namespace zverr
