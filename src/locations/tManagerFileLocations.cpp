@@ -9,90 +9,63 @@ using boost::filesystem::path;
 
 namespace {
 
-// A standard directory, or a warning and its usual place.
-template <class Warn> path ask(void (*getter)(std::string&), Warn warn, const char* fallback)
+// A standard directory: who tells it, its usual place, and the warning when that is taken instead.
+struct tQuery {
+    void (*get)(std::string&);
+    const char* fallback;
+    void (*warn)();
+};
+
+// clang-format off
+constexpr tQuery kMultiarchlibdir = {zvhostq::get_multiarchlibdir, "/usr/lib/arm-linux-gnueabi",
+    [] { syslog(LOG_WARNING, "zvhostq::get_multiarchlibdir() failed"); }};
+constexpr tQuery kSharedDir = {zvhostq::getZVSharedDir, "/usr/local/zvcorp/shared",
+    [] { syslog(LOG_WARNING, "zvhostq::getZVSharedDir() failed"); }};
+constexpr tQuery kBindir = {zvhostq::get_bindir, "/usr/bin",
+    [] { syslog(LOG_WARNING, "zvhostq::get_bindir() failed"); }};
+constexpr tQuery kRunstatedir = {zvhostq::get_runstatedir, "/var/run",
+    [] { syslog(LOG_WARNING, "zvhostq::get_runstatedir() failed"); }};
+constexpr tQuery kSysconfdir = {zvhostq::get_sysconfdir, "/etc",
+    [] { syslog(LOG_WARNING, "zvhostq::get_sysconfdir() failed"); }};
+constexpr tQuery kSharedstatedir = {zvhostq::get_sharedstatedir, "/var/lib",
+    [] { syslog(LOG_WARNING, "zvhostq::get_sharedstatedir() failed"); }};
+constexpr tQuery kLocalstatedir = {zvhostq::get_localstatedir, "/var",
+    [] { syslog(LOG_WARNING, "zvhostq::get_localstatedir() failed"); }};
+// clang-format on
+
+path ask(const tQuery& query)
 {
     std::string directory;
     try {
-        getter(directory);
+        query.get(directory);
     } catch (...) {
-        warn();
-        directory = fallback;
+        query.warn();
+        directory = query.fallback;
     }
     return directory;
 }
 
-path multiarchlibdir()
-{
-    return ask(
-        zvhostq::get_multiarchlibdir,
-        [] { syslog(LOG_WARNING, "zvhostq::get_multiarchlibdir() failed"); },
-        "/usr/lib/arm-linux-gnueabi");
-}
-
-path sharedDir()
-{
-    return ask(
-        zvhostq::getZVSharedDir, [] { syslog(LOG_WARNING, "zvhostq::getZVSharedDir() failed"); },
-        "/usr/local/zvcorp/shared");
-}
-
-path bindir()
-{
-    return ask(
-        zvhostq::get_bindir, [] { syslog(LOG_WARNING, "zvhostq::get_bindir() failed"); },
-        "/usr/bin");
-}
-
-path runstatedir()
-{
-    return ask(
-        zvhostq::get_runstatedir, [] { syslog(LOG_WARNING, "zvhostq::get_runstatedir() failed"); },
-        "/var/run");
-}
-
-path sysconfdir()
-{
-    return ask(
-        zvhostq::get_sysconfdir, [] { syslog(LOG_WARNING, "zvhostq::get_sysconfdir() failed"); },
-        "/etc");
-}
-
-path sharedstatedir()
-{
-    return ask(
-        zvhostq::get_sharedstatedir,
-        [] { syslog(LOG_WARNING, "zvhostq::get_sharedstatedir() failed"); }, "/var/lib");
-}
-
-path localstatedir()
-{
-    return ask(
-        zvhostq::get_localstatedir,
-        [] { syslog(LOG_WARNING, "zvhostq::get_localstatedir() failed"); }, "/var");
-}
-
 path findBaseDir(bool& standard)
 {
-    path directory = multiarchlibdir() / "zv-chronel";
+    path directory = ask(kMultiarchlibdir) / "zv-chronel";
     standard = boost::filesystem::exists(directory);
-    return standard ? directory : sharedDir() / "Chronel";
+    return standard ? directory : ask(kSharedDir) / "Chronel";
 }
 
 // The tool is looked for in the shared layout only.
 path findCommandLineTool(bool standard)
 {
-    path tool = bindir() / "zvchronelcli";
+    path tool = ask(kBindir) / "zvchronelcli";
     if (standard || boost::filesystem::exists(tool)) return tool;
-    return sharedDir() / "Chronel" / "zvchronelcli";
+    return ask(kSharedDir) / "Chronel" / "zvchronelcli";
 }
 
 // The daemon is looked for in either layout.
 path findDaemon()
 {
-    path daemon = bindir() / "zvckmd";
+    path daemon = ask(kBindir) / "zvckmd";
     if (boost::filesystem::exists(daemon)) return daemon;
-    return sharedDir() / "Chronel" / "zvckmd";
+    return ask(kSharedDir) / "Chronel" / "zvckmd";
 }
 
 } // namespace
@@ -105,13 +78,14 @@ tManagerFileLocations::tManagerFileLocations()
       timeReferencesDir(baseDir / (usesStandardLayout ? "timereferences" : "TimeReferences")),
       timekeepersDir(baseDir / (usesStandardLayout ? "timekeepers" : "TimeKeepers")),
       servosDir(baseDir / (usesStandardLayout ? "servos" : "Servos")),
-      runtimeDir(usesStandardLayout ? runstatedir() / "zv-chronel"
-                                    : runstatedir() / "zvcorp" / "Chronel"),
+      runtimeDir(usesStandardLayout ? ask(kRunstatedir) / "zv-chronel"
+                                    : ask(kRunstatedir) / "zvcorp" / "Chronel"),
       runtimeFile((runtimeDir / "runtime_ckm.json").string()),
-      configDir(usesStandardLayout ? sysconfdir() : sysconfdir() / "zvcorp" / "share" / "Chronel"),
-      stateDir(usesStandardLayout ? sharedstatedir() / "zv-chronel" : baseDir),
+      configDir(usesStandardLayout ? ask(kSysconfdir)
+                                   : ask(kSysconfdir) / "zvcorp" / "share" / "Chronel"),
+      stateDir(usesStandardLayout ? ask(kSharedstatedir) / "zv-chronel" : baseDir),
       managerConfigFile((stateDir / "ckm.json").string()),
-      syncConfigFile((sharedstatedir() / "zv-sync" / "syncConfig.txt").string()),
-      pidFile((runstatedir() / "zvckmd.pid").string()), daemonPath(findDaemon().string()),
-      logFile((localstatedir() / "log" / "zvckmd.log").string())
+      syncConfigFile((ask(kSharedstatedir) / "zv-sync" / "syncConfig.txt").string()),
+      pidFile((ask(kRunstatedir) / "zvckmd.pid").string()), daemonPath(findDaemon().string()),
+      logFile((ask(kLocalstatedir) / "log" / "zvckmd.log").string())
 {}
