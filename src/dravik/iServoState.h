@@ -33,8 +33,8 @@ public:
     iServoState(const iServoState&) = delete;
     iServoState& operator=(const iServoState&) = delete;
 
-    virtual void enter() = 0;
-    virtual void exit() = 0;
+    virtual void enter() {}
+    virtual void exit() {}
     virtual void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock) = 0;
 
 protected:

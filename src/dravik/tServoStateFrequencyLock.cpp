@@ -13,8 +13,6 @@
 
 namespace zvckmDravik {
 
-void tServoStateFrequencyLock::enter() {}
-
 void tServoStateFrequencyLock::exit() { hasFirstPair = false; }
 
 void tServoStateFrequencyLock::adjustTime(const tTimeSpan& reference, const tTimeSpan& clock)
@@ -26,12 +24,12 @@ void tServoStateFrequencyLock::adjustTime(const tTimeSpan& reference, const tTim
         return;
     }
 
-    const double newRatio = measuredRatio(reference, clock);
-    const double offset = newRatio - 1.0;
+    const double ratio = newRatio(reference, clock);
+    const double offset = ratio - 1.0;
     // Both comparisons are false for a value that is not a number.
     if (offset <= config.getMaxFrequencyOffset() && offset >= config.getMinFrequencyOffset()) {
         // Should the clock fail here, the first pair stays and the next one measures from it.
-        timekeeper.setFrequency(newRatio);
+        timekeeper.setFrequency(ratio);
         controller.setState(kStateSnapTime);
     } else {
         const double clamped = clampMaximumFirst(offset, config.getMaxFrequencyOffset(),
@@ -44,7 +42,7 @@ void tServoStateFrequencyLock::adjustTime(const tTimeSpan& reference, const tTim
 // Divides by zero on purpose: no elapsed time on the clock makes an infinity or not a number, and
 // both miss the limits.
 __attribute__((no_sanitize("float-divide-by-zero"))) double
-tServoStateFrequencyLock::measuredRatio(const tTimeSpan& reference, const tTimeSpan& clock)
+tServoStateFrequencyLock::newRatio(const tTimeSpan& reference, const tTimeSpan& clock)
 {
     const double referenceElapsed = (reference - firstReference).toSeconds();
     const double clockElapsed = (clock - firstClock).toSeconds();

@@ -10,12 +10,11 @@ class tServoStateFrequencyLock final : public iServoState
 public:
     using iServoState::iServoState;
 
-    void enter() override;
     void exit() override;
     void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock) override;
 
 private:
-    double measuredRatio(const tTimeSpan& reference, const tTimeSpan& clock);
+    double newRatio(const tTimeSpan& reference, const tTimeSpan& clock);
 
     tTimeSpan firstReference;
     tTimeSpan firstClock;

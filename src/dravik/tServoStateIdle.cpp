@@ -2,10 +2,6 @@
 
 namespace zvckmDravik {
 
-void tServoStateIdle::enter() {}
-
-void tServoStateIdle::exit() {}
-
 void tServoStateIdle::adjustTime(const tTimeSpan& /*reference*/, const tTimeSpan& /*clock*/) {}
 
 } // namespace zvckmDravik

@@ -10,8 +10,6 @@ class tServoStateIdle final : public iServoState
 public:
     using iServoState::iServoState;
 
-    void enter() override;
-    void exit() override;
     void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock) override;
 };
 

@@ -19,8 +19,6 @@ tServoStatePhaseLock::tServoStatePhaseLock(iTimekeeper& timekeeper, iServoSMCont
     : iServoState(timekeeper, controller, config), spikeFilter(config)
 {}
 
-void tServoStatePhaseLock::enter() {}
-
 void tServoStatePhaseLock::exit()
 {
     hasLastReference = false;

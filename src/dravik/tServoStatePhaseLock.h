@@ -12,7 +12,6 @@ public:
     tServoStatePhaseLock(iTimekeeper& timekeeper, iServoSMController& controller,
                          iServoConfig& config);
 
-    void enter() override;
     void exit() override;
     void adjustTime(const tTimeSpan& reference, const tTimeSpan& clock) override;
 

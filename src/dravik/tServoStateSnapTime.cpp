@@ -6,10 +6,6 @@
 
 namespace zvckmDravik {
 
-void tServoStateSnapTime::enter() {}
-
-void tServoStateSnapTime::exit() {}
-
 void tServoStateSnapTime::adjustTime(const tTimeSpan& reference, const tTimeSpan& clock)
 {
     const tTimeSpan delta = reference - clock;
