@@ -5,8 +5,9 @@
  * the other functions as often as it likes, and at last zvckmservo_finalize.
  *
  * The plug-in starts no thread and no timer. It acts only inside these calls, on the caller's
- * thread, and while it is loaded, when it settles where its default documents lie. Of the calls,
- * zvckmservo_applyMetaData alone reads a file. No exception leaves any of them. Needs C11 or C++11.
+ * thread, and while it is being loaded, when it settles where its default documents lie. Of the
+ * calls, zvckmservo_applyMetaData alone reads a file. No exception leaves any of them. Needs C11 or
+ * C++11.
  *
  * Signs: the clock is ahead when its time is greater than the reference's; a positive frequency
  * offset makes the clock run faster; a positive step moves it forward. */
@@ -135,8 +136,10 @@ ZVCKMSERVO_API void zvckmservo_clearHistory(zvckmservo_HostTable* host, zverr_St
  *                             and from the pairs before (beyond that, differences wrap)
  * The first two pairs measure and correct the clock's rate, the third steps the clock if it is at
  * least the snap threshold (1 us by default) off, and from the fourth on each pair corrects the
- * frequency; an error that reaches the threshold starts over. So a pair may call getFrequency and
- * then setFrequency, or stepTime, or none of them.
+ * frequency; an error that reaches the threshold starts over. If the two pairs ask for a frequency
+ * beyond the host's limits, the clock gets the limit and the measurement starts over with the next
+ * pair, as often as it takes: a clock that no allowed frequency puts right is never stepped. So a
+ * pair may call getFrequency and then setFrequency, or stepTime, or none of them.
  * The control law counts pairs, not seconds. With the default parameters it is stable for less
  * than 80/33 s (2.4 s) of reference time from pair to pair; 0.1 s to 1 s is customary.
  * After the failure of a host operation nothing is rolled back; the servo goes on with the next
@@ -152,7 +155,7 @@ ZVCKMSERVO_API void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* tim
 /* Sets parameters from a configuration document: one JSON object of numbers, any of
  *
  *     key                       bounds, inclusive    default  what it is
- *     "frequencyLockGain"       1e-9 to 10           1        share of the measured rate corrected
+ *     "frequencyLockGain"       1e-9 to 10           1        factor on the measured rate
  *     "phaseLockGain"           1e-9 to 10           0.55     the control law:
  *     "phaseLockCoefficientA"   -10 to 10            2          weight of this pair's error
  *     "phaseLockCoefficientB"   -10 to 10            1          weight of the last pair's error
@@ -160,26 +163,36 @@ ZVCKMSERVO_API void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* tim
  *     "snapTimeThreshold"       1e-8 to 10           1e-6     seconds; an error as large is stepped
  *     "spikeFilterEnabled"      1, or anything else  0        1 turns the filter on
  *     "spikeFilterHistorySize"  2 to 100             5        pairs that it looks back
- *     "spikeFilterMaxThreshold" 1e-9 to 10           1        seconds per second: its limit's ...
- *     "spikeFilterMinThreshold" 1e-9 to 10           2.5e-8     ... highest and lowest value
+ *     "spikeFilterMaxThreshold" 1e-9 to 10           1        seconds per second: its limit's
+ *     "spikeFilterMinThreshold" 1e-9 to 10           2.5e-8   highest and lowest value
  *     "spikeFilterGrowthFactor" 1.001 to 100         3        limit over the mean of the past
+ *
+ * zvckmservo/parameters.h has the same table for programs. Leave "frequencyLockGain" at 1: it is a
+ * factor on the whole rate, not on its distance from nominal, so with 0.5 the clock is sent to its
+ * lowest limit and never leaves the measurement. The first rate that the filter sees in a servo's
+ * first lock is held to 1 s/s, whatever its highest value.
  *
  * Values are applied in this order, whatever their order in the text; a key that is missing leaves
  * its parameter alone, and other members are ignored. Keys are found without regard to case (as the
  * process's LC_CTYPE folds it), the first match counts, and so does a key up to an escaped zero.
  * Flag and size are cut toward zero first. Text behind the object is ignored, and a text that is
- * JSON but no object sets nothing. configJson  the document, zero-terminated; borrowed for the
- * call. Null fails with zvplaterr_softwareFaultPLATInternalUseOnly Returns: 0 on success, 1 on
- * failure or if the status was negative on entry. Errors:  zvplaterr_invalidParameter for text that
- * is not JSON (or nested deeper than 1000 levels, or no memory to parse it), and then nothing is
- * set; for a value that is no number or out of its bounds, and then what stands above it in the
- * order is set and the rest is not. */
+ * JSON but no object sets nothing. The decimal separator is a point in every locale; in one whose
+ * own separator takes several bytes, a text with a point in a number counts as not JSON.
+ *   configJson  the document, zero-terminated; borrowed for the call. Null fails with
+ *               zvplaterr_softwareFaultPLATInternalUseOnly
+ * Returns: 0 on success, 1 on failure or if the status was negative on entry.
+ * Errors:  zvplaterr_invalidParameter for text that is not JSON (or nested deeper than 1000 levels,
+ *          or no memory to parse it), and then nothing is set; for a value that is no number or out
+ *          of its bounds, and then what stands above it in the order is set and the rest is not.
+ *          A value out of its bounds is not named in the payload: "file" is "dravik/tServo", and
+ *          "line" is the number of its key in zvckmservo/parameters.h. */
 ZVCKMSERVO_API int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* host,
                                                    const char* configJson, zverr_Status* status);
 
 /* Gives the parameters in force as a configuration document: all eleven keys in the order above, a
  * line each, numbers with a decimal point whatever the locale, long enough to read back as the very
- * same double. Less than 1024 characters.
+ * same double (not in a locale whose separator takes several bytes, see above). Less than 1024
+ * characters.
  *   buffer      out: the first bufferSize characters of the document, without a terminating zero:
  *               give a zeroed one, larger than the text; null only if bufferSize is 0; untouched on
  *               failure
@@ -196,14 +209,19 @@ ZVCKMSERVO_API int zvckmservo_readServoConfigJson(zvckmservo_HostTable* host, ch
  *     {"selectedTRInstID": "a", "TRs": {"a": {"type": "IEEE 1588-2008 BC"}}}
  *
  * Keys, the identifier ("a" here) included, are found without regard to case; types are compared
- * exactly. Whatever is missing, null for a text included, means no type. Documents are there for
- * "IEEE 802.1AS-2011 TAB" and "IEEE 1588-2008 BC", in files whose places are settled when the
- * library is loaded. A file that cannot be opened is told in the system log (LOG_INFO) and is no
- * failure. A type counts as told even if its file fails, and is then not tried again.
+ * exactly. A member that is missing means no type, and so does a "type" of null. An identifier of
+ * null counts as the empty text, which finds a member of "TRs" with an empty key. Without an
+ * identifier "TRs" is not looked at.
+ * Documents are there for "IEEE 802.1AS-2011 TAB" and "IEEE 1588-2008 BC", in files whose places
+ * are settled when the library is loaded. A line in the system log (LOG_INFO) says that a file is
+ * read, or that it cannot be opened, which is no failure. A type counts as told even if its file
+ * fails, and is then not tried again.
  *   metaDataJson  the metadata, zero-terminated; borrowed for the call; null does nothing
- * Errors:  jsonErrorsInvalidJSON for text that is not JSON; jsonErrorsNotAnObject and
- *          jsonErrorsTypeMismatch (one code) for a member of another type; both leave the type told
- *          last as it was. A document in a file fails as in zvckmservo_writeServoConfigJson. */
+ * Errors:  jsonErrorsInvalidJSON for text that is not JSON; jsonErrorsNotAnObject for a "TRs", or
+ *          a member of it that is asked for, of another type, null included;
+ *          jsonErrorsTypeMismatch (the same code) for an identifier or a "type" that is neither
+ *          text nor null. They leave the type told last as it was. A document in a file fails as in
+ *          zvckmservo_writeServoConfigJson. */
 ZVCKMSERVO_API void zvckmservo_applyMetaData(zvckmservo_HostTable* host, const char* metaDataJson,
                                              zverr_Status* status);
 

@@ -44,7 +44,8 @@ struct zverr_Status {
      * brings one of the plug-in's own; it works on that record only while the library is loaded. */
     zverr_ReallocJsonFn reallocJson;
 
-    /* Null, or a buffer of `capacity` bytes: the text, a JSON object or array, and its zero byte;
+    /* While `code` is 0 it means nothing, whatever it holds: the next failure overwrites it.
+     * Null, or a buffer of `capacity` bytes: the text, a JSON object or array, and its zero byte;
      * then zero bytes up to the last byte; and in the last byte the end mark 'J' (0x4A). So the
      * capacity is at least the length of the text plus 2. */
     char* json;
@@ -55,9 +56,11 @@ struct zverr_Status {
  *     {"error_constant":"zvplaterr_invalidParameter","file":"dravik/tServo","line":98,
  *      "component":"dravik"}
  *
- *   "error_constant"      the name of the code; absent where the platform layer raised it
+ *   "error_constant"      the name of the code, but "errCode" for jsonErrorsTypeMismatch; absent
+ *                         where the platform layer raised it
  *   "file", "line"        the source unit and a number that stands for the place in it; both stay
- *                         from release to release
+ *                         from release to release. Of a parameter that is out of its bounds there
+ *                         is nothing else: zvckmservo/parameters.h has the number of each
  *   "component"           always "dravik"
  *   "std_exception_what"  what an exception said that reached the boundary
  *   "internal_error"      what the operating system said: "api", "string" and, of errno, "code"
@@ -66,8 +69,9 @@ struct zverr_Status {
  * Details never change an outcome: what there is no room for is left out from that member on, and
  * the code stands. A failure of a host operation keeps the payload that the host gave it. */
 
-/* The codes that the plug-in raises. Two failures of the same kind
- * share a code. */
+/* The codes that the plug-in raises. Two numbers have two names each, for failures of one kind;
+ * "error_constant" says which of them it was. The last two codes stay inside the plug-in: a host
+ * meets them only if an operation of its own reports them. */
 enum {
     zvplaterr_memoryFull = -52000,                       /* the allocator is exhausted */
     zvplaterr_softwareFaultPLATInternalUseOnly = -52003, /* no mutex, unforeseen exception */

@@ -10,7 +10,8 @@
 //     u(n) = C * u(n-1) + g * (A * e(n) - B * e(n-1))
 //
 // u(n-1) is not remembered: it is what the clock says its offset is, so whatever rounding or limit
-// the host applied is part of the loop. The law knows no interval; e is in seconds per pair.
+// the host applied is part of the loop. The law knows no interval: e is in seconds, and g weighs it
+// once for each pair.
 
 namespace zvckmDravik {
 
