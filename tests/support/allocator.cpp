@@ -4,11 +4,14 @@
 #include <cstddef>
 #include <cstdlib>
 
-// The linker sends malloc and free of this program's own objects here (--wrap).
+// The linker sends malloc, calloc and free of this program's own objects here (--wrap). A compiler
+// may make a calloc of a malloc and a memset, so each counts, and fails, as the other does.
 extern "C" {
 void* __real_malloc(size_t size);
+void* __real_calloc(size_t count, size_t size);
 void __real_free(void* block);
 void* __wrap_malloc(size_t size) noexcept;
+void* __wrap_calloc(size_t count, size_t size) noexcept;
 void __wrap_free(void* block) noexcept;
 }
 
@@ -27,6 +30,13 @@ void* __wrap_malloc(size_t size) noexcept
     if (mustFail()) return nullptr;
     ++allocationCount;
     return __real_malloc(size);
+}
+
+void* __wrap_calloc(size_t count, size_t size) noexcept
+{
+    if (mustFail()) return nullptr;
+    ++allocationCount;
+    return __real_calloc(count, size);
 }
 
 void __wrap_free(void* block) noexcept

@@ -1,7 +1,7 @@
 #pragma once
 
-// Watches the allocations of the code under test (malloc in the plug-in's objects, operator new
-// everywhere) and makes a chosen one fail.
+// Watches the allocations of the code under test (malloc and calloc in the plug-in's objects,
+// operator new everywhere) and makes a chosen one fail.
 namespace allocator {
 
 long allocations(); // so far in this process
