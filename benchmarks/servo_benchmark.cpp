@@ -1,6 +1,7 @@
 // What a pair and each exported call cost, beside what they are made of: the lock, the host's
 // operations, and the arithmetic of a textbook controller, all measured in the same run.
 
+#include "support/hostParts.h"
 #include "support/tOpenServo.h"
 #include "tMedianReporter.h"
 #include "textbookController.h"
@@ -38,12 +39,6 @@ class tBenchHost
 public:
     tBenchHost()
     {
-        table.getTime = [](uint64_t* timeNs, zverr_Status*) { *timeNs = kSecond; };
-        table.stepTime = [](int64_t deltaNs, zverr_Status*) { benchmark::DoNotOptimize(deltaNs); };
-        table.getFrequency = [](int32_t* ppb, zverr_Status*) { *ppb = clockOffsetPpb; };
-        table.setFrequency = [](int32_t ppb, zverr_Status*) { clockOffsetPpb = ppb; };
-        table.getMaxFrequencyOffset = [](zverr_Status*) { return 500000; };
-        table.getMinFrequencyOffset = [](zverr_Status*) { return -500000; };
         clockOffsetPpb = 0;
         auto* const open = new tOpenServo(&table);
         config = &open->config();
@@ -72,7 +67,12 @@ public:
         }
     }
 
-    zvckmservo_HostTable table{};
+    zvckmservo_HostTable table =
+        hostTable([](uint64_t* timeNs, zverr_Status*) { *timeNs = kSecond; },
+                  [](int64_t deltaNs, zverr_Status*) { benchmark::DoNotOptimize(deltaNs); },
+                  [](int32_t* ppb, zverr_Status*) { *ppb = clockOffsetPpb; },
+                  [](int32_t ppb, zverr_Status*) { clockOffsetPpb = ppb; },
+                  [](zverr_Status*) { return 500000; }, [](zverr_Status*) { return -500000; });
     zverr_Status status = zverr_emptyStatus();
     zvckmDravik::iServoConfig* config;
     uint64_t now = 0;

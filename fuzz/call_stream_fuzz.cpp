@@ -7,11 +7,11 @@
 
 #include "dravik/tServo.h"
 #include "plainServo.h"
+#include "support/hostParts.h"
 #include "support/systemLog.h"
 #include "tBytes.h"
 #include "tDrawnDocument.h"
 #include "tExactStatus.h"
-#include "zvckmservo/servo.h"
 
 #include <cmath>
 #include <cstdio>
@@ -32,30 +32,25 @@ void answer(int32_t code, zverr_Status* status)
 
 zvckmservo_HostTable tableOfOperations()
 {
-    zvckmservo_HostTable table{};
-    table.getTime = [](uint64_t* timeNs, zverr_Status* status) {
-        answer(asked->getTime(*timeNs), status);
-    };
-    table.stepTime = [](int64_t deltaNs, zverr_Status* status) {
-        answer(asked->stepTime(deltaNs), status);
-    };
-    table.getFrequency = [](int32_t* offsetPpb, zverr_Status* status) {
-        answer(asked->getFrequency(*offsetPpb), status);
-    };
-    table.setFrequency = [](int32_t offsetPpb, zverr_Status* status) {
-        answer(asked->setFrequency(offsetPpb), status);
-    };
-    table.getMaxFrequencyOffset = [](zverr_Status* status) {
-        int32_t ppb = 0;
-        answer(asked->getMaxFrequencyOffset(ppb), status);
-        return ppb;
-    };
-    table.getMinFrequencyOffset = [](zverr_Status* status) {
-        int32_t ppb = 0;
-        answer(asked->getMinFrequencyOffset(ppb), status);
-        return ppb;
-    };
-    return table;
+    return hostTable(
+        [](uint64_t* timeNs, zverr_Status* status) { answer(asked->getTime(*timeNs), status); },
+        [](int64_t deltaNs, zverr_Status* status) { answer(asked->stepTime(deltaNs), status); },
+        [](int32_t* offsetPpb, zverr_Status* status) {
+            answer(asked->getFrequency(*offsetPpb), status);
+        },
+        [](int32_t offsetPpb, zverr_Status* status) {
+            answer(asked->setFrequency(offsetPpb), status);
+        },
+        [](zverr_Status* status) {
+            int32_t ppb = 0;
+            answer(asked->getMaxFrequencyOffset(ppb), status);
+            return ppb;
+        },
+        [](zverr_Status* status) {
+            int32_t ppb = 0;
+            answer(asked->getMinFrequencyOffset(ppb), status);
+            return ppb;
+        });
 }
 
 // The product, telling the ratios that it sets and the states that it enters.

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "require.h"
+#include "support/hostParts.h"
 #include "zverr/jsonz.h"
 #include "zverr/status.h"
 
@@ -12,14 +13,14 @@
 struct tExactStatus : zverr_Status {
     explicit tExactStatus(uint32_t largest = UINT32_MAX) : zverr_Status(), largestBuffer(largest)
     {
-        reallocJson = exactReallocJson;
+        reallocJson = limitedReallocJson;
     }
     tExactStatus(const tExactStatus&) = delete;
     tExactStatus& operator=(const tExactStatus&) = delete;
     ~tExactStatus()
     {
         requireForm();
-        delete[] json;
+        exactReallocJson(this, 0);
     }
 
     void requireForm() const
@@ -34,14 +35,9 @@ struct tExactStatus : zverr_Status {
     uint32_t largestBuffer;
 
 private:
-    static bool exactReallocJson(zverr_Status* status, uint32_t size)
+    static bool limitedReallocJson(zverr_Status* status, uint32_t size)
     {
         if (size > static_cast<tExactStatus*>(status)->largestBuffer) return false;
-        char* const buffer = new char[size];
-        jsonz_formatBuffer(buffer, size, status->json != nullptr ? status->json : "{}");
-        delete[] status->json;
-        status->json = buffer;
-        status->capacity = size;
-        return true;
+        return exactReallocJson(status, size);
     }
 };

@@ -1,8 +1,8 @@
 #pragma once
 
 #include "require.h"
+#include "support/hostParts.h"
 #include "tExactStatus.h"
-#include "zvckmservo/servo.h"
 
 #include <cjson/cJSON.h>
 #include <initializer_list>
@@ -14,12 +14,6 @@ class tFuzzHost
 public:
     tFuzzHost()
     {
-        table.getTime = [](uint64_t*, zverr_Status*) {};
-        table.stepTime = [](int64_t, zverr_Status*) {};
-        table.getFrequency = [](int32_t*, zverr_Status*) {};
-        table.setFrequency = [](int32_t, zverr_Status*) {};
-        table.getMaxFrequencyOffset = [](zverr_Status*) { return 500000; };
-        table.getMinFrequencyOffset = [](zverr_Status*) { return -500000; };
         tExactStatus status;
         zvckmservo_initialize(&table, &status);
     }
@@ -37,7 +31,10 @@ public:
         return text;
     }
 
-    zvckmservo_HostTable table{};
+    zvckmservo_HostTable table =
+        hostTable([](uint64_t*, zverr_Status*) {}, [](int64_t, zverr_Status*) {},
+                  [](int32_t*, zverr_Status*) {}, [](int32_t, zverr_Status*) {},
+                  [](zverr_Status*) { return 500000; }, [](zverr_Status*) { return -500000; });
 };
 
 // The end of a call: clean, or one of the documented codes with a payload that is valid JSON.

@@ -6,7 +6,7 @@
 // Usage: faults_test LIBRARY, with the default documents in their place by the relocation library
 
 #include "support/faults.h"
-#include "zvckmservo/servo.h"
+#include "support/hostParts.h"
 
 #include <algorithm>
 #include <cmath>
@@ -111,33 +111,12 @@ void setFrequency(int32_t offsetPpb, zverr_Status* status)
 int32_t highest(zverr_Status* status) { return operationFails(status) ? 0 : 500000; }
 int32_t lowest(zverr_Status* status) { return operationFails(status) ? 0 : -500000; }
 
-// The host's own buffer comes from the same memory as everything else.
-bool reallocJson(zverr_Status* status, uint32_t size)
-{
-    if (size > 0 && size <= status->capacity) return true;
-    char* const text = size > 0 ? static_cast<char*>(std::calloc(size, 1)) : nullptr;
-    if (size > 0 && text == nullptr) return false;
-    if (text != nullptr) {
-        const std::string_view kept = status->json != nullptr ? status->json : "{}";
-        kept.copy(text, kept.size());
-        text[size - 1] = 'J';
-    }
-    std::free(status->json);
-    status->json = text;
-    status->capacity = size;
-    return true;
-}
-
 // A host with its clock and its servo.
 struct tHost {
-    explicit tHost(const tLibrary& library) : library(library)
+    explicit tHost(const tLibrary& library)
+        : library(library),
+          table(hostTable(::getTime, ::stepTime, ::getFrequency, ::setFrequency, highest, lowest))
     {
-        table.getTime = ::getTime;
-        table.stepTime = ::stepTime;
-        table.getFrequency = ::getFrequency;
-        table.setFrequency = ::setFrequency;
-        table.getMaxFrequencyOffset = highest;
-        table.getMinFrequencyOffset = lowest;
         trueNs = 1700000000000000000U;
         aheadNs = 5e6;
         orderedPpb = 0;
@@ -152,7 +131,7 @@ struct tHost {
 
     void forget()
     {
-        if (status.json != nullptr) reallocJson(&status, 0);
+        if (status.json != nullptr) exactReallocJson(&status, 0);
         status.code = 0;
     }
     void initialize() { library.initialize(&table, &status); }
@@ -184,8 +163,9 @@ struct tHost {
     }
 
     const tLibrary& library;
-    zvckmservo_HostTable table = {};
-    zverr_Status status = {0, 0, reallocJson, nullptr};
+    zvckmservo_HostTable table;
+    // The buffer comes from the same memory as everything else.
+    zverr_Status status = {0, 0, exactReallocJson, nullptr};
 };
 
 // Eleven values, each other than its default, in the order in which they are applied.

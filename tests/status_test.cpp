@@ -1,6 +1,7 @@
 // The status record, the exceptions, the guard and the bridge.
 
 #include "support/allocator.h"
+#include "support/hostParts.h"
 #include "support/tHostStatus.h"
 #include "zverr/Exception.h"
 #include "zverr/errStatus.h"
@@ -219,9 +220,7 @@ TEST(StatusGuard, ReleasesABufferThatTheHostPutIn)
 {
     static bool throws;
     const zverr_ReallocJsonFn release = [](zverr_Status* status, uint32_t /*size*/) {
-        delete[] status->json;
-        status->json = nullptr;
-        status->capacity = 0;
+        exactReallocJson(status, 0);
         if (throws) throw std::runtime_error("release");
         return true;
     };
@@ -235,8 +234,7 @@ TEST(StatusGuard, ReleasesABufferThatTheHostPutIn)
                 zverr::tStatusGuard guard;
                 guard.code = code;
                 guard.reallocJson = release;
-                guard.capacity = 4;
-                guard.json = new char[4]{'{', '}', 0, 'J'};
+                exactReallocJson(&guard, 4);
             } catch (const zverr::Exception& failure) {
                 raised = failure.status.code;
                 text = failure.what();

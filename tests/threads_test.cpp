@@ -2,7 +2,7 @@
 // that make and end a servo. The thread sanitizer looks at all of it; without it, the clock notices
 // operations that overlap, and the readers documents that are torn.
 
-#include "zvckmservo/servo.h"
+#include "support/hostParts.h"
 
 #include <atomic>
 #include <cstdio>
@@ -58,17 +58,11 @@ void setFrequency(int32_t offsetPpb, zverr_Status* /*status*/)
 }
 int32_t highest(zverr_Status* /*status*/) { return 500000; }
 int32_t lowest(zverr_Status* /*status*/) { return -500000; }
-bool noBuffer(zverr_Status* /*status*/, uint32_t size) { return size == 0; }
 
 void open(tClock& clock)
 {
-    zverr_Status status{0, 0, noBuffer, nullptr};
-    clock.table.getTime = getTime;
-    clock.table.stepTime = stepTime;
-    clock.table.getFrequency = getFrequency;
-    clock.table.setFrequency = setFrequency;
-    clock.table.getMaxFrequencyOffset = highest;
-    clock.table.getMinFrequencyOffset = lowest;
+    zverr_Status status{0, 0, noReallocJson, nullptr};
+    clock.table = hostTable(getTime, stepTime, getFrequency, setFrequency, highest, lowest);
     zvckmservo_initialize(&clock.table, &status);
     ASSERT_EQ(0, status.code);
 }
@@ -88,7 +82,7 @@ void useAll(tClock& clock, std::atomic<uint64_t>& seconds, int thread)
 {
     current = &clock;
     zvckmservo_HostTable* const table = &clock.table;
-    zverr_Status status{0, 0, noBuffer, nullptr};
+    zverr_Status status{0, 0, noReallocJson, nullptr};
     for (int round = 0; round < kRounds; ++round) {
         const uint64_t reference = ++seconds * kSecond;
         zvckmservo_adjustTime(table, reference, reference + static_cast<uint64_t>(round % 5 * 100),
@@ -123,7 +117,7 @@ TEST(Threads, EveryCallFromFourAtOnce)
         std::vector<std::atomic<uint64_t>> seconds(servos);
         for (tClock& clock : clocks) {
             open(clock);
-            zverr_Status status{0, 0, noBuffer, nullptr};
+            zverr_Status status{0, 0, noReallocJson, nullptr};
             zvckmservo_writeServoConfigJson(
                 &clock.table, R"({"phaseLockCoefficientA":1,"phaseLockCoefficientC":1})", &status);
         }

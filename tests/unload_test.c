@@ -2,14 +2,14 @@
  * after time without growing; from a thread, too, that has been told to end. Usage: unload_test
  * LIBRARY ROUNDS */
 
-#include "zvckmservo/servo.h"
+#include "support/hostParts.h"
+#include "zvckmservo/parameters.h"
 
 #include <dlfcn.h>
 #include <malloc.h>
 #include <pthread.h>
 #include <stdio.h>
 #include <stdlib.h>
-#include <string.h>
 #include <sys/resource.h>
 
 static int32_t offsetPpb = 0;
@@ -50,12 +50,6 @@ static int32_t getLimit(zverr_Status* status)
     return 500000;
 }
 
-static bool noBuffer(zverr_Status* status, uint32_t size)
-{
-    (void)status;
-    return size == 0;
-}
-
 static void check(int good, const char* what)
 {
     if (good) return;
@@ -79,19 +73,15 @@ static void useAndClose(const char* path)
     __extension__ __typeof__(&zvckmservo_adjustTime) adjustTime =
         bind(library, "zvckmservo_adjustTime");
     __extension__ __typeof__(&zvckmservo_getTime) getTime = bind(library, "zvckmservo_getTime");
+    __extension__ __typeof__(&zvckmservo_writeServoConfigJson) write =
+        bind(library, "zvckmservo_writeServoConfigJson");
     __extension__ __typeof__(&zvckmservo_applyMetaData) applyMetaData =
         bind(library, "zvckmservo_applyMetaData");
     __extension__ __typeof__(&zvckmservo_finalize) finalize = bind(library, "zvckmservo_finalize");
 
-    zvckmservo_HostTable host;
-    memset(&host, 0, sizeof host);
-    host.getTime = readClock;
-    host.stepTime = stepTime;
-    host.getFrequency = getFrequency;
-    host.setFrequency = setFrequency;
-    host.getMaxFrequencyOffset = getLimit;
-    host.getMinFrequencyOffset = getLimit;
-    zverr_Status status = {0, 0, noBuffer, NULL};
+    zvckmservo_HostTable host =
+        hostTable(readClock, stepTime, getFrequency, setFrequency, getLimit, getLimit);
+    zverr_Status status = {0, 0, noReallocJson, NULL};
     uint64_t now = 0;
 
     initialize(&host, &status);
@@ -103,6 +93,13 @@ static void useAndClose(const char* path)
     status.code = 0;
     getTime(&host, &now, &status);
     check(status.code == 0 && now == 4000000000U, "the clock's time did not arrive");
+    for (int i = 0; i < zvckmservo_kParameterCount; ++i) {
+        const zvckmservo_Parameter* const parameter = &zvckmservo_parameters[i];
+        char document[64];
+        (void)snprintf(document, sizeof document, "{\"%s\":%s}", parameter->key,
+                       parameter->initialText);
+        check(write(&host, document, &status) == 0, parameter->key);
+    }
     applyMetaData(&host, /* looks for a file and logs */
                   "{\"selectedTRInstID\":\"a\",\"TRs\":{\"a\":{\"type\":\"IEEE 1588-2008 BC\"}}}",
                   &status);

@@ -1,5 +1,7 @@
 #include "support/tFakeHost.h"
 
+#include "support/hostParts.h"
+
 #include <gtest/gtest.h>
 #include <utility>
 
@@ -44,14 +46,12 @@ struct tFakeOperations {
 };
 
 tFakeHost::tFakeHost()
+    : table(hostTable(tFakeOperations::getTime, tFakeOperations::stepTime,
+                      tFakeOperations::getFrequency, tFakeOperations::setFrequency,
+                      tFakeOperations::getMaxFrequencyOffset,
+                      tFakeOperations::getMinFrequencyOffset))
 {
     current = this;
-    table.getTime = tFakeOperations::getTime;
-    table.stepTime = tFakeOperations::stepTime;
-    table.getFrequency = tFakeOperations::getFrequency;
-    table.setFrequency = tFakeOperations::setFrequency;
-    table.getMaxFrequencyOffset = tFakeOperations::getMaxFrequencyOffset;
-    table.getMinFrequencyOffset = tFakeOperations::getMinFrequencyOffset;
 }
 
 tFakeHost::~tFakeHost()

@@ -29,7 +29,7 @@ public:
     // The operations noted since the last call of this.
     std::string takeCalls();
 
-    zvckmservo_HostTable table{};
+    zvckmservo_HostTable table;
     tHostStatus status;
 
     uint64_t timeNs = 0;

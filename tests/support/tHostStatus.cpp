@@ -1,5 +1,7 @@
 #include "support/tHostStatus.h"
 
+#include "support/hostParts.h"
+
 #include <cstddef>
 #include <cstring>
 #include <gtest/gtest.h>
@@ -20,22 +22,9 @@ extern "C" bool foreignReallocJson(zverr_Status* status, uint32_t size)
     tHostStatus& owner = ownerOf(status);
     owner.requests.push_back(size);
     if (owner.mode == tHostStatus::kThrow) throw std::runtime_error("reallocJson of the host");
-    if (size == 0) {
-        delete[] status->json;
-        status->json = nullptr;
-        status->capacity = 0;
-        return true;
-    }
-    if (owner.mode == tHostStatus::kRefuse || size > owner.largest) return false;
-    if (owner.mode == tHostStatus::kGrantNothing || size <= status->capacity) return true;
-    char* const buffer = new char[size]();
-    const std::string text = status->json != nullptr ? status->json : "{}";
-    text.copy(buffer, text.size());
-    buffer[size - 1] = 'J';
-    delete[] status->json;
-    status->json = buffer;
-    status->capacity = size;
-    return true;
+    if (size > 0 && (owner.mode == tHostStatus::kRefuse || size > owner.largest)) return false;
+    if (size > 0 && owner.mode == tHostStatus::kGrantNothing) return true;
+    return exactReallocJson(status, size);
 }
 
 tHostStatus::tHostStatus(int32_t code, const char* text)
@@ -51,12 +40,12 @@ tHostStatus::tHostStatus(int32_t code, const char* text)
 tHostStatus::~tHostStatus()
 {
     expectBufferForm(record);
-    delete[] record.json;
+    exactReallocJson(&record, 0);
 }
 
 void tHostStatus::reset()
 {
-    delete[] record.json;
+    exactReallocJson(&record, 0);
     record = {0, 0, foreignReallocJson, nullptr};
     requests.clear();
 }
