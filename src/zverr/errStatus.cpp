@@ -13,7 +13,7 @@ constexpr uint32_t kTopBit = 0x80000000U;
 constexpr size_t kLongestText = 0x7FFFFFFDU;
 
 // The smallest power of two, 512 or more, that is not below `size`; the top bit of `size` is clear.
-uint32_t bufferSizeFor(uint32_t size)
+constexpr uint32_t bufferSizeFor(uint32_t size)
 {
     uint32_t result = kSmallestBuffer;
     while (result < size) {
@@ -21,6 +21,9 @@ uint32_t bufferSizeFor(uint32_t size)
     }
     return result;
 }
+static_assert(bufferSizeFor(1) == 512 && bufferSizeFor(512) == 512 && bufferSizeFor(513) == 1024 &&
+                  bufferSizeFor(1025) == 2048 && bufferSizeFor(kTopBit - 1) == kTopBit,
+              "powers of two from 512 on");
 
 } // namespace
 

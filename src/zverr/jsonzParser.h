@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 
 // Checks a JSON text in place and finds where its values begin and end. Numbers are taken more
@@ -45,6 +46,11 @@ struct jsonz_Token {
     uint32_t length;
     uint8_t isFloat; // of a number: 1 if it has a fraction part or an exponent
 };
+
+static_assert(offsetof(jsonz_Token, start) == sizeof(void*), "the type comes first");
+static_assert(offsetof(jsonz_Token, length) == 2 * sizeof(void*), "length behind one pointer");
+static_assert(offsetof(jsonz_Token, isFloat) == 2 * sizeof(void*) + 4, "isFloat comes last");
+static_assert(sizeof(jsonz_Token) == 2 * sizeof(void*) + 8, "nothing else in the token");
 
 // All of these give the position behind what they parsed, or null if it does not parse, and
 // describe it in the token. A null token: the text is only checked.

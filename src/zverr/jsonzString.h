@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 
 // Strings of a JSON text, still escaped, given back as plain bytes without a copy of the whole.
@@ -18,6 +19,9 @@ struct jsonz_StringReader {
     uint32_t remaining; // characters of escaped text left
     const char* cursor; // the next character; null at the clean end of the text
 };
+
+static_assert(offsetof(jsonz_StringReader, remaining) == 4, "pending comes first");
+static_assert(offsetof(jsonz_StringReader, cursor) == 8, "cursor at byte 8");
 
 // The next plain byte. 0 at the clean end, which makes `cursor` null, and at a bad escape, an
 // escape that the end cuts, a lone surrogate and `\u0000`, which leave it.

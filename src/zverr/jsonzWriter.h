@@ -1,5 +1,6 @@
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <string>
 
@@ -20,6 +21,8 @@ struct jsonz_Grower {
     jsonz_GrowFn grow; // may be null: the buffer stays as it is
     void* context;
 };
+
+static_assert(offsetof(jsonz_Grower, context) == sizeof(void*), "the function comes first");
 
 // The characters that a text takes once escaped, quotes not counted.
 uint64_t jsonz_escapedLength(const char* text);

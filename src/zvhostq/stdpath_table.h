@@ -27,6 +27,9 @@ struct stdpath_entry {
     zvktl::err::string value;
 };
 
+static_assert(offsetof(stdpath_entry, value) == sizeof(zvktl::err::string), "the name comes first");
+static_assert(sizeof(stdpath_entry) == 6 * sizeof(void*), "two strings");
+
 // The relocation library's answer for a directory: positive, and the path in `buffer`,
 // zero-terminated within `size` bytes; 0 for a directory that stays where it is; negative for a
 // failure.

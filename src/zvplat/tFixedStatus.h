@@ -26,6 +26,13 @@ struct tFixedStatus {
     uint32_t reserved = 0; // never read
 };
 
+static_assert(offsetof(tFixedStatus, code) == 4, "the stamp comes first");
+static_assert(offsetof(tFixedStatus, component) == 8, "component at byte 8");
+static_assert(offsetof(tFixedStatus, file) == 18, "file at byte 18");
+static_assert(offsetof(tFixedStatus, line) == 120, "line at byte 120");
+static_assert(offsetof(tFixedStatus, reserved) == 124, "reserved at byte 124");
+static_assert(sizeof(tFixedStatus) == 128, "nothing else in the record");
+
 } // namespace zvplat
 
 // Carries what the record holds into a status, as far as there is room; a code of 0 is nothing.

@@ -18,6 +18,9 @@ struct tDebugLocation {
     const char* lineEnd; // closes the line, and always fits
 };
 
+static_assert(offsetof(tDebugLocation, line) == sizeof(void*), "file comes first");
+static_assert(offsetof(tDebugLocation, lineEnd) == 2 * sizeof(void*), "lineEnd comes last");
+
 // Writes a line of this level, or drops it: the lowest level that is written is 4096.
 void zvsdbg_line(int32_t level, const tDebugLocation* location, const char* format, ...)
     __attribute__((format(printf, 3, 4)));

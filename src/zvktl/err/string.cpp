@@ -13,6 +13,20 @@ namespace {
 
 constexpr size_t kSmallestCapacity = 127; // an allocation of 128 bytes
 
+// What a string grows to when `wanted` characters do not fit: half as much again, unless that wraps
+// around.
+constexpr size_t grownCapacity(size_t capacity, size_t wanted)
+{
+    size_t newCapacity = std::max(wanted, kSmallestCapacity);
+    const size_t grown = capacity + capacity / 2;
+    if (grown > capacity) newCapacity = std::max(newCapacity, grown);
+    return newCapacity;
+}
+static_assert(grownCapacity(0, 0) == 127 && grownCapacity(0, 200) == 200 &&
+                  grownCapacity(127, 128) == 190 && grownCapacity(190, 191) == 285 &&
+                  grownCapacity(285, 1000) == 1000 && grownCapacity(SIZE_MAX - 1, 1) == 127,
+              "127, 190, 285, and what is asked for beyond");
+
 } // namespace
 
 string::string(const char* text, zverr_Status* status) : string(text, std::strlen(text), status) {}
@@ -38,9 +52,7 @@ string::~string()
 void string::reserve(size_t wanted, zverr_Status* status)
 {
     if (capacity >= wanted && capacity != 0) return;
-    size_t newCapacity = std::max(wanted, kSmallestCapacity);
-    const size_t grown = capacity + capacity / 2;
-    if (grown > capacity) newCapacity = std::max(newCapacity, grown);
+    const size_t newCapacity = grownCapacity(capacity, wanted);
     if (newCapacity == SIZE_MAX) return reportMemoryFull(status);
     if (status->code < 0) return;
 

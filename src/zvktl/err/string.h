@@ -39,4 +39,6 @@ private:
     size_t size = 0;      // characters held
 };
 
+static_assert(sizeof(string) == 3 * sizeof(void*), "three words");
+
 } // namespace zvktl::err

@@ -11,10 +11,14 @@
 namespace zvktl::err {
 
 // What both vectors grow to when `needed` elements no longer fit: half as much again, 8 at least.
-inline size_t grownCapacity(size_t capacity, size_t needed)
+constexpr size_t grownCapacity(size_t capacity, size_t needed)
 {
     return std::max({capacity + capacity / 2, size_t{8}, needed});
 }
+static_assert(grownCapacity(0, 1) == 8 && grownCapacity(8, 9) == 12 &&
+                  grownCapacity(12, 13) == 18 && grownCapacity(18, 19) == 27 &&
+                  grownCapacity(27, 100) == 100,
+              "one by one: 8, 12, 18, 27");
 
 // An owned array of elements. What can allocate takes a status, as in err::string. An element is
 // all zero when value-initialised, has swap(Element&) and the constructor
@@ -59,6 +63,9 @@ template <> struct vector<char> {
     size_t size = 0;     // bytes held
     char* data = nullptr;
 };
+
+static_assert(offsetof(vector<char>, size) == sizeof(void*), "capacity comes first");
+static_assert(offsetof(vector<char>, data) == 2 * sizeof(void*), "data comes last");
 
 template <class Element> vector<Element>::~vector()
 {
