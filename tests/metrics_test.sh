@@ -62,7 +62,8 @@ check() { # NAME STATUS PATTERN OPTIONS...
     metrics "$@" > out 2> err || found=$?
     expect "$name: exit status" "$status" "$found"
     expect "$name: lines on stderr" $((status > 0)) "$(wc -l < err)"
-    expect "$name: $pattern" 0 "$(cat out err | grep -qE -- "$pattern"; echo $?)"
+    cat out err > both
+    expect "$name: $pattern" 0 "$(grep -qE -- "$pattern" both; echo $?)"
 }
 while IFS='|' read -r name status pattern options; do
     # shellcheck disable=SC2086  # split on purpose
