@@ -4,8 +4,10 @@
 set -uo pipefail
 host=(${EMULATOR:+"$EMULATOR"} "$1/dravik-host") cc=$2
 root=$(cd "$(dirname "$0")/.." && pwd)
-include=$root/include config=$root/config
+include=$root/include
 scratch=$(mktemp -d)
+config=$scratch/config   # a name without a space, as rows are split into words
+ln -s "$root/config" "$config"
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 source "$(dirname "$0")/support/expect.sh"
@@ -201,12 +203,12 @@ expect "nothing moves" 0 "$(printf 'reference_ns,clock_ns\n1000000000,1000000000
 mkdir "$scratch/few" # programs, those that an emulator needs
 for program in bash dirname qemu-arm; do ln -s "$(command -v $program)" "$scratch/few/"; done
 expect "no gnuplot" "dravik-host: cannot start gnuplot: No such file or directory; --script writes what it would be given" \
-    "$(PATH=$scratch/few; plot -o "$scratch/a.svg")"
+    "$(PATH=$scratch/few plot -o "$scratch/a.svg")"
 printf '#!/bin/sh\nexit 1\n' > "$scratch/few/gnuplot"
 chmod +x "$scratch/few/gnuplot"
 "${host[@]}" simulate --duration 3h --csv "$scratch/it's.csv" > "$scratch/out"
 expect "gnuplot ends early" "dravik-host: gnuplot did not draw it; what is wrong stands above" \
-    "$(PATH=$scratch/few; plot -o "$scratch/a.svg")"
+    "$(PATH=$scratch/few plot -o "$scratch/a.svg")"
 expect "no folder" "dravik-host: cannot write /none/a.svg: No such file or directory" "$(plot -o /none/a.svg)"
 
 # A plug-in that exceeds the clock's limits: the clock refuses, and code and payload arrive. It also

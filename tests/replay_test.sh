@@ -10,7 +10,7 @@ source "$(dirname "$0")/support/expect.sh"
 
 replay() { "${host[@]}" replay "$@"; }
 pairs() { replay - --csv - "$@" 2> /dev/null | grep '^pair' | cut -d, -f2-6; }
-messages() { replay - "$@" 2>&1 > /dev/null; }
+messages() { { replay - "$@" > /dev/null; } 2>&1; }
 
 # Formats. Each trace has the same two measurements, 8 ns apart in 1.5 s, and lines to be left out.
 wanted="0.000000000,1700003531420000000,1700003531419999977,-23,
