@@ -3,37 +3,12 @@
 include(GNUInstallDirs)
 include(CMakePackageConfigHelpers)
 
-# Where the plug-in looks for its default documents in the standard layout. The place is settled by
-# the running system, not by the prefix.
-set(DRAVIK_SERVOS_DIR /usr/lib/arm-linux-gnueabi/zv-chronel/servos CACHE PATH
-    "Directory of the default documents")
-
 set(package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/dravik)
 
 install(TARGETS dravik EXPORT dravikTargets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR}
     COMPONENT library NAMELINK_COMPONENT development
     INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
-install(FILES config/dravik_tr_ptp4l_tab.json config/dravik_tr_ptp4l_bc.json
-    DESTINATION ${DRAVIK_SERVOS_DIR} COMPONENT library)
-install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT host)
-install(FILES host/completion/dravik-host
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT host)
-install(FILES examples/dravik-host.service
-    DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/dravik-host/examples COMPONENT host)
-find_program(SCDOC scdoc)
-if(SCDOC)
-    foreach(page dravik-host.1 dravik-servo-document.5)
-        cmake_path(GET page EXTENSION LAST_ONLY section)
-        string(SUBSTRING ${section} 1 -1 section)
-        add_custom_command(OUTPUT ${page} DEPENDS docs/man/${page}.scd VERBATIM
-            COMMAND sh -c "${SCDOC} < ${PROJECT_SOURCE_DIR}/docs/man/${page}.scd > ${page}")
-        install(FILES ${PROJECT_BINARY_DIR}/${page}
-            DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT host)
-        list(APPEND pages ${PROJECT_BINARY_DIR}/${page})
-    endforeach()
-    add_custom_target(manual ALL DEPENDS ${pages})
-endif()
 
 install(DIRECTORY include/zvckmservo include/zverr DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
     COMPONENT development)
@@ -49,3 +24,34 @@ install(FILES ${PROJECT_BINARY_DIR}/dravikConfig.cmake ${PROJECT_BINARY_DIR}/dra
     DESTINATION ${package_dir} COMPONENT development)
 install(FILES ${PROJECT_BINARY_DIR}/dravik.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig
     COMPONENT development)
+
+if(DRAVIK_HOST)
+    install(TARGETS dravik_host RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT host)
+    install(FILES host/completion/dravik-host
+        DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions COMPONENT host)
+    install(FILES examples/dravik-host.service
+        DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/dravik-host/examples COMPONENT host)
+    find_program(SCDOC scdoc)
+endif()
+if(DRAVIK_HOST AND SCDOC)
+    foreach(page dravik-host.1 dravik-servo-document.5)
+        cmake_path(GET page EXTENSION LAST_ONLY section)
+        string(SUBSTRING ${section} 1 -1 section)
+        set(source ${PROJECT_SOURCE_DIR}/docs/man/${page}.scd)
+        add_custom_command(OUTPUT ${page} DEPENDS ${source} VERBATIM
+            COMMAND ${SCDOC} < ${source} > ${page})
+        install(FILES ${PROJECT_BINARY_DIR}/${page}
+            DESTINATION ${CMAKE_INSTALL_MANDIR}/man${section} COMPONENT host)
+        list(APPEND pages ${PROJECT_BINARY_DIR}/${page})
+    endforeach()
+    add_custom_target(manual ALL DEPENDS ${pages})
+endif()
+
+# Last, as it is the one directory outside of the prefix: where the plug-in looks for its default
+# documents in the standard layout.
+set(DRAVIK_SERVOS_DIR /usr/lib/arm-linux-gnueabi/zv-chronel/servos CACHE PATH
+    "Directory of the default documents; empty: they are not installed")
+if(DRAVIK_SERVOS_DIR)
+    configure_file(cmake/installDocuments.cmake.in installDocuments.cmake @ONLY)
+    install(SCRIPT ${PROJECT_BINARY_DIR}/installDocuments.cmake COMPONENT documents)
+endif()

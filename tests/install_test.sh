@@ -47,6 +47,19 @@ for type in 'tab IEEE 802.1AS-2011 TAB' 'bc IEEE 1588-2008 BC'; do
             "${emulator[@]}" "$usr/bin/dravik-host" show --reference-type "${type#* }")"
 done
 
+# A document that was edited is kept, and who may not write to their directory gets all the rest.
+again() { DESTDIR=$1 "$cmake" --install "$build" --prefix "$scratch/usr" "${@:2}" 2>&1 > /dev/null | grep -oE 'Kept|not installed' || true; }
+echo '{}' > "$servos/dravik_tr_ptp4l_bc.json"
+expect "installed again" Kept "$(again "$root" --component documents)"
+expect "edited document" '{}' "$(cat "$servos/dravik_tr_ptp4l_bc.json")"
+rm "$servos/dravik_tr_ptp4l_bc.json"
+expect "installed once more" "" "$(again "$root" --component documents)"
+expect "its default" 1 "$(grep -c phaseLockGain "$servos/dravik_tr_ptp4l_bc.json")"
+mkdir -p "$scratch/other/usr"
+touch "$scratch/other/usr/lib"
+expect "no directory for documents" "not installed" "$(again "$scratch/other")"
+expect "the rest" "$(cd "$usr" && find . -not -type d | sort)" "$(cd "$scratch/other$scratch/usr" && find . -not -type d | sort)"
+
 # The example, by pkg-config and by CMake.
 export PKG_CONFIG_PATH=$libdir/pkgconfig
 # shellcheck disable=SC2046  # flags are words
@@ -55,7 +68,7 @@ cat > "$scratch/CMakeLists.txt" << END
 cmake_minimum_required(VERSION 3.25)
 project(example C)
 find_package(dravik 1.0 REQUIRED)
-add_executable(by_cmake $examples/minimal_host.c)
+add_executable(by_cmake "$examples/minimal_host.c")
 target_link_libraries(by_cmake PRIVATE dravik::dravik)
 END
 "$cmake" -S "$scratch" -B "$scratch" -D CMAKE_FIND_ROOT_PATH="$root" \
