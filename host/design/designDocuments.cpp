@@ -32,12 +32,13 @@ void setFilter(tServoParameters& parameters, const tNoiseModel& model, double li
     constexpr double kFloor = 0.9; // of the limit, or a quiet spell would shut the filter
     constexpr double kCeiling = 6; // of the limit, so that a true step opens it
     const double limitRate = limit * kMeanStep * secondsOf(model.noiseNs) / model.interval();
-    const auto within = [](double rate) { return std::clamp(rate, 1e-9, 10.0); };
     parameters.spikeFilterEnabled = 1;
     parameters.spikeFilterHistorySize = kHistory;
-    parameters.spikeFilterGrowthFactor = std::clamp(limit, 1.001, 100.0);
-    parameters.spikeFilterMinThreshold = within(kFloor * limitRate);
-    parameters.spikeFilterMaxThreshold = within(kCeiling * limitRate);
+    parameters.spikeFilterGrowthFactor = withinBounds(zvckmservo_kSpikeFilterGrowthFactor, limit);
+    parameters.spikeFilterMinThreshold =
+        withinBounds(zvckmservo_kSpikeFilterMinThreshold, kFloor * limitRate);
+    parameters.spikeFilterMaxThreshold =
+        withinBounds(zvckmservo_kSpikeFilterMaxThreshold, kCeiling * limitRate);
 }
 
 // Place is the logarithms of kp and ki, and the limit of the filter.
@@ -108,7 +109,8 @@ void addQuick(tDesign& design, const tNoiseModel& model)
         if (design.quick.empty()) {
             const double seconds = secondsOf(design.measureOverNs);
             double& threshold = quick.parameters.snapTimeThreshold;
-            threshold = std::min(10.0, threshold + takeUp(gains, model, seconds));
+            threshold = withinBounds(zvckmservo_kSnapTimeThreshold,
+                                     threshold + takeUp(gains, model, seconds));
         }
         design.quick.push_back(quick);
     }
@@ -120,7 +122,8 @@ double snapThresholdFor(const tNoiseModel& model)
 {
     constexpr double kDeviations = 12; // half of them for what a change of gains leaves
     const double outlierNs = model.outlierRate > 0 ? 1.2 * model.outlierSizeNs : 0;
-    return std::clamp(secondsOf(kDeviations * model.noiseNs + outlierNs), 1e-8, 10.0);
+    return withinBounds(zvckmservo_kSnapTimeThreshold,
+                        secondsOf(kDeviations * model.noiseNs + outlierNs));
 }
 
 void setSpikeFilter(tServoParameters& parameters, const tNoiseModel& model)

@@ -12,19 +12,19 @@ namespace dravikHost {
 
 namespace {
 
-constexpr double kLargest = 10; // gain and coefficients alike
-constexpr double kLeastGain = 1e-9;
+constexpr double kLargestGain = zvckmservo_parameters[zvckmservo_kPhaseLockGain].highest;
+constexpr double kLargestA = zvckmservo_parameters[zvckmservo_kPhaseLockCoefficientA].highest;
 
 } // namespace
 
-bool tLoopGains::fit() const { return kp + ki <= kLargest * kLargest; }
+bool tLoopGains::fit() const { return kp + ki <= kLargestGain * kLargestA; }
 
 // With B = 1 the gain is kp, and A - 1 is ki / kp. The bound of A, or that of the gain, may need
 // another B.
 void tLoopGains::putInto(tServoParameters& parameters) const
 {
     const double sum = kp + ki;
-    const double gain = std::clamp(std::max(kp, sum / kLargest), kLeastGain, kLargest);
+    const double gain = withinBounds(zvckmservo_kPhaseLockGain, std::max(kp, sum / kLargestA));
     if (!fit()) {
         throw std::runtime_error(
             fmt::format("no document can have kp {:.4g} and ki {:.4g} per second", kp, ki));

@@ -1,6 +1,7 @@
 #include "servo/configDocument.h"
 
 #include "text/json.h"
+#include "zvckmservo/parameters.h"
 
 #include <fmt/format.h>
 
@@ -15,33 +16,13 @@ namespace dravikHost {
 
 namespace {
 
-struct tKey {
-    const char* name;
-    bool whole;     // taken as a whole number
-    int setterLine; // told when the value is out of its bounds; 0: there are none
-    const char* bounds;
-};
-
-// In the order in which a document is applied.
-constexpr tKey kKeys[] = {
-    {"frequencyLockGain", false, 77, "1e-9 to 10"},
-    {"phaseLockGain", false, 98, "1e-9 to 10"},
-    {"phaseLockCoefficientA", false, 119, "-10 to 10"},
-    {"phaseLockCoefficientB", false, 140, "-10 to 10"},
-    {"phaseLockCoefficientC", false, 161, "-10 to 10"},
-    {"snapTimeThreshold", false, 182, "1e-8 to 10 s"},
-    {"spikeFilterEnabled", true, 0, ""},
-    {"spikeFilterHistorySize", true, 235, "2 to 100"},
-    {"spikeFilterMaxThreshold", false, 256, "1e-9 to 10 s/s"},
-    {"spikeFilterMinThreshold", false, 277, "1e-9 to 10 s/s"},
-    {"spikeFilterGrowthFactor", false, 298, "1.001 to 100"},
-};
-
 constexpr std::string_view kSetters = "dravik/tServo";
 constexpr std::string_view kAccessor = "dravik/tJsonConfig";
 constexpr int kNotJson = 29;
 constexpr int kNoWholeNumber = 61;
 constexpr int kNoNumber = 86;
+
+bool isWhole(const zvckmservo_Parameter& key) { return key.kind != zvckmservo_kDouble; }
 
 struct tPlace {
     std::string file;
@@ -59,18 +40,19 @@ tPlace placeOf(const std::string& payload)
 
 // The accessor tells the kind of the value only: the first one of that kind that is no number is
 // the one that it met.
-bool refused(const tKey& key, const cJSON* value, const tPlace& at)
+bool refused(const zvckmservo_Parameter& key, const cJSON* value, const tPlace& at)
 {
-    if (at.file == kSetters) return at.line == key.setterLine;
+    if (at.file == kSetters) return at.line == static_cast<int>(key.line);
     return at.file == kAccessor && cJSON_IsNumber(value) == 0 &&
-           at.line == (key.whole ? kNoWholeNumber : kNoNumber);
+           at.line == (isWhole(key) ? kNoWholeNumber : kNoNumber);
 }
 
-std::string wrongValueText(const tKey& key, const cJSON* value)
+std::string wrongValueText(const zvckmservo_Parameter& key, const cJSON* value)
 {
     if (cJSON_IsNumber(value) == 0)
-        return fmt::format("{} is {}, which is no number", key.name, jsonText(value));
-    return fmt::format("{} is {}, not within {}", key.name, value->valuedouble, key.bounds);
+        return fmt::format("{} is {}, which is no number", key.key, jsonText(value));
+    return fmt::format("{} is {}, not within {}{}{}", key.key, value->valuedouble, key.boundsText,
+                       *key.unit == '\0' ? "" : " ", key.unit);
 }
 
 std::string notJsonText(const std::string& document)
@@ -84,11 +66,12 @@ std::string notJsonText(const std::string& document)
 // Letters of either case count as the same, as they do for the plug-in.
 bool sameKey(const char* one, const char* other) { return strcasecmp(one, other) == 0; }
 
-const tKey* keyNamed(const char* name)
+const zvckmservo_Parameter* keyNamed(const char* name)
 {
-    const tKey* const key = std::find_if(std::begin(kKeys), std::end(kKeys),
-                                         [name](const tKey& k) { return sameKey(k.name, name); });
-    return key == std::end(kKeys) ? nullptr : key;
+    const zvckmservo_Parameter* const key =
+        std::find_if(std::begin(zvckmservo_parameters), std::end(zvckmservo_parameters),
+                     [name](const zvckmservo_Parameter& k) { return sameKey(k.key, name); });
+    return key == std::end(zvckmservo_parameters) ? nullptr : key;
 }
 
 // Letters to insert, leave out or replace to make one word of the other.
@@ -112,24 +95,25 @@ size_t distance(std::string_view one, std::string_view other)
 std::string unknownText(const char* name)
 {
     const auto nearest = std::min_element(
-        std::begin(kKeys), std::end(kKeys), [name](const tKey& one, const tKey& other) {
-            return distance(name, one.name) < distance(name, other.name);
+        std::begin(zvckmservo_parameters), std::end(zvckmservo_parameters),
+        [name](const zvckmservo_Parameter& one, const zvckmservo_Parameter& other) {
+            return distance(name, one.key) < distance(name, other.key);
         });
-    const bool near = distance(name, nearest->name) <= std::strlen(nearest->name) / 3;
+    const bool near = distance(name, nearest->key) <= std::strlen(nearest->key) / 3;
     return fmt::format("{} is no key and sets nothing{}", name,
-                       near ? fmt::format("; {} is meant?", nearest->name) : "");
+                       near ? fmt::format("; {} is meant?", nearest->key) : "");
 }
 
 // "" if the value is taken as it looks.
-std::string readingText(const tKey& key, const cJSON* value)
+std::string readingText(const zvckmservo_Parameter& key, const cJSON* value)
 {
-    if (!key.whole) return "";
-    const bool flag = key.setterLine == 0;
+    if (!isWhole(key)) return "";
+    const bool flag = key.kind == zvckmservo_kBool;
     const int read = value->valueint;
     const bool looksRight = value->valuedouble == read && (!flag || read == 0 || read == 1);
     if (looksRight) return "";
     const std::string meaning = !flag ? std::to_string(read) : read == 1 ? "1, on" : "off";
-    return fmt::format("{} is {} and read as {}", key.name, value->valuedouble, meaning);
+    return fmt::format("{} is {} and read as {}", key.key, value->valuedouble, meaning);
 }
 
 // What stands behind the JSON value, but for white space.
@@ -153,14 +137,14 @@ std::string refusalText(const std::string& document, const std::string& payload)
     if (at.file == kAccessor && at.line == kNotJson) return notJsonText(document);
     const tJson root = parseJson(document);
     std::string applied;
-    for (const tKey& key : kKeys) {
-        const cJSON* const value = cJSON_GetObjectItem(root.get(), key.name);
+    for (const zvckmservo_Parameter& key : zvckmservo_parameters) {
+        const cJSON* const value = cJSON_GetObjectItem(root.get(), key.key);
         if (value == nullptr) continue;
         if (refused(key, value, at)) {
             return fmt::format("{}; applied before it: {}", wrongValueText(key, value),
                                applied.empty() ? "nothing" : applied);
         }
-        enumerate(applied, key.name);
+        enumerate(applied, key.key);
     }
     return payload;
 }
@@ -176,11 +160,11 @@ std::vector<std::string> documentNotes(const std::string& document)
     const cJSON* member = nullptr;
     cJSON_ArrayForEach(member, root.get())
     {
-        const tKey* const key = keyNamed(member->string);
+        const zvckmservo_Parameter* const key = keyNamed(member->string);
         if (key == nullptr) {
             add(unknownText(member->string));
-        } else if (cJSON_GetObjectItem(root.get(), key->name) != member) {
-            add(fmt::format("{} stands there twice, and the first one counts", key->name));
+        } else if (cJSON_GetObjectItem(root.get(), key->key) != member) {
+            add(fmt::format("{} stands there twice, and the first one counts", key->key));
         } else {
             add(readingText(*key, member));
         }

@@ -10,60 +10,40 @@ namespace dravikHost {
 
 namespace {
 
-struct tNumberKey {
-    const char* name;
-    double tServoParameters::*value;
-};
-struct tWholeKey {
-    const char* name;
-    int tServoParameters::*value;
-};
-
-constexpr tNumberKey kNumbers[] = {
-    {"frequencyLockGain", &tServoParameters::frequencyLockGain},
-    {"phaseLockGain", &tServoParameters::phaseLockGain},
-    {"phaseLockCoefficientA", &tServoParameters::phaseLockCoefficientA},
-    {"phaseLockCoefficientB", &tServoParameters::phaseLockCoefficientB},
-    {"phaseLockCoefficientC", &tServoParameters::phaseLockCoefficientC},
-    {"snapTimeThreshold", &tServoParameters::snapTimeThreshold},
-    {"spikeFilterMaxThreshold", &tServoParameters::spikeFilterMaxThreshold},
-    {"spikeFilterMinThreshold", &tServoParameters::spikeFilterMinThreshold},
-    {"spikeFilterGrowthFactor", &tServoParameters::spikeFilterGrowthFactor},
-};
-constexpr tWholeKey kWholes[] = {
-    {"spikeFilterEnabled", &tServoParameters::spikeFilterEnabled},
-    {"spikeFilterHistorySize", &tServoParameters::spikeFilterHistorySize},
+// In the order of the table.
+constexpr double tServoParameters::*kMembers[] = {
+#define DRAVIK_POINTER(key, Key, Kind, line, lowest, highest, initial, unit, meaning)              \
+    &tServoParameters::key,
+    ZVCKMSERVO_PARAMETERS(DRAVIK_POINTER)
+#undef DRAVIK_POINTER
 };
 
 } // namespace
 
 std::string tServoParameters::documentText() const
 {
+    constexpr int kDigits = 6;
+    constexpr int kDigitsOfA = 12; // A - B may be a small part of A
     tJsonObject document;
-    for (const tNumberKey& key : kNumbers) {
-        const bool isRatio = key.value == &tServoParameters::phaseLockCoefficientA;
-        const int digits = isRatio ? 12 : 6; // A - B may be a small part of A
-        document.add(key.name, fmt::format("{:.{}g}", this->*key.value, digits));
+    for (size_t i = 0; i < zvckmservo_kParameterCount; ++i) {
+        const int digits = i == zvckmservo_kPhaseLockCoefficientA ? kDigitsOfA : kDigits;
+        document.add(zvckmservo_parameters[i].key,
+                     fmt::format("{:.{}g}", this->*kMembers[i], digits));
     }
-    for (const tWholeKey& key : kWholes)
-        document.add(key.name, std::to_string(this->*key.value));
     return document.lines();
 }
 
 tServoParameters tServoParameters::of(const std::string& document)
 {
     const tJson root = parseJson(document);
-    const auto number = [&root](const char* name) {
-        const cJSON* const value = cJSON_GetObjectItem(root.get(), name);
-        if (cJSON_IsNumber(value) == 0)
-            throw std::runtime_error(fmt::format("the plug-in tells no {}", name));
-        return value->valuedouble;
-    };
     tServoParameters parameters;
-    for (const tNumberKey& key : kNumbers)
-        parameters.*key.value = number(key.name);
-    for (const tWholeKey& key : kWholes)
-        parameters.*key.value = static_cast<int>(number(key.name));
+    for (size_t i = 0; i < zvckmservo_kParameterCount; ++i) {
+        const char* const key = zvckmservo_parameters[i].key;
+        const cJSON* const value = cJSON_GetObjectItem(root.get(), key);
+        if (cJSON_IsNumber(value) == 0)
+            throw std::runtime_error(fmt::format("the plug-in's document has no {}", key));
+        parameters.*kMembers[i] = value->valuedouble;
+    }
     return parameters;
 }
 

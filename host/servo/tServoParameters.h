@@ -1,22 +1,18 @@
 #pragma once
 
+#include "zvckmservo/parameters.h"
+
+#include <algorithm>
 #include <string>
 
 namespace dravikHost {
 
-// The eleven parameters of a servo.
+// A value for each of the eleven parameters; in a new one those of a new servo.
 struct tServoParameters {
-    double frequencyLockGain = 1;
-    double phaseLockGain = 0;
-    double phaseLockCoefficientA = 0;
-    double phaseLockCoefficientB = 0;
-    double phaseLockCoefficientC = 1;
-    double snapTimeThreshold = 0; // s
-    int spikeFilterEnabled = 0;
-    int spikeFilterHistorySize = 0;
-    double spikeFilterMaxThreshold = 0; // s/s
-    double spikeFilterMinThreshold = 0; // s/s
-    double spikeFilterGrowthFactor = 0;
+#define DRAVIK_MEMBER(key, Key, Kind, line, lowest, highest, initial, unit, meaning)               \
+    double key = initial;
+    ZVCKMSERVO_PARAMETERS(DRAVIK_MEMBER)
+#undef DRAVIK_MEMBER
 
     // A document with all of them, six digits each, a line for each key.
     std::string documentText() const;
@@ -24,5 +20,12 @@ struct tServoParameters {
     // Of a document with all eleven keys, as the plug-in gives it out. Throws std::runtime_error.
     static tServoParameters of(const std::string& document);
 };
+
+// The nearest value that the parameter may have.
+inline double withinBounds(zvckmservo_ParameterIndex parameter, double value)
+{
+    const zvckmservo_Parameter& bounds = zvckmservo_parameters[parameter];
+    return std::clamp(value, bounds.lowest, bounds.highest);
+}
 
 } // namespace dravikHost
