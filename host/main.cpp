@@ -12,10 +12,10 @@ int main(int argc, char** argv)
         {{"simulate", "Discipline a simulated clock", addSimulate},
          {"replay", "Run the plug-in on a recorded trace", addReplay},
          {"run", "Discipline a clock in real time", addRun},
-         {"tune", "Write the document that suits a noise", addTune},
-         {"check", "Tell whether a document is taken, or why not", addCheck},
+         {"tune", "Design a document for a noise", addTune},
+         {"check", "Check a document, and advise on its loop", addCheck},
          {"show", "Print the configuration document in force", addShow},
-         {"metrics", "Tell what a trace is worth", addMetrics},
+         {"metrics", "Compute the figures of a trace, and hold it to limits", addMetrics},
          {"plot", "Draw a trace", addPlot},
-         {"doctor", "Look at the plug-in and at the clocks of this machine", addDoctor}});
+         {"doctor", "Examine the plug-in and the clocks of this machine", addDoctor}});
 }

@@ -117,23 +117,23 @@ phaseLockCoefficientA is -11, not within -10 to 10; applied before it: nothing|{
 phaseLockCoefficientB is 11, not within -10 to 10; applied before it: nothing|{"phaseLockCoefficientB": 11}
 phaseLockCoefficientC is inf, not within -10 to 10; applied before it: nothing|{"phaseLockCoefficientC": 1e999}
 snapTimeThreshold is 9e-09, not within 1e-8 to 10 s; applied before it: phaseLockGain|{"SnapTimeThreshold": 9e-9, "phaseLockGain": 1}
-spikeFilterEnabled is true, which is no number; applied before it: snapTimeThreshold|{"spikeFilterEnabled": true, "snapTimeThreshold": 1, "spikeFilterHistorySize": ""}
-spikeFilterHistorySize is 1.9, not within 2 to 100; applied before it: spikeFilterEnabled|{"spikeFilterHistorySize": 1.9, "spikeFilterEnabled": 1}
-spikeFilterMaxThreshold is \["a"\], which is no number; applied before it: nothing|{"spikeFilterMaxThreshold": ["a"], "spikeFilterMinThreshold": null}
+spikeFilterEnabled is true, which is not a number; applied before it: snapTimeThreshold|{"spikeFilterEnabled": true, "snapTimeThreshold": 1, "spikeFilterHistorySize": ""}
+spikeFilterHistorySize is 1.9, not within 2 to 100 pairs; applied before it: spikeFilterEnabled|{"spikeFilterHistorySize": 1.9, "spikeFilterEnabled": 1}
+spikeFilterMaxThreshold is \["a"\], which is not a number; applied before it: nothing|{"spikeFilterMaxThreshold": ["a"], "spikeFilterMinThreshold": null}
 spikeFilterMaxThreshold is 11, not within 1e-9 to 10 s/s; applied before it: nothing|{"spikeFilterMaxThreshold": 11}
 spikeFilterMinThreshold is 0, not within 1e-9 to 10 s/s; applied before it: nothing|{"spikeFilterMinThreshold": 0}
 spikeFilterGrowthFactor is 1, not within 1.001 to 100; applied before it: nothing|{"spikeFilterGrowthFactor": 1}
 END
 notes() { echo "$1" | "${host[@]}" check - 2>&1 > /dev/null | cut -d' ' -f3-; }
 expect "misspelt, repeated, read otherwise" "phaseLockGain stands there twice, and the first one counts
-gain is no key and sets nothing
-snaptimethreshhold is no key and sets nothing; snapTimeThreshold is meant?
+gain is not a key and sets nothing
+snaptimethreshhold is not a key and sets nothing; did you mean snapTimeThreshold?
 spikeFilterEnabled is 2 and read as off
 spikeFilterHistorySize is 5.7 and read as 5" "$(notes '{"PHASELOCKGAIN": 1, "phaseLockGain": 2, "gain": 3,
     "snaptimethreshhold": 1, "spikeFilterEnabled": 2, "spikeFilterHistorySize": 5.7}')"
 expect "a flag that is nearly 1" "spikeFilterEnabled is 1.9 and read as 1, on" "$(notes '{"spikeFilterEnabled": 1.9}')"
 expect "two objects" "what stands behind the object sets nothing" "$(notes '{"phaseLockGain": 0.5} {"phaseLockGain": 1}')"
-expect "no object" "it is no JSON object, so it sets nothing" "$(notes '[1]')"
+expect "no object" "it is not a JSON object, so it sets nothing" "$(notes '[1]')"
 
 # Advice on the loop: rows of PATTERN|OPTIONS|DOCUMENT on stdin.
 while IFS='|' read -r pattern options document; do

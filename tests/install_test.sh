@@ -16,6 +16,7 @@ libdir=$(dirname "$(find "$usr" -name libdravik.so.1)")
 lib=${libdir#"$usr/"}
 expect "files" "$(sort << END
 $scratch/usr/bin/dravik-host
+$scratch/usr/include/zvckmservo/parameters.h
 $scratch/usr/include/zvckmservo/servo.h
 $scratch/usr/include/zverr/status.h
 $scratch/usr/$lib/cmake/dravik/dravikConfig.cmake

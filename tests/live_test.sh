@@ -104,11 +104,11 @@ while IFS='|' read -r status pattern options; do
     expect "$options: $pattern" 0 "$(found "^dravik-host: $pattern")"
 done << 'END'
 1|cannot open none: No such file|--reference phc:none
-1|ptp is no PTP clock: |--clock phc:ptp
+1|ptp is not a PTP clock: |--clock phc:ptp
 1|cannot make the socket none/s: No such file|--reference sock:none/s
-2|--reference: 'shm:256' is no reference|--reference shm:256
-2|--reference: 'gps' is no reference|--reference gps
-2|--clock: 'phc:' is no clock|--clock phc:
+2|--reference: 'shm:256' is not a reference|--reference shm:256
+2|--reference: 'gps' is not a reference|--reference gps
+2|--clock: 'phc:' is not a clock|--clock phc:
 2|--clock: realtime is its own reference|--clock realtime
 2|--interval: shm:1 has a pace of its own|--reference shm:1 --interval 1s
 2|--initial-offset: only the soft clock|--reference shm:1 --clock realtime --initial-offset 1s

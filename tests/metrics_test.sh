@@ -80,9 +80,9 @@ as JSON           |0|^\{"points": 89, "from": 10, "to": 99, .*"locksLost": 0, "i
 limits held       |0|peak|trace.csv --assert rms<29ns --assert rms>28ns --assert peak<=40ns --assert locks-lost<1 --assert time-to-lock<11s --assert mtie(1s)<=70ns
 a limit broken    |3|^dravik-host: peak<40ns does not hold: it is 40 ns$|trace.csv --assert peak<40ns
 two broken        |3|^dravik-host: rms<1ns .*; locks-lost>0 does not hold: it is 0$|trace.csv --assert rms<1ns --assert locks-lost>0
-not to be told    |3|adev\(1000s\)<1 cannot be told from these data|trace.csv --assert adev(1000s)<1
-beyond all tau    |3|mtie\(4294967306s\)<1us cannot be told|trace.csv --assert mtie(4294967306s)<1us
-between intervals |3|tdev\(1500ms\)<1s cannot be told|trace.csv --assert tdev(1500ms)<1s
+not to be told    |3|adev\(1000s\)<1 cannot be computed from these data|trace.csv --assert adev(1000s)<1
+beyond all tau    |3|mtie\(4294967306s\)<1us cannot be computed|trace.csv --assert mtie(4294967306s)<1us
+between intervals |3|tdev\(1500ms\)<1s cannot be computed|trace.csv --assert tdev(1500ms)<1s
 without its slope |0|^longest stretch without a gap: 59 points$|trace.csv --remove-slope
 no slope          |1|^dravik-host: one measurement has no slope$|trace.csv --from 20s --to 20s --remove-slope
 nothing in time   |3|^dravik-host: limits of masks not checked: 1$|trace.csv --from 20s --to 20s --mask g8273.2-d
@@ -91,7 +91,7 @@ no unit           |2|'20' has no unit|trace.csv --assert rms<20
 no figure         |2|'rmse' is none of rms, peak, |trace.csv --assert rmse<1ns
 no tau            |2|'tdev' is none of|trace.csv --assert tdev<1ns
 no limit          |2|'rms' is not FIGURE<LIMIT|trace.csv --assert rms
-not plain         |2|'1ns' is no plain number|trace.csv --assert adev(1s)<1ns
+not plain         |2|'1ns' is not a plain number|trace.csv --assert adev(1s)<1ns
 frequency of what |2|--frequency requires --interval|trace.csv --frequency
 no numbers        |1|^dravik-host: trace.csv: line 1 is not one number$|trace.csv --interval 1s
 no such mask      |2|--mask|trace.csv --mask g8273.2-e

@@ -73,7 +73,7 @@ c,1700003531419999977,1700003531420000000
 d,1700003532919999985,1700003532920000000
 END
 )"
-expect "no trace" "dravik-host: the standard input is no trace: neither CSV with reference_ns and clock_ns, nor lines of ptp4l, phc2sys, ts2phc or refclocks.log" \
+expect "no trace" "dravik-host: the standard input is not a trace: neither CSV with reference_ns and clock_ns, nor lines of ptp4l, phc2sys, ts2phc or refclocks.log" \
     "$(echo "reference_ns,clock" | messages)"
 expect "no measurement" "dravik-host: the standard input has no measurement" \
     "$(echo "reference_ns,clock_ns" | messages)"

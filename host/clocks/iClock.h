@@ -21,7 +21,7 @@ public:
     virtual int32_t minOffsetPpb() = 0;
 };
 
-// The machine's clock and another one at the same moment, as nearly as can be told.
+// The machine's clock and another one at the same moment, as nearly as can be had.
 struct tCrossReading {
     uint64_t systemNs; // CLOCK_REALTIME
     uint64_t clockNs;

@@ -22,7 +22,7 @@ time_t secondsOf(int64_t whole)
 {
     const auto seconds = static_cast<time_t>(whole);
     if (seconds != whole)
-        throw std::out_of_range(fmt::format("a step by {} s is beyond this machine's time", whole));
+        throw std::out_of_range(fmt::format("a step of {} s is beyond this machine's time", whole));
     return seconds;
 }
 

@@ -45,7 +45,7 @@ tPtpDevice::tPtpDevice(const std::string& path) : name(path), file(openDevice(pa
         throw std::system_error(errno, std::generic_category(), "cannot open " + path);
     ptp_clock_caps capabilities{};
     if (!ask(PTP_CLOCK_GETCAPS, &capabilities))
-        throw std::system_error(errno, std::generic_category(), path + " is no PTP clock");
+        throw std::system_error(errno, std::generic_category(), path + " is not a PTP clock");
     limitPpb = capabilities.max_adj;
 }
 

@@ -64,14 +64,14 @@ tFinding documentFinding(const tServoLibrary& library, const std::string& refere
     tServoHost host(library, clock);
     tTuning tuning;
     tuning.referenceType = referenceType;
-    const tLogged told = loggedDuring([&] { tune(host, tuning); });
-    const std::string file = fileIn(told.log);
+    const tLogged logged = loggedDuring([&] { tune(host, tuning); });
+    const std::string file = fileIn(logged.log);
     const auto finding = [&](tFinding::tGrade grade, const std::string& text) {
         return tFinding{grade, "document", fmt::format("{}: {}", referenceType, text)};
     };
     if (file.empty()) return finding(tFinding::kFault, "the plug-in looks for none");
-    if (!told.failure.empty()) return finding(tFinding::kFault, file + ": " + told.failure);
-    if (told.log.find("Unable") != std::string::npos)
+    if (!logged.failure.empty()) return finding(tFinding::kFault, file + ": " + logged.failure);
+    if (logged.log.find("Unable") != std::string::npos)
         return finding(tFinding::kLook, file + " cannot be read: the built-in values stay");
     return finding(tFinding::kGood, file);
 }

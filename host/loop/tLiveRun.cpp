@@ -34,13 +34,13 @@ void tLiveRun::run(const std::string& scenario, iLiveSource& source)
 void tLiveRun::requireStep(int64_t deltaNs) const
 {
     if (options.maxStepNs && (deltaNs > *options.maxStepNs || deltaNs < -*options.maxStepNs)) {
-        throw std::runtime_error(fmt::format("a step by {} is larger than --max-step allows, {}",
+        throw std::runtime_error(fmt::format("refused a step of {}: --max-step is {}",
                                              signedDurationText(deltaNs),
-                                             signedDurationText(*options.maxStepNs)));
+                                             durationText(*options.maxStepNs)));
     }
     if (options.noStepAfterLock && hadLock) {
         throw std::runtime_error(
-            fmt::format("a step by {} after the first lock", signedDurationText(deltaNs)));
+            fmt::format("refused a step of {} after the first lock", signedDurationText(deltaNs)));
     }
 }
 
@@ -58,10 +58,11 @@ void tLiveRun::take(const tPair& pair)
 // What was measured before a long silence says nothing of the clock after it.
 void tLiveRun::endSilence(const tPair& pair)
 {
-    const int64_t lengthNs = pair.elapsedNs - latestNs;
+    const bool isBack = isSilent && latestNs;
+    const int64_t lengthNs = pair.elapsedNs - latestNs.value_or(0);
     latestNs = pair.elapsedNs;
-    if (!inHoldover) return;
-    inHoldover = false;
+    isSilent = false;
+    if (!isBack) return;
     const bool tooLong = lengthNs >= options.longHoldoverNs;
     observers.note(pair.elapsedNs,
                    fmt::format("reference is back after {}{}", durationText(lengthNs),
@@ -79,14 +80,15 @@ void tLiveRun::checkSanity(const tPair& pair)
 
 void tLiveRun::silence(int64_t elapsedNs)
 {
-    const int64_t lengthNs = elapsedNs - latestNs;
-    if (!inHoldover && lengthNs >= options.silenceNs) {
-        inHoldover = true;
-        observers.note(elapsedNs, "reference is silent: holding the frequency");
+    const int64_t lengthNs = elapsedNs - latestNs.value_or(0);
+    if (!isSilent && lengthNs >= options.silenceNs) {
+        isSilent = true;
+        observers.note(elapsedNs, latestNs ? "reference is silent: holding the frequency"
+                                           : "no sample from the reference yet");
     }
-    tSilence silence{elapsedNs, {}, {}};
-    if (inHoldover) silence = {elapsedNs, lengthNs, estimate.errorNs(lengthNs)};
-    observers.see(silence);
+    const bool inHoldover = isSilent && latestNs;
+    observers.see(inHoldover ? tSilence{elapsedNs, lengthNs, estimate.errorNs(lengthNs)}
+                             : tSilence{elapsedNs, {}, {}});
 }
 
 void tLiveRun::reload(int64_t elapsedNs)

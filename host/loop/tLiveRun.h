@@ -47,9 +47,9 @@ private:
     tSanityCheck sanity;
     tHoldoverEstimate estimate;
     bool hadLock = false;
-    int64_t steppedNs = 0; // the sum of all steps
-    int64_t latestNs = 0;  // when the latest pair came
-    bool inHoldover = false;
+    int64_t steppedNs = 0;           // the sum of all steps
+    std::optional<int64_t> latestNs; // when the latest pair came
+    bool isSilent = false;           // for so long that it was noted
 };
 
 } // namespace dravikHost

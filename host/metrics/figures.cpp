@@ -99,14 +99,14 @@ tAssertion::tAssertion(const std::string& text) : text(text)
         return;
     }
     const auto number = numberIn<double>(value);
-    if (!number) throw std::invalid_argument(fmt::format("'{}' is no plain number", value));
+    if (!number) throw std::invalid_argument(fmt::format("'{}' is not a plain number", value));
     limit = *number;
 }
 
 std::string tAssertion::failure(const tMeasured& measured) const
 {
     const auto found = valueOf(figure, measured);
-    if (!found) return fmt::format("{} cannot be told from these data", text);
+    if (!found) return fmt::format("{} cannot be computed from these data", text);
     const bool holds = (less ? *found < limit : *found > limit) || (orEqual && *found == limit);
     if (holds) return "";
     return fmt::format("{} does not hold: it is {}", text,

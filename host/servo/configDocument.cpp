@@ -38,7 +38,7 @@ tPlace placeOf(const std::string& payload)
     return {file, line->valueint};
 }
 
-// The accessor tells the kind of the value only: the first one of that kind that is no number is
+// The accessor names the kind of the value only: the first one of that kind that is not a number is
 // the one that it met.
 bool refused(const zvckmservo_Parameter& key, const cJSON* value, const tPlace& at)
 {
@@ -50,7 +50,7 @@ bool refused(const zvckmservo_Parameter& key, const cJSON* value, const tPlace& 
 std::string wrongValueText(const zvckmservo_Parameter& key, const cJSON* value)
 {
     if (cJSON_IsNumber(value) == 0)
-        return fmt::format("{} is {}, which is no number", key.key, jsonText(value));
+        return fmt::format("{} is {}, which is not a number", key.key, jsonText(value));
     return fmt::format("{} is {}, not within {}{}{}", key.key, value->valuedouble, key.boundsText,
                        *key.unit == '\0' ? "" : " ", key.unit);
 }
@@ -100,8 +100,8 @@ std::string unknownText(const char* name)
             return distance(name, one.key) < distance(name, other.key);
         });
     const bool near = distance(name, nearest->key) <= std::strlen(nearest->key) / 3;
-    return fmt::format("{} is no key and sets nothing{}", name,
-                       near ? fmt::format("; {} is meant?", nearest->key) : "");
+    return fmt::format("{} is not a key and sets nothing{}", name,
+                       near ? fmt::format("; did you mean {}?", nearest->key) : "");
 }
 
 // "" if the value is taken as it looks.
@@ -152,7 +152,7 @@ std::string refusalText(const std::string& document, const std::string& payload)
 std::vector<std::string> documentNotes(const std::string& document)
 {
     const tJson root = parseJson(document);
-    if (cJSON_IsObject(root.get()) == 0) return {"it is no JSON object, so it sets nothing"};
+    if (cJSON_IsObject(root.get()) == 0) return {"it is not a JSON object, so it sets nothing"};
     std::vector<std::string> notes;
     const auto add = [&notes](const std::string& note) {
         if (!note.empty()) notes.push_back(note);

@@ -5,7 +5,7 @@
 
 namespace dravikHost {
 
-// What a person is told of a configuration document that the plug-in took or refused.
+// For people: what became of a configuration document that the plug-in took or refused.
 
 // Why it was refused: the key, its value, what is wrong with it, and which keys had been applied
 // before it. The payload of the failure names the place in the plug-in, which says what was wrong;

@@ -32,7 +32,7 @@ public:
     // What the plug-in asked of the clock during the last pair, or during initialisation.
     const tHostCalls& calls() const { return subject.calls; }
 
-    // What the operations work on, as they are told nothing about it.
+    // What the operations work on, as they are given no pointer to it.
     struct tSubject {
         iClock& clock;
         tHostCalls calls;

@@ -18,7 +18,7 @@ std::string metaDataOf(const std::string& referenceType)
     return tJsonObject().add("selectedTRInstID", "\"selected\"").add("TRs", references).line();
 }
 
-// Hands over the text of a file and returns it; a failure is told with the file's name.
+// Hands over the text of a file and returns it; a failure names the file.
 std::string handOver(tServoHost& host, void (tServoHost::*take)(const std::string&),
                      const std::string& path)
 {

@@ -7,7 +7,7 @@
 
 namespace dravikHost {
 
-// What a servo is told before its first pair. Files may be "-", the standard input.
+// What a servo is given before its first pair. Files may be "-", the standard input.
 struct tTuning {
     std::optional<std::string> metaDataFile;
     std::optional<std::string> referenceType; // instead of a file of metadata

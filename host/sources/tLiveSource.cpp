@@ -17,7 +17,7 @@ tLiveSource::tLiveSource(iLiveClock& clock, iReference& reference, const tSignal
 {}
 
 // A signal may also come between the test and the wait, where it interrupts nothing: hence naps.
-// A sample from before the latest order tells of a clock that is no more.
+// A sample from before the latest order describes a clock that has changed since.
 std::optional<tLiveMoment> tLiveSource::next()
 {
     constexpr int64_t kNapNs = 100'000'000;

@@ -125,7 +125,7 @@ std::string tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& build
     const auto elapsedNs = fields[kElapsed].empty()
                                ? std::optional(static_cast<int64_t>(*referenceNs))
                                : secondsIn(fields[kElapsed]);
-    if (!elapsedNs) return "elapsed_s is no time";
+    if (!elapsedNs) return "elapsed_s is not a time";
     const auto trueErrorNs = optionalIn<double>(fields[kTrueError]);
     const auto stepNs = optionalIn<int64_t>(fields[kStep]);
     const auto frequencyPpb = optionalIn<double>(fields[kFrequency]);

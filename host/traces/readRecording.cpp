@@ -49,8 +49,9 @@ tRecording readRecording(const std::string& path, const std::string& sourceName)
         if (!why.empty()) builder.setUnread(number, why);
     }
     if (format == nullptr) {
-        throw std::runtime_error(name + " is no trace: neither CSV with reference_ns and clock_ns, "
-                                        "nor lines of ptp4l, phc2sys, ts2phc or refclocks.log");
+        throw std::runtime_error(name +
+                                 " is not a trace: neither CSV with reference_ns and clock_ns, "
+                                 "nor lines of ptp4l, phc2sys, ts2phc or refclocks.log");
     }
     format->finish(builder);
     return builder.finish(name, format->name());

@@ -76,7 +76,7 @@ void addReferenceOptions(tOptionSet& options, tRun& run)
 {
     const auto take = [&run](const std::string& name) {
         if (!isReferenceName(name))
-            throw std::invalid_argument("'" + name + "' is no reference; see --help");
+            throw std::invalid_argument("'" + name + "' is not a reference; see --help");
         run.reference = name;
     };
     options.parsed("--reference", "NAME", take,
@@ -93,7 +93,7 @@ void addClockOptions(tOptionSet& options, tRun& run)
 {
     const auto take = [&run](const std::string& name) {
         if (!isClockName(name))
-            throw std::invalid_argument("'" + name + "' is no clock; see --help");
+            throw std::invalid_argument("'" + name + "' is not a clock; see --help");
         run.clock = name;
     };
     options.parsed("--clock", "NAME", take,

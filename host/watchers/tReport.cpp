@@ -64,8 +64,8 @@ void tReport::see(const tSilence& silence)
 {
     if (!silence.holdoverNs) return;
     console.progress(silence.elapsedNs, [&silence] {
-        return fmt::format("holdover for {}, error about {}", durationText(*silence.holdoverNs),
-                           silence.errorNs ? durationText(*silence.errorNs) : "unknown");
+        return fmt::format("holdover for {}, error {}", durationText(*silence.holdoverNs),
+                           silence.errorNs ? "about " + durationText(*silence.errorNs) : "unknown");
     });
 }
 
