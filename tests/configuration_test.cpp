@@ -4,6 +4,7 @@
 #include "support/raisedBy.h"
 #include "support/systemLog.h"
 #include "support/tFakeHost.h"
+#include "zvckmservo/parameters.h"
 
 #include <algorithm>
 #include <clocale>
@@ -25,36 +26,42 @@ std::string refusalAt(int line)
            std::to_string(line) + R"(,"component":"dravik"})";
 }
 
+// The parameters in the order of the document, with figures of their own. The flag and the size are
+// set by calls of other types.
+struct tParameter {
+    const char* key;
+    double (iServoConfig::*get)() const;
+    void (iServoConfig::*set)(double);
+    double initial, lowest, highest;
+    int line; // of a refusal
+};
+#define DOUBLE(key, Name, initial, lowest, highest, line)                                          \
+    {                                                                                              \
+        key, &iServoConfig::get##Name, &iServoConfig::set##Name, initial, lowest, highest, line    \
+    }
+const tParameter kParameters[] = {
+    DOUBLE("frequencyLockGain", FrequencyLockGain, 1.0, 1e-9, 10.0, 77),
+    DOUBLE("phaseLockGain", PhaseLockGain, 0.55, 1e-9, 10.0, 98),
+    DOUBLE("phaseLockCoefficientA", PhaseLockCoefficientA, 2.0, -10.0, 10.0, 119),
+    DOUBLE("phaseLockCoefficientB", PhaseLockCoefficientB, 1.0, -10.0, 10.0, 140),
+    DOUBLE("phaseLockCoefficientC", PhaseLockCoefficientC, 1.0, -10.0, 10.0, 161),
+    DOUBLE("snapTimeThreshold", SnapTimeThreshold, 1e-6, 1e-8, 10.0, 182),
+    {"spikeFilterEnabled", nullptr, nullptr, 0, 0, 1, 61}, // in the accessor
+    {"spikeFilterHistorySize", nullptr, nullptr, 5, 2, 100, 235},
+    DOUBLE("spikeFilterMaxThreshold", SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0, 256),
+    DOUBLE("spikeFilterMinThreshold", SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0, 277),
+    DOUBLE("spikeFilterGrowthFactor", SpikeFilterGrowthFactor, 3.0, 1.001, 100.0, 298),
+};
+#undef DOUBLE
+
 TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
 {
-    struct Row {
-        const char* name;
-        double (iServoConfig::*get)() const;
-        void (iServoConfig::*set)(double);
-        double initial, lowest, highest;
-        int line;
-    };
-#define PARAMETER(name, initial, lowest, highest, line)                                            \
-    {                                                                                              \
-#name, &iServoConfig::get##name, &iServoConfig::set##name, initial, lowest, highest, line  \
-    }
-    const Row rows[] = {
-        PARAMETER(FrequencyLockGain, 1.0, 1e-9, 10.0, 77),
-        PARAMETER(PhaseLockGain, 0.55, 1e-9, 10.0, 98),
-        PARAMETER(PhaseLockCoefficientA, 2.0, -10.0, 10.0, 119),
-        PARAMETER(PhaseLockCoefficientB, 1.0, -10.0, 10.0, 140),
-        PARAMETER(PhaseLockCoefficientC, 1.0, -10.0, 10.0, 161),
-        PARAMETER(SnapTimeThreshold, 1e-6, 1e-8, 10.0, 182),
-        PARAMETER(SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0, 256),
-        PARAMETER(SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0, 277),
-        PARAMETER(SpikeFilterGrowthFactor, 3.0, 1.001, 100.0, 298),
-    };
-#undef PARAMETER
     const double infinity = std::numeric_limits<double>::infinity();
     tFakeHost host;
     iServoConfig& config = host.open().config();
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.name);
+    for (const tParameter& row : kParameters) {
+        if (row.set == nullptr) continue;
+        SCOPED_TRACE(row.key);
         EXPECT_EQ(row.initial, (config.*row.get)());
         for (const double good : {row.lowest, row.highest}) {
             EXPECT_EQ("", raisedBy([&] { (config.*row.set)(good); }));
@@ -69,6 +76,40 @@ TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
     }
     EXPECT_EQ("", raisedBy([&] { config.setPhaseLockCoefficientB(0.0); }));
     EXPECT_EQ(refusalAt(77), raisedBy([&] { config.setFrequencyLockGain(0.0); }));
+}
+
+// A text file, with one blank for all white space between two words.
+std::string wordsOf(const std::string& name)
+{
+    std::ifstream file(DRAVIK_SOURCE_DIR "/" + name);
+    std::string text;
+    for (std::string word; file >> word;) {
+        text += word + " ";
+    }
+    return text;
+}
+
+TEST(Parameters, AreDescribedAsTheyAre)
+{
+    const std::string header = wordsOf("include/zvckmservo/servo.h");
+    const std::string manual = wordsOf("docs/man/dravik-servo-document.5.scd");
+    size_t inHeader = 0; // of the entry before: the order counts
+    size_t inManual = 0;
+    for (const zvckmservo_Parameter& row : zvckmservo_parameters) {
+        SCOPED_TRACE(row.key);
+        const std::string key = row.key;
+        const std::string bounds = row.boundsText;
+        const std::string initial = row.initialText;
+        const std::string unit = *row.unit != 0 ? std::string(" ") + row.unit : "";
+        const bool flag = row.kind == zvckmservo_kBool;
+        inHeader = header.find("* \"" + key + "\" " + (flag ? "1, or anything else" : bounds) +
+                                   " " + initial + " ",
+                               inHeader);
+        EXPECT_NE(std::string::npos, inHeader);
+        inManual = manual.find(
+            "*" + key + "* (" + (flag ? "0 or 1" : bounds + unit) + "; " + initial + ")", inManual);
+        EXPECT_NE(std::string::npos, inManual);
+    }
 }
 
 TEST(Parameters, FilterSwitchAndHistorySize)
@@ -212,28 +253,16 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
 
 TEST(Document, RefusesTheFirstBadMemberInItsOrder)
 {
-    struct Row {
-        const char* key;
-        int line; // of the refusal, in the accessor for the flag
-    };
-    const Row rows[] = {
-        {"frequencyLockGain", 77},        {"phaseLockGain", 98},
-        {"phaseLockCoefficientA", 119},   {"phaseLockCoefficientB", 140},
-        {"phaseLockCoefficientC", 161},   {"snapTimeThreshold", 182},
-        {"spikeFilterEnabled", 61},       {"spikeFilterHistorySize", 235},
-        {"spikeFilterMaxThreshold", 256}, {"spikeFilterMinThreshold", 277},
-        {"spikeFilterGrowthFactor", 298},
-    };
     tFakeHost host;
     iServoConfig& config = host.open().config();
     std::string bad; // from the last one on
-    for (size_t i = std::size(rows); i-- > 0;) {
-        bad.insert(0, std::string("\"") + rows[i].key +
-                          (rows[i].line == 61 ? "\":\"\"" : "\":999") + (bad.empty() ? "" : ","));
-        EXPECT_NE(std::string::npos, raisedBy([&] {
-                                         config.writeServoConfigJson("{" + bad + "}");
-                                     }).find(R"("line":)" + std::to_string(rows[i].line)))
-            << rows[i].key;
+    for (size_t i = std::size(kParameters); i-- > 0;) {
+        const bool flag = kParameters[i].highest == 1;
+        bad.insert(0, std::string("\"") + kParameters[i].key + (flag ? "\":\"\"" : "\":999") +
+                          (bad.empty() ? "" : ","));
+        const std::string refusal = raisedBy([&] { config.writeServoConfigJson("{" + bad + "}"); });
+        const std::string line = R"("line":)" + std::to_string(kParameters[i].line) + ",";
+        EXPECT_NE(std::string::npos, refusal.find(line)) << kParameters[i].key;
     }
 }
 
@@ -242,28 +271,12 @@ TEST(Document, ReadsBackAsTheVerySameNumbers)
 {
     const char* const asked = std::getenv("DRAVIK_ROUND_TRIPS");
     const long rounds = asked != nullptr ? std::strtol(asked, nullptr, 10) : 5000;
-    using tSetter = void (iServoConfig::*)(double);
-    struct Row {
-        tSetter set;
-        double lowest, highest;
-    };
-    const Row rows[] = {
-        {&iServoConfig::setFrequencyLockGain, 1e-9, 10},
-        {&iServoConfig::setPhaseLockGain, 1e-9, 10},
-        {&iServoConfig::setPhaseLockCoefficientA, -10, 10},
-        {&iServoConfig::setPhaseLockCoefficientB, -10, 10},
-        {&iServoConfig::setPhaseLockCoefficientC, -10, 10},
-        {&iServoConfig::setSnapTimeThreshold, 1e-8, 10},
-        {&iServoConfig::setSpikeFilterMaxThreshold, 1e-9, 10},
-        {&iServoConfig::setSpikeFilterMinThreshold, 1e-9, 10},
-        {&iServoConfig::setSpikeFilterGrowthFactor, 1.001, 100},
-    };
-    const auto all = [](const iServoConfig& c) {
-        return std::vector<double>{c.getFrequencyLockGain(),       c.getPhaseLockGain(),
-                                   c.getPhaseLockCoefficientA(),   c.getPhaseLockCoefficientB(),
-                                   c.getPhaseLockCoefficientC(),   c.getSnapTimeThreshold(),
-                                   c.getSpikeFilterMaxThreshold(), c.getSpikeFilterMinThreshold(),
-                                   c.getSpikeFilterGrowthFactor()};
+    const auto all = [](const iServoConfig& config) {
+        std::vector<double> values;
+        for (const tParameter& row : kParameters) {
+            if (row.get != nullptr) values.push_back((config.*row.get)());
+        }
+        return values;
     };
     tFakeHost first;
     tFakeHost second;
@@ -273,7 +286,8 @@ TEST(Document, ReadsBackAsTheVerySameNumbers)
     for (const char* locale : {"C", "de_DE.UTF-8"}) {
         ASSERT_NE(nullptr, std::setlocale(LC_ALL, locale));
         for (long round = 0; round < rounds; ++round) {
-            for (const Row& row : rows) {
+            for (const tParameter& row : kParameters) {
+                if (row.set == nullptr) continue;
                 const double share = static_cast<double>(random()) * 0x1p-64;
                 const bool small = random() % 2 == 0 && row.lowest > 0; // all magnitudes alike
                 (from.*
