@@ -342,6 +342,9 @@ TEST(Payload, ReservesABufferAndFindsItsClosingBracket)
         EXPECT_EQ(row.bracket < 0 ? nullptr : host.record.json + row.bracket, bracket);
         EXPECT_EQ(row.capacity, host.record.capacity);
     }
+    tHostStatus full(1, R"({"a":1})");
+    zverr_reserveJson(&full.record, 7);
+    EXPECT_TRUE(full.requests.empty()) << "what fits exactly is not asked for";
     tOwnStatus own;
     const char* const bracket = zverr_reserveJson(&own.record, 2);
     EXPECT_EQ(own.record.json + 1, bracket);
