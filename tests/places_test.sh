@@ -129,16 +129,19 @@ expect "no default documents" "" "$(value default)"
 expect "a warning each" "4 no default configuration for IEEE 802.1AS-2011 TAB: its place cannot be told
 4 no default configuration for IEEE 1588-2008 BC: its place cannot be told" "$(value log)"
 
-# Exhausted memory: each allocation of the load fails once.
+# Exhausted memory, in the shared layout: each allocation of the load fails once.
 for ((n = 1; ; ++n)); do
-    settle FAIL_ALLOCATION=$n RELOCATIONS="multiarchlibdir=$scratch/lib"
+    settle FAIL_ALLOCATION=$n RELOCATIONS="multiarchlibdir=$scratch/none"
     [ "$(value allocationFailed)" == 1 ] || break
     [[ "$(value log)" == *"no memory for the default configurations"* ]] && warned=1
+    [[ "$(value log)" == *"4 zvhostq::getZVSharedDir() failed"* ]] &&
+        [[ "$(value default)" == *"/usr/local/zvcorp/shared/Chronel/Servos/"* ]] && replaced=1
     code=$(value bindir)
     expect "bindir after allocation $n" 1 "$(grep -cE '^(/usr/bin|-52000 .*"line":(32|346),.*)$' <<< "$code")"
 done
 expect "the load did allocate" 1 $((n > 50))
 expect "a table that finds no memory is told" 1 "${warned:-0}"
+expect "the shared directory's usual place after all" 1 "${replaced:-0}"
 
 echo "$checks checks, $failures failures, $((n - 1)) allocations"
 exit $((failures > 0))
