@@ -12,6 +12,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <gtest/gtest.h>
+#include <initializer_list>
 #include <limits>
 #include <random>
 #include <unistd.h>
@@ -89,6 +90,15 @@ std::string wordsOf(const std::string& name)
     return text;
 }
 
+std::string joined(std::initializer_list<const char*> parts)
+{
+    std::string text;
+    for (const char* const part : parts) {
+        text += part;
+    }
+    return text;
+}
+
 TEST(Parameters, AreDescribedAsTheyAre)
 {
     const std::string header = wordsOf("include/zvckmservo/servo.h");
@@ -96,19 +106,17 @@ TEST(Parameters, AreDescribedAsTheyAre)
     size_t inHeader = 0; // of the entry before: the order counts
     size_t inManual = 0;
     for (const zvckmservo_Parameter& row : zvckmservo_parameters) {
-        SCOPED_TRACE(row.key);
-        const std::string key = row.key;
-        const std::string bounds = row.boundsText;
-        const std::string initial = row.initialText;
-        const std::string unit = *row.unit != 0 ? std::string(" ") + row.unit : "";
         const bool flag = row.kind == zvckmservo_kBool;
-        inHeader = header.find("* \"" + key + "\" " + (flag ? "1, or anything else" : bounds) +
-                                   " " + initial + " ",
-                               inHeader);
-        EXPECT_NE(std::string::npos, inHeader);
-        inManual = manual.find(
-            "*" + key + "* (" + (flag ? "0 or 1" : bounds + unit) + "; " + initial + ")", inManual);
-        EXPECT_NE(std::string::npos, inManual);
+        const std::string headerEntry =
+            joined({"* \"", row.key, "\" ", flag ? "1, or anything else" : row.boundsText, " ",
+                    row.initialText, " "});
+        const std::string manualEntry =
+            joined({"*", row.key, "* (", flag ? "0 or 1" : row.boundsText,
+                    *row.unit != 0 ? " " : "", row.unit, "; ", row.initialText, ")"});
+        inHeader = header.find(headerEntry, inHeader);
+        EXPECT_NE(std::string::npos, inHeader) << headerEntry;
+        inManual = manual.find(manualEntry, inManual);
+        EXPECT_NE(std::string::npos, inManual) << manualEntry;
     }
 }
 

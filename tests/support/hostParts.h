@@ -30,12 +30,13 @@ hostTable(void (*getTime)(uint64_t* timeNs, zverr_Status* status),
  * of it shows. */
 static inline bool exactReallocJson(zverr_Status* status, uint32_t size)
 {
-    if (size > 0 && size <= status->capacity) return true;
-    char* const text = size > 0 ? (char*)calloc(size, 1) : NULL;
-    if (size > 0 && text == NULL) return false;
-    if (text != NULL) {
-        const char* const kept = status->json != NULL ? status->json : "{}";
-        memcpy(text, kept, strlen(kept));
+    char* text = NULL; // NOLINT(modernize-use-nullptr): it is C, too
+    if (size > 0) {
+        if (size <= status->capacity) return true;
+        text = (char*)calloc(size, 1);
+        if (!text) return false;
+        const char* const kept = status->json ? status->json : "{}";
+        memcpy(text, kept, strlen(kept) + 1);
         text[size - 1] = 'J';
     }
     free(status->json);
