@@ -8,7 +8,7 @@
 namespace zvckmDravik {
 
 // The tuning parameters as the states and the spike filter read them, and as configuration text
-// sets them. A setter checks its value (bounds in tServoParameters.cpp) and touches nothing but
+// sets them. A setter checks its value (bounds in zvckmservo/parameters.h) and touches nothing but
 // its own parameter; a value is used from the next time that it is read. The two frequency limits
 // come from the host at construction and cannot be set.
 //
