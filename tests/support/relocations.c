@@ -13,8 +13,11 @@ static int answer(const char* name, char* buffer, size_t size)
     memset(buffer, '#', size); /* what a result of 0 leaves is not to be read */
     for (; row != NULL; row = strchr(row, ':') != NULL ? strchr(row, ':') + 1 : NULL) {
         if (strncmp(row, name, length) == 0 && row[length] == '=') {
-            (void)snprintf(buffer, size, "%.*s", (int)strcspn(row + length + 1, ":"),
-                           row + length + 1);
+            const char* const path = row + length + 1;
+            const size_t pathLength = strcspn(path, ":");
+            if (pathLength >= size) return -1;
+            memcpy(buffer, path, pathLength);
+            buffer[pathLength] = 0;
             return 1;
         }
     }
