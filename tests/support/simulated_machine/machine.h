@@ -1,0 +1,146 @@
+#pragma once
+/* A simulated machine for unchanged programs: loaded before the C library it keeps all their clocks
+ * and lets time pass only while they wait, so that an hour takes no time and gives the same bytes
+ * again. Nothing under it can set a clock of the real machine. Not for programs of several threads.
+ *
+ * SIMULATED_MACHINE names a file of statements, one a line; # begins a comment. Times have a unit
+ * of ns, us, ms, s, frequencies one of ppb, ppm.
+ *   seed N                 of all noise; start T: true time at the start; tai N: seconds
+ *   grid T                 how often oscillators change (10ms), whatever the program does
+ *   reading T              what each reading of a clock takes (20ns); wake T: lateness of a waker
+ *   trace FILE [pace=T]    rows of elapsed_s,clock,error_ns,ordered_ppb,event: the true error of
+ *                          each clock at each order given to it, and at a pace
+ *   emulator               run by an emulator: a filter of system calls cannot be had
+ *   system KEY=VALUE...    the machine's oscillator, which all CLOCK_... share
+ *   ptp PATH KEY=VALUE...  a PTP hardware clock that is opened by that name
+ *     offset= frequency=   at the start, against true time; max= the largest order
+ *     white= wander=       noise of the frequency: deviation over 1 s, of its walk in 1 s
+ *     sine= period= ramp=  ppb, time, ppb each second; file=FILE: ppb, a line for each second
+ *     status=              system: bits of the kernel's clock at the start; delay= ptp: a reading's
+ *     quirks=LETTERS       p no permission to set; orders beyond 10 ppm are c cut, r refused;
+ *                          no PTP_SYS_OFFSET_PRECISE e, nor _EXTENDED b
+ *   shm UNIT KEY=VALUE...  a segment of NTP with a producer in it; sock PATH KEY=VALUE...: a
+ *                          producer of datagrams to that socket of the program
+ *     interval= first=     when samples come; none without an interval
+ *     count= offset=       how many of them; true time as they tell it
+ *     bits=32|64 mode=0|1  of a time_t; of a segment, where absent=1 leaves making it to the
+ * program micro=1 leap=N       nanoseconds are left at 0; leap indicator pulse=1              only
+ * the fraction of a second of an offset holds, the rest is wrong spoilt=WORD/...      the first
+ * samples, one word each: leap old magic short long torn ok Clocks of PTP, segments and sockets
+ * also take what their readings have of errors: noise= outliers= size=  deviation; share of
+ * outliers and their size; errors=FILE: ns, a line each at T signal HUP|INT|TERM       at T run
+ * SHELL COMMAND at T step NAME T | frequency NAME F    by somebody else; NAME: system, a PATH or a
+ * UNIT at T silence NAME | resume NAME        no samples; readings of a PTP clock fail */
+#define _GNU_SOURCE
+#include <dlfcn.h>
+#include <errno.h>
+#include <stdint.h>
+#include <stdio.h>
+#include <stdlib.h>
+#include <string.h>
+#include <sys/types.h>
+#include <time.h>
+
+enum { kSecondNs = 1000000000 };
+
+/* Random numbers that are the same bits on every machine; each cause has its own. */
+struct noise {
+    uint64_t state;
+    double spare;
+    int hasSpare;
+};
+double uniform(struct noise* noise); /* 0 to below 1 */
+double normal(struct noise* noise);  /* mean 0, deviation 1 */
+
+struct series {
+    double* values;
+    size_t count;
+};
+
+struct measurement {
+    double deviationNs, outlierShare, outlierNs;
+    struct series errorsNs;
+    size_t next;
+    struct noise noise;
+};
+int64_t measurementErrorNs(struct measurement* model);
+
+struct phase {
+    int64_t wholeNs;
+    double fractionNs;
+};
+
+struct clock {
+    char name[108];
+    struct phase raw, steered; /* since the start; a step moves neither */
+    int64_t steppedNs;         /* with the offset at the start */
+    double offsetNs, frequencyPpb, whitePpb, wanderPpb, sinePpb, periodNs, rampPpb, maxPpb;
+    struct series filePpb;
+    double delayNs, status;
+    char quirks[8];
+    struct measurement reading;
+    struct noise white, walk;
+    double walkedPpb, ownPpb; /* ownPpb: of the oscillator, in this stretch of the grid */
+    double orderedPpb, slewPpb;
+    int silent, file;
+};
+
+struct producer {
+    char path[108]; /* "": a segment */
+    double unit, intervalNs, firstNs, count, offsetNs, bits, mode, absent, micro, pulse, leap;
+    char spoilt[64];
+    struct measurement reading;
+    int64_t nextNs, steppedNs;
+    int silent, produced, file;
+    size_t size;
+    unsigned char* segment;
+};
+
+enum verb { kSignal, kRun, kStep, kFrequency, kSilence, kResume };
+struct event {
+    int64_t atNs;
+    enum verb verb;
+    char text[256];
+    double value;
+};
+
+enum { kClocks = 4, kProducers = 4, kEvents = 32 };
+struct machine {
+    double seed, startNs, taiS, gridNs, readingNs, wakeNs, paceNs;
+    int emulated, signalled;
+    FILE* trace;
+    int64_t elapsedNs, slotEndNs, nextTraceNs; /* true time since the start */
+    struct clock clocks[kClocks];              /* the first is the machine's */
+    struct producer producers[kProducers];
+    struct event events[kEvents]; /* one that is over has the verb kept and atNs at INT64_MAX */
+    int clockCount, producerCount, eventCount;
+};
+
+struct machine* machine(void); /* configured on first use */
+_Noreturn void giveUp(const char* what, const char* which);
+void configure(struct machine* made);
+void lockUp(int emulated); /* no clock of the real machine can be set from here on */
+
+int64_t trueNs(void);
+int64_t timeOf(const struct clock* clock);
+double excessOf(const struct clock* clock); /* of its rate, as a fraction */
+void advance(int64_t ns);
+double slewOf(double seconds);
+void advanceTo(int64_t elapsedNs);
+int64_t nextEventNs(void);
+void traceClock(const struct clock* clock, const char* event);
+struct clock* clockOfFile(int file);
+struct clock* clockOfId(clockid_t id); /* NULL: of the processor, or not there */
+
+void startProducer(struct producer* producer);
+void produce(struct producer* producer);
+
+/* The C library's own function of that name. */
+#define NEXT(name) (__extension__(__typeof__(&(name))) nextFunction(#name))
+void* nextFunction(const char* name);
+
+static inline int fail(int failure)
+{
+    errno = failure;
+    return -1;
+}
