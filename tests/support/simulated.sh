@@ -10,3 +10,36 @@ simulated() { # PROGRAM ARGUMENT...: under the machine that the file machine des
     fi
     ${asUser:-} env ASAN_OPTIONS="${ASAN_OPTIONS:-}:verify_asan_link_order=0" "${under[@]}" "$@"
 }
+
+simulatedHost() { # STATEMENTS ARGUMENT...: dravik-host, statements with ; between them
+    tr ';' '\n' <<< "reading 0ns;$1" > machine
+    simulated ${EMULATOR:+"$EMULATOR"} "$bin/dravik-host" "${@:2}"
+}
+
+# Each block of the standard input is a run: == NAME | STATEMENTS | OPTIONS | COMMAND, and all that
+# is to be seen: what it prints but its first line and, unless the block has it, the summary; its exit
+# status if not 0; what the command prints.
+expectRuns() {
+    local head='' expected='' line
+    while IFS= read -r line; do
+        if [[ $line != '== '* ]]; then
+            expected+=$line$'\n'
+            continue
+        fi
+        [ -z "$head" ] || expectRun "$head" "$expected"
+        head=${line#== } expected=
+    done
+    expectRun "$head" "$expected"
+}
+
+expectRun() { # HEAD EXPECTED
+    local name statements options command status
+    IFS='|' read -r name statements options command <<< "$1"
+    # shellcheck disable=SC2086  # split on purpose
+    simulatedHost "$statements" run $options > out 2>&1
+    status=$?
+    sed -i '/^run: /d' out
+    [[ $2 == *'pairs  '* ]] || sed -i '/^pairs  /,$d' out
+    [ $status == 0 ] || echo "exit $status" >> out
+    expect "${name% }" "${2%$'\n'}" "$(cat out; eval "$command")"
+}

@@ -90,6 +90,7 @@ time_t time(time_t* seconds)
 }
 
 static const int64_t kForever = INT64_MAX;
+static const int64_t kLookNs = 1000; /* what a look without waiting takes */
 typedef int tReady(void* what); /* as the call returns it; 0: nothing yet */
 
 /* Waits so long by the machine's clock. Returns what ready does, 0 when the time is over, -1 when a
@@ -100,7 +101,7 @@ static int waitFor(int64_t ns, tReady* ready, void* what, int64_t* leftNs)
     const double excess = excessOf(&now->clocks[0]);
     const int64_t trueLengthNs = ns - (int64_t)((double)ns * (excess / (1 + excess)));
     const int64_t endNs = ns == kForever ? kForever : now->elapsedNs + trueLengthNs;
-    if (ready) advance((int64_t)now->readingNs);
+    if (ready && ns == 0) advance(kLookNs);
     for (;;) {
         const int found = ready ? ready(what) : 0;
         if (found != 0) return found;
