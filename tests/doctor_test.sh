@@ -1,17 +1,18 @@
 #!/usr/bin/env bash
-# What the doctor sees of the plug-in, of default documents in all their states, and of clocks, for
-# which a library of our own stands in.
+# What the doctor sees of the plug-in, of default documents in all their states, and of clocks of a
+# simulated machine.
 # Usage: doctor_test.sh FOLDER CC, with dravik-host and libdravik.so.1 in the folder
 set -uo pipefail
 bin=$(cd "$1" && pwd)
-host=(${EMULATOR:+"$EMULATOR"} "$bin/dravik-host")
 support=$(cd "$(dirname "$0")/support" && pwd)
+# shellcheck source-path=SCRIPTDIR source=support/expect.sh
 source "$support/expect.sh"
+# shellcheck source-path=SCRIPTDIR source=support/simulated.sh
+source "$support/simulated.sh"
 scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 cd "$scratch" || exit 1
-source "$support/kernel_clocks.sh"
 
 # As on a target: the manager's folder is there, with one document that is good and one that is not.
 servos=$scratch/zv-chronel/servos
@@ -21,9 +22,9 @@ echo '{"phaseLockGain": 0}' > "$servos/dravik_tr_ptp4l_bc.json"
 touch ptp
 export RELOCATIONS=multiarchlibdir=$scratch
 export LIBRARIES=$bin/../tests/relocations
-doctor() { underKernelClocks "$1" "${host[@]}" doctor "${@:2}" > out 2> err; } # LETTERS ARGUMENT...
+doctor() { simulatedHost "$1" doctor "${@:2}" > out 2> err; } # STATEMENTS ARGUMENT...
 
-doctor b ptp none
+doctor "system status=0 frequency=7ppm;ptp ./ptp quirks=b delay=400ns offset=1000s max=50ppm" ./ptp none
 expect "exit status" 1 $?
 expect "faults in all" "dravik-host: faults found: 2" "$(cat err)"
 while IFS='|' read -r count pattern; do
@@ -36,22 +37,23 @@ done << END
 1|^FAULT document +IEEE 1588-2008 BC: $servos/dravik_tr_ptp4l_bc.json: applyMetaData failed
 1|^ok +CLOCK_REALTIME said to be synchronised; steered by \+0.000 ppm, up to \+500.000 ppm\$
 1|^ok +TAI offset +37 s\$
-1|^ok +PTP clock +ptp: steered up to \+62500.000 ppm, read by PTP_SYS_OFFSET within [0-9.]+ [nu]s, \+1e\+09 s from
+1|^ok +PTP clock +./ptp: steered up to \+50.000 ppm, read by PTP_SYS_OFFSET within 400 ns, \+1000 s from
 1|^FAULT PTP clock +cannot open none: No such file
 1|^(ok|look) +permission
 10|.
 END
 
 rm "$servos/dravik_tr_ptp4l_bc.json"
-doctor "" ptp
+doctor "system;ptp ./ptp" ./ptp
 expect "a document that is not there: exit status" 0 $?
 expect "a document that is not there" 1 "$(grep -c "^look .*$servos/dravik_tr_ptp4l_bc.json cannot be read: the built-in" out)"
 expect "hardware reads" 1 "$(grep -c 'by PTP_SYS_OFFSET_PRECISE within 0 ns' out)"
+expect "not synchronised" 1 "$(grep -c '^ok .*CLOCK_REALTIME nobody says that it is synchronised' out)"
 
 "$2" -shared -fPIC -o other.so -x c /dev/null
-doctor "" --library ./other.so ptp
+doctor system --library ./other.so
 expect "not the plug-in" "1 1" "$? $(grep -c '^FAULT library .*is not the plug-in: it has no zvckmservo_initialize' out)"
-doctor "" --library ./none.so ptp
+doctor system --library ./none.so
 expect "no plug-in" "1 1" "$? $(grep -c '^FAULT library .*cannot load the plug-in: ./none.so' out)"
 
 echo "$checks checks, $failures failures"

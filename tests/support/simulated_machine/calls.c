@@ -91,7 +91,7 @@ time_t time(time_t* seconds)
 
 static const int64_t kForever = INT64_MAX;
 static const int64_t kLookNs = 1000; /* what a look without waiting takes */
-typedef int tReady(void* what); /* as the call returns it; 0: nothing yet */
+typedef int tReady(void* what);      /* as the call returns it; 0: nothing yet */
 
 /* Waits so long by the machine's clock. Returns what ready does, 0 when the time is over, -1 when a
  * signal came before; leftNs: what is left then. */

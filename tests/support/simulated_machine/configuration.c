@@ -5,6 +5,7 @@
 #include <stddef.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
+#include <sys/timex.h>
 #include <unistd.h>
 
 _Noreturn void giveUp(const char* what, const char* which)
@@ -137,6 +138,7 @@ static void addClock(struct machine* made, const char* name, char** rest)
     (void)snprintf(clock->name, sizeof clock->name, "%s", name);
     clock->maxPpb = isSystem ? 500e3 : 62.5e6;
     clock->delayNs = made->readingNs;
+    clock->status = STA_UNSYNC;
     setAll(rest, clock, kOfClock, &clock->reading);
     clock->file = isSystem ? -1 : memfd_create("ptp", MFD_CLOEXEC);
 }

@@ -16,21 +16,20 @@
  *     offset= frequency=   at the start, against true time; max= the largest order
  *     white= wander=       noise of the frequency: deviation over 1 s, of its walk in 1 s
  *     sine= period= ramp=  ppb, time, ppb each second; file=FILE: ppb, a line for each second
- *     status=              system: bits of the kernel's clock at the start; delay= ptp: a reading's
- *     quirks=LETTERS       p no permission to set; orders beyond 10 ppm are c cut, r refused;
- *                          no PTP_SYS_OFFSET_PRECISE e, nor _EXTENDED b
- *   shm UNIT KEY=VALUE...  a segment of NTP with a producer in it; sock PATH KEY=VALUE...: a
- *                          producer of datagrams to that socket of the program
- *     interval= first=     when samples come; none without an interval
- *     count= offset=       how many of them; true time as they tell it
- *     bits=32|64 mode=0|1  of a time_t; of a segment, where absent=1 leaves making it to the
- * program micro=1 leap=N       nanoseconds are left at 0; leap indicator pulse=1              only
- * the fraction of a second of an offset holds, the rest is wrong spoilt=WORD/...      the first
- * samples, one word each: leap old magic short long torn ok Clocks of PTP, segments and sockets
- * also take what their readings have of errors: noise= outliers= size=  deviation; share of
- * outliers and their size; errors=FILE: ns, a line each at T signal HUP|INT|TERM       at T run
- * SHELL COMMAND at T step NAME T | frequency NAME F    by somebody else; NAME: system, a PATH or a
- * UNIT at T silence NAME | resume NAME        no samples; readings of a PTP clock fail */
+ *     status=              system: bits of the kernel's clock at the start (64: not synchronised);
+ * delay= ptp: a reading's quirks=LETTERS       p no permission to set; orders beyond 10 ppm are c
+ * cut, r refused; no PTP_SYS_OFFSET_PRECISE e, nor _EXTENDED b shm UNIT KEY=VALUE...  a segment of
+ * NTP with a producer in it; sock PATH KEY=VALUE...: a producer of datagrams to that socket of the
+ * program interval= first=     when samples come; none without an interval count= offset=       how
+ * many of them; true time as they tell it bits=32|64 mode=0|1  of a time_t; of a segment, where
+ * absent=1 leaves making it to the program micro=1 leap=N       nanoseconds are left at 0; leap
+ * indicator pulse=1              only the fraction of a second of an offset holds, the rest is
+ * wrong spoilt=WORD/...      the first samples, one word each: leap old magic short long torn ok
+ * Clocks of PTP, segments and sockets also take what their readings have of errors: noise=
+ * outliers= size=  deviation; share of outliers and their size; errors=FILE: ns, a line each at T
+ * signal HUP|INT|TERM       at T run SHELL COMMAND at T step NAME T | frequency NAME F    by
+ * somebody else; NAME: system, a PATH or a UNIT at T silence NAME | resume NAME        no samples;
+ * readings of a PTP clock fail */
 #define _GNU_SOURCE
 #include <dlfcn.h>
 #include <errno.h>

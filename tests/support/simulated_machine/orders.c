@@ -38,6 +38,7 @@ static void startKernel(void)
     if (kernelIsOn) return;
     kernelIsOn = 1;
     kernel.status = (int)machine()->clocks[0].status;
+    if (!(kernel.status & STA_UNSYNC)) kernel.maxError = kernel.estimatedError = 0;
 }
 
 static int order(struct clock* clock, double ppb)
