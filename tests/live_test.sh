@@ -51,13 +51,13 @@ left out of the reference's samples: 1 out of date, 1 not usable
 left out of the reference's samples: 1 out of date, 2 not usable
 == the first unit is private | shm 0 absent=1;trace trace | --reference shm:0 --duration 1s | cut -d, -f5 trace
 event
-segment 96 600
+segment 600
 == the second, too | shm 1 absent=1;trace trace | --reference shm:1 --duration 1s | cut -d, -f5 trace
 event
-segment 96 600
+segment 600
 == others are not | shm 2 absent=1;trace trace | --reference shm:2 --duration 1s | cut -d, -f5 trace
 event
-segment 96 666
+segment 666
 == its producer comes later | shm 2 absent=1 interval=1s first=2s | --reference shm:2 --config calm.json --duration 6s
      3.000 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
      4.000 s  stepped by -3.036 ms

@@ -19,6 +19,7 @@ printf '%s\n' 30 -10 20 -40 0 > errors
 echo '{"snapTimeThreshold": 1e-3}' > calm.json
 cp calm.json live.json
 mkdir folder
+# shellcheck disable=SC2317  # called in the blocks
 figures() { sed -n 's/^dravik_//p' "$@"; }
 replay() { "${EMULATOR:-env}" "$bin/dravik-host" replay "$@" 2> /dev/null; }
 expectRuns << 'END'

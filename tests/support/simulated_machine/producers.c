@@ -145,7 +145,7 @@ int shmget(key_t key, size_t size, int flags)
         if (producer->size != 0 && (flags & IPC_CREAT) && (flags & IPC_EXCL)) return fail(EEXIST);
         if (producer->size == 0) {
             char event[32];
-            (void)snprintf(event, sizeof event, "segment %zu %o", size, (unsigned)flags & 0777U);
+            (void)snprintf(event, sizeof event, "segment %o", (unsigned)flags & 0777U);
             traceClock(&machine()->clocks[0], event);
             producer->size = size;
         }
