@@ -1,6 +1,7 @@
 /* Produces samples of a true time 5 ms ahead of the machine's, one every 20 ms until it is killed.
  * Usage: producer shm UNIT   into a shared memory segment that a consumer makes
  *        producer sock PATH  as datagrams */
+#define _GNU_SOURCE
 #include <stddef.h>
 #include <stdint.h>
 #include <stdlib.h>

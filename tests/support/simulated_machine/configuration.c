@@ -170,9 +170,10 @@ static void addEvent(struct machine* made, char** rest)
     static const char* const signals[] = {"HUP", "INT", "TERM", NULL};
     const char* const at = strtok_r(NULL, " ", rest);
     const char* const verb = strtok_r(NULL, " ", rest);
-    const char* const text =
-        strtok_r(NULL, verb && *verb == 'r' && verb[1] == 'u' ? "" : " ", rest);
-    if (!text || made->eventCount == kEvents) giveUp("no such event", at ? at : "");
+    const int isCommand = verb && strcmp(verb, "run") == 0;
+    const char* const text = strtok_r(NULL, isCommand ? "" : " ", rest);
+    if (!at || !verb || !text) giveUp("not an event", at ? at : "");
+    if (made->eventCount == kEvents) giveUp("too many events", at);
     struct event* const event = &made->events[made->eventCount++];
     event->atNs = (int64_t)quantityIn(at);
     event->verb = (enum verb)numberOf(verb, verbs);

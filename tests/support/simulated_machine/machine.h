@@ -80,7 +80,7 @@ struct clock {
     struct measurement reading;
     struct noise white, walk;
     double walkedPpb, ownPpb; /* ownPpb: of the oscillator, in this stretch of the grid */
-    double orderedPpb, slewPpb;
+    double orderedPpb;
     int silent, file;
 };
 
@@ -124,7 +124,6 @@ int64_t trueNs(void);
 int64_t timeOf(const struct clock* clock);
 double excessOf(const struct clock* clock); /* of its rate, as a fraction */
 void advance(int64_t ns);
-double slewOf(double seconds);
 void advanceTo(int64_t elapsedNs);
 int64_t nextEventNs(void);
 void traceClock(const struct clock* clock, const char* event);

@@ -22,9 +22,7 @@ enum { kMostErrorUs = 16000000 };
 static struct {
     int status, constant;
     long tick, frequency, maxError, estimatedError;
-    int64_t setNs, referenceNs; /* of the errors; of the loop */
-    double offsetNs;            /* still to be slewed away by the kernel's loop */
-    double singleNs;            /* by adjtime */
+    int64_t setNs; /* when errors were told */
 } kernel = {.tick = 10000, .maxError = kMostErrorUs, .estimatedError = kMostErrorUs};
 static int kernelIsOn;
 
@@ -59,7 +57,6 @@ static int step(struct clock* clock, int64_t ns)
         kernel.status |= STA_UNSYNC;
         kernel.maxError = kernel.estimatedError = kMostErrorUs;
         kernel.setNs = machine()->elapsedNs;
-        kernel.offsetNs = kernel.singleNs = 0;
     }
     clock->steppedNs += ns;
     traceClock(clock, "step");
@@ -72,33 +69,6 @@ static int stepBy(struct clock* clock, const struct timex* request)
     const int64_t fraction = (int64_t)request->time.tv_usec;
     if (fraction < 0 || fraction >= kSecondNs / unit) return fail(EINVAL);
     return step(clock, (int64_t)request->time.tv_sec * kSecondNs + fraction * unit);
-}
-
-/* The kernel's loop slews an offset away, and takes its share of the frequency at once. */
-static void loopBy(const struct timex* request)
-{
-    const double nano = kernel.status & STA_NANO ? 1 : 1000;
-    const double mostNs = 500e6;
-    if (!(kernel.status & STA_PLL)) return;
-    kernel.offsetNs = fmax(-mostNs, fmin(mostNs, (double)request->offset * nano));
-    const double mostSeconds = ldexp(1, 3 + kernel.constant);
-    const double seconds = (double)(machine()->elapsedNs - kernel.referenceNs) * 1e-9;
-    if (!(kernel.status & STA_FREQHOLD) && kernel.referenceNs > 0) {
-        kernel.frequency += lround(kernel.offsetNs * fmin(seconds, mostSeconds) /
-                                   ldexp(1, 2 * (4 + kernel.constant)) * kUnitsPerPpb);
-    }
-    kernel.referenceNs = machine()->elapsedNs;
-}
-
-/* The kernel slews second by second; here it does so whenever a stretch of time begins. */
-double slewOf(double seconds)
-{
-    const double most = 500e3 * seconds;
-    const double single = fmax(-most, fmin(most, kernel.singleNs));
-    kernel.singleNs -= single;
-    const double loop = kernel.offsetNs * seconds / ldexp(1, 2 + kernel.constant);
-    kernel.offsetNs -= loop;
-    return (single + loop) / seconds;
 }
 
 static int orderFrequency(struct clock* clock)
@@ -124,14 +94,12 @@ static int adjustKernel(struct clock* clock, struct timex* request)
         kernel.constant = (int)request->constant + (kernel.status & STA_NANO ? 0 : 4);
     if ((modes & ADJ_TAI) && request->constant >= 0) machine()->taiS = (double)request->constant;
     if (modes & ADJ_TICK) kernel.tick = request->tick;
-    if (modes & ADJ_FREQUENCY)
+    if (modes & ADJ_FREQUENCY) {
         kernel.frequency = request->freq > widest    ? widest
                            : request->freq < -widest ? -widest
                                                      : request->freq;
-    if (modes & ADJ_OFFSET) loopBy(request);
-    const int steered = (modes & (ADJ_FREQUENCY | ADJ_TICK)) || (modes & ADJ_OFFSET);
-    if (steered && orderFrequency(clock) != 0) return -1;
-    return 0;
+    }
+    return modes & (ADJ_FREQUENCY | ADJ_TICK) ? orderFrequency(clock) : 0;
 }
 
 static int answerKernel(const struct clock* clock, struct timex* answer)
@@ -141,7 +109,7 @@ static int answerKernel(const struct clock* clock, struct timex* answer)
     const int64_t ns = timeOf(clock);
     answer->maxerror = (long)fmin(kMostErrorUs, (double)(kernel.maxError + grownUs));
     if (answer->maxerror >= kMostErrorUs) kernel.status |= STA_UNSYNC;
-    answer->offset = lround(kernel.offsetNs / (nano ? 1 : 1000));
+    answer->offset = 0;
     answer->freq = odd(clock, 'c') ? lround(clock->orderedPpb * kUnitsPerPpb) : kernel.frequency;
     answer->esterror = kernel.estimatedError;
     answer->status = kernel.status;
@@ -164,7 +132,6 @@ static int adjustPtp(struct clock* clock, struct timex* request)
         if (fabs(ppb) > clock->maxPpb) return fail(ERANGE);
         if (order(clock, ppb) != 0) return -1;
     }
-    if (request->modes & ADJ_OFFSET) return fail(EOPNOTSUPP);
     request->freq = lround(clock->orderedPpb * kUnitsPerPpb);
     request->tolerance = lround(fmin(clock->maxPpb * kUnitsPerPpb, INT32_MAX));
     return 0;
@@ -177,27 +144,20 @@ int clock_adjtime(clockid_t id, struct timex* request)
     startKernel();
     advance((int64_t)machine()->readingNs);
     if (request->modes && odd(clock, 'p')) return fail(EPERM);
+    if ((request->modes & ADJ_OFFSET_SINGLESHOT) && request->offset != 0) return fail(EOPNOTSUPP);
     if (clock->file >= 0) return adjustPtp(clock, request);
-    const int isSingle = (request->modes & ADJ_OFFSET_SINGLESHOT) == ADJ_OFFSET_SINGLESHOT;
-    if (!isSingle) return adjustKernel(clock, request) ? -1 : answerKernel(clock, request);
-    const long leftUs = lround(kernel.singleNs * 1e-3);
-    if ((request->modes & ADJ_OFFSET_SS_READ) != ADJ_OFFSET_SS_READ)
-        kernel.singleNs = (double)request->offset * 1e3;
-    const int state = answerKernel(clock, request);
-    request->offset = leftUs;
-    return state;
+    return adjustKernel(clock, request) ? -1 : answerKernel(clock, request);
 }
 
 int adjtimex(struct timex* request) { return clock_adjtime(CLOCK_REALTIME, request); }
 int ntp_adjtime(struct timex* request) { return clock_adjtime(CLOCK_REALTIME, request); }
 
+/* The kernel's own slewing of an offset is left out. */
 int adjtime(const struct timeval* delta, struct timeval* before)
 {
-    struct timex request = {.modes = delta ? ADJ_OFFSET_SINGLESHOT : ADJ_OFFSET_SS_READ};
-    if (delta) request.offset = (long)(delta->tv_sec * 1000000 + delta->tv_usec);
-    if (clock_adjtime(CLOCK_REALTIME, &request) < 0) return -1;
-    if (before) *before = (struct timeval){request.offset / 1000000, request.offset % 1000000};
-    return 0;
+    (void)delta;
+    (void)before;
+    return fail(EOPNOTSUPP);
 }
 
 int clock_settime(clockid_t id, const struct timespec* time)
@@ -271,7 +231,7 @@ static int answerPtp(struct clock* clock, unsigned long request, void* argument)
         if (reply->n_samples > PTP_MAX_SAMPLES) return fail(EINVAL);
         for (unsigned i = 0; i < reply->n_samples; ++i) {
             crossRead(clock, three);
-            memcpy(&reply->ts[2 * i], three, sizeof three);
+            memcpy(&reply->ts[(size_t)i * 2], three, sizeof three);
         }
         return 0;
     }
@@ -304,30 +264,46 @@ struct clock* clockOfFile(int file)
     return NULL;
 }
 
-static int openClock(const char* path)
+/* NULL: some other file. A clock of the real machine has no stand-in. */
+static const struct clock* clockOfPath(const char* path)
 {
-    for (int i = 1; i < machine()->clockCount; ++i)
-        if (strcmp(path, machine()->clocks[i].name) == 0)
-            return fcntl(machine()->clocks[i].file, F_DUPFD_CLOEXEC, 0);
-    const int isReal = strncmp(path, "/dev/ptp", 8) == 0 || strncmp(path, "/dev/rtc", 8) == 0;
-    return isReal ? fail(EACCES) : -2; /* -2: any other file */
+    static const struct clock real = {.file = -1};
+    for (int i = 1; i < machine()->clockCount; ++i) {
+        if (strcmp(path, machine()->clocks[i].name) == 0) return &machine()->clocks[i];
+    }
+    return strncmp(path, "/dev/ptp", 8) == 0 || strncmp(path, "/dev/rtc", 8) == 0 ? &real : NULL;
 }
 
-#define OPEN(name, parameters, next)                                                               \
-    int name parameters                                                                            \
+static int openClock(const struct clock* clock)
+{
+    return clock->file < 0 ? fail(EACCES) : fcntl(clock->file, F_DUPFD_CLOEXEC, 0);
+}
+
+/* The mode is there only for files that are made; passed on it does no harm. */
+#define OPEN(name)                                                                                 \
+    int name(const char* path, int flags, ...)                                                     \
     {                                                                                              \
         va_list arguments;                                                                         \
         va_start(arguments, flags);                                                                \
-        const int makes = (flags & O_CREAT) || (flags & O_TMPFILE) == O_TMPFILE;                   \
-        const mode_t mode = makes ? va_arg(arguments, mode_t) : 0;                                 \
+        const mode_t mode = va_arg(arguments, mode_t);                                             \
         va_end(arguments);                                                                         \
-        const int file = openClock(path);                                                          \
-        return file == -2 ? next : file;                                                           \
+        const struct clock* const clock = clockOfPath(path);                                       \
+        return clock ? openClock(clock) : NEXT(name)(path, flags, mode);                           \
     }
-OPEN(open, (const char* path, int flags, ...), NEXT(open)(path, flags, mode))
-OPEN(open64, (const char* path, int flags, ...), NEXT(open64)(path, flags, mode))
-OPEN(openat, (int at, const char* path, int flags, ...), NEXT(openat)(at, path, flags, mode))
-OPEN(openat64, (int at, const char* path, int flags, ...), NEXT(openat64)(at, path, flags, mode))
+#define OPEN_AT(name)                                                                              \
+    int name(int at, const char* path, int flags, ...)                                             \
+    {                                                                                              \
+        va_list arguments;                                                                         \
+        va_start(arguments, flags);                                                                \
+        const mode_t mode = va_arg(arguments, mode_t);                                             \
+        va_end(arguments);                                                                         \
+        const struct clock* const clock = clockOfPath(path);                                       \
+        return clock ? openClock(clock) : NEXT(name)(at, path, flags, mode);                       \
+    }
+OPEN(open)
+OPEN(open64)
+OPEN_AT(openat)
+OPEN_AT(openat64)
 
 /* The forms of a program that is compiled with checks of its arguments. */
 int __open_2(const char* path, int flags);                              /* NOLINT: its name */

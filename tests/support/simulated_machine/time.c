@@ -16,7 +16,7 @@ int64_t timeOf(const struct clock* clock)
 double excessOf(const struct clock* clock)
 {
     const double own = clock->ownPpb * 1e-9;
-    const double ordered = (clock->orderedPpb + clock->slewPpb) * 1e-9;
+    const double ordered = clock->orderedPpb * 1e-9;
     return own + ordered + own * ordered;
 }
 
@@ -45,7 +45,6 @@ static void beginStretch(struct clock* clock)
     const double rootSeconds = sqrt(now->gridNs * 1e-9);
     clock->ownPpb = clock->frequencyPpb + clock->walkedPpb + clock->rampPpb * seconds +
                     clock->whitePpb / rootSeconds * normal(&clock->white);
-    if (clock->file < 0) clock->slewPpb = slewOf(now->gridNs * 1e-9);
     clock->walkedPpb += clock->wanderPpb * rootSeconds * normal(&clock->walk);
     if (clock->periodNs > 0)
         clock->ownPpb += clock->sinePpb * sin(6.283185307179586 * seconds * 1e9 / clock->periodNs);
