@@ -139,13 +139,13 @@ clock,error_ns,ordered_ppb,event
      9.000 s  reference is back after 4 s
 left out of the reference's samples: 0 out of date, 3 not usable
 == no permission | system quirks=p;ptp ptp | --reference phc:ptp --clock realtime --interval 1s
-dravik-host: adjustTime failed with -1: {"message":"cannot set the frequency of CLOCK_REALTIME, which takes CAP_SYS_TIME: Operation not permitted"}
+dravik-host: adjustTime failed with -1: {"message": "cannot set the frequency of CLOCK_REALTIME, which takes CAP_SYS_TIME: Operation not permitted"}
 exit 1
 == an order that is cut | system quirks=c frequency=100ppm;ptp ptp | --reference phc:ptp --clock realtime --interval 1s
-dravik-host: adjustTime failed with -1: {"message":"CLOCK_REALTIME took an offset of -10000 ppb for -99990 ppb"}
+dravik-host: adjustTime failed with -1: {"message": "CLOCK_REALTIME took an offset of -10000 ppb for -99990 ppb"}
 exit 1
 == one that is refused | ptp ptp quirks=r frequency=100ppm | --reference realtime --clock phc:ptp --interval 1s
-dravik-host: adjustTime failed with -1: {"message":"cannot set the frequency of ptp: Numerical result out of range"}
+dravik-host: adjustTime failed with -1: {"message": "cannot set the frequency of ptp: Numerical result out of range"}
 exit 1
 == kept within what it takes | ptp ptp quirks=c frequency=100ppm | --reference realtime --clock phc:ptp --max-frequency-offset 10ppm --interval 1s --duration 3s
      1.000 s  frequency at its limit, -10.000 ppm

@@ -168,8 +168,7 @@ estimated_error_seconds 1.52085498e-05
      0.300 s  stepped by -3.002 ms
      0.450 s  locked, error +0 ns
 == silent at once | shm 2 interval=1s | --reference shm:2 --holdover-after 500ms --remeasure-after 600ms --duration 3s
-     0.500 s  reference is silent: holding the frequency
-     1.000 s  reference is back after 1 s: measuring anew
+     0.500 s  no sample from the reference yet
      1.500 s  reference is silent: holding the frequency
      2.000 s  reference is back after 1 s: measuring anew
      2.500 s  reference is silent: holding the frequency
