@@ -31,5 +31,16 @@ else
     expect "refused" 1 \
         "$(simulated "$EMULATOR" "$bin/dravik-host" doctor 2>&1 | grep -c 'no CAP_SYS_TIME')"
 fi
+
+# Noise is the same bytes again from its seed, and other ones from another.
+noisy() { # SEED
+    simulatedHost "seed $1;system white=1ppb wander=1ppb;ptp ptp noise=50ns outliers=0.1 size=1us" \
+        run --reference phc:ptp --clock realtime --duration 20s --csv - 2> /dev/null
+}
+first=$(noisy 1)
+expect "samples" 160 "$(grep -c ^pair <<< "$first")"
+expect "the same again" "$first" "$(noisy 1)"
+expect "another seed" 1 "$([ "$first" != "$(noisy 2)" ] && echo 1)"
+
 echo "$checks checks, $failures failures"
 exit $((failures > 0))
