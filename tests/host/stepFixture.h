@@ -1,0 +1,50 @@
+#pragma once
+
+#include "loop/tStep.h"
+#include "text/files.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <unistd.h>
+
+namespace dravikHost {
+
+constexpr uint64_t kStartNs = 1'700'000'000'000'000'000;
+
+constexpr int64_t nsOfSeconds(double seconds) { return static_cast<int64_t>(seconds * 1e9); }
+
+inline tPair pairAt(double seconds, int64_t errorNs)
+{
+    const uint64_t referenceNs = kStartNs + static_cast<uint64_t>(nsOfSeconds(seconds));
+    return {nsOfSeconds(seconds), referenceNs, referenceNs + static_cast<uint64_t>(errorNs), {}};
+}
+
+inline tStep stepAt(double seconds, int64_t errorNs, bool locked, double inForcePpb)
+{
+    tStep step;
+    step.pair = pairAt(seconds, errorNs);
+    step.locked = locked;
+    step.inForcePpb = inForcePpb;
+    return step;
+}
+
+// A file that lives as long as the test.
+class tTestFile
+{
+public:
+    explicit tTestFile(const std::string& name)
+        : path(testing::TempDir() + "dravik-" + std::to_string(getpid()) + "-" + name)
+    {}
+    tTestFile(const std::string& name, const std::string& text) : tTestFile(name)
+    {
+        writeText(path, text);
+    }
+    tTestFile(const tTestFile&) = delete;
+    tTestFile& operator=(const tTestFile&) = delete;
+    ~tTestFile() { unlink(path.c_str()); }
+
+    const std::string path;
+};
+
+} // namespace dravikHost
