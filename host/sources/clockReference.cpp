@@ -1,6 +1,5 @@
 #include "sources/iReference.h"
 
-#include "clocks/iClock.h"
 #include "clocks/systemTime.h"
 
 #include <functional>
@@ -15,8 +14,8 @@ namespace {
 class tClockReference : public iReference
 {
 public:
-    tClockReference(int64_t intervalNs, std::function<tCrossReading()> reader)
-        : intervalNs(intervalNs), reader(std::move(reader))
+    tClockReference(int64_t intervalNs, std::function<tCrossReading()> reader, uint64_t (*rawNs)())
+        : intervalNs(intervalNs), reader(std::move(reader)), rawNs(rawNs)
     {}
 
     // A reading that fails is a reference that is silent.
@@ -26,18 +25,19 @@ public:
 private:
     int64_t intervalNs;
     std::function<tCrossReading()> reader;
-    std::optional<int64_t> dueNs; // by CLOCK_MONOTONIC_RAW
+    uint64_t (*rawNs)();
+    std::optional<int64_t> dueNs; // by rawNs
     int64_t failures = 0;
 };
 
 // A machine that slept through several readings leaves them out instead of crowding them.
 std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
 {
-    const auto rawNs = [] { return static_cast<int64_t>(rawTimeNs()); };
-    if (!dueNs) dueNs = rawNs();
-    const int64_t remainingNs = *dueNs - rawNs();
+    const auto nowNs = [this] { return static_cast<int64_t>(rawNs()); };
+    if (!dueNs) dueNs = nowNs();
+    const int64_t remainingNs = *dueNs - nowNs();
     if (remainingNs > 0) nap(remainingNs < atMostNs ? remainingNs : atMostNs);
-    const int64_t lateNs = rawNs() - *dueNs;
+    const int64_t lateNs = nowNs() - *dueNs;
     if (lateNs < 0) return std::nullopt;
     *dueNs += intervalNs * (1 + (lateNs + intervalNs / 2) / intervalNs);
     try {
@@ -51,10 +51,10 @@ std::optional<tReferenceSample> tClockReference::next(int64_t atMostNs)
 
 } // namespace
 
-std::unique_ptr<iReference> clockReference(int64_t intervalNs,
-                                           std::function<tCrossReading()> reader)
+std::unique_ptr<iReference>
+clockReference(int64_t intervalNs, std::function<tCrossReading()> reader, uint64_t (*rawNs)())
 {
-    return std::make_unique<tClockReference>(intervalNs, std::move(reader));
+    return std::make_unique<tClockReference>(intervalNs, std::move(reader), rawNs);
 }
 
 } // namespace dravikHost

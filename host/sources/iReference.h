@@ -1,7 +1,8 @@
 #pragma once
 
-#include "clocks/iClock.h"
+#include "clocks/systemTime.h"
 
+#include <cstddef>
 #include <cstdint>
 #include <functional>
 #include <memory>
@@ -40,10 +41,18 @@ bool isReadOnDemand(const std::string& name);
 std::unique_ptr<iReference> openReference(const std::string& name, int64_t intervalNs);
 
 // The kinds of references, each in the file of its name. Their constructors may throw
-// std::runtime_error.
+// std::runtime_error. The clock is paced by CLOCK_MONOTONIC_RAW.
+constexpr int kNtpSegmentKey = 0x4e545030; // of unit 0, the next units follow
 std::unique_ptr<iReference> clockReference(int64_t intervalNs,
-                                           std::function<tCrossReading()> reader);
-std::unique_ptr<iReference> sharedMemoryReference(int unit);
+                                           std::function<tCrossReading()> reader,
+                                           uint64_t (*rawNs)() = rawTimeNs);
+std::unique_ptr<iReference> sharedMemoryReference(int unit, int firstKey = kNtpSegmentKey);
 std::unique_ptr<iReference> socketReference(const std::string& path);
+
+// The sample that lies in a segment; nothing if it cannot be used. The words are loaded one by one,
+// by their offsets in bytes, as a producer may be at work meanwhile.
+//   wide   the segment has a time_t of 64 bits
+std::optional<tReferenceSample> sampleInSegment(const std::function<uint32_t(size_t)>& word,
+                                                bool wide);
 
 } // namespace dravikHost

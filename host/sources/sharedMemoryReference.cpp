@@ -27,7 +27,7 @@ class tSharedMemoryReference : public iReference
 public:
     // Attaches the segment of that unit, or makes one for the producer to find. Throws
     // std::runtime_error.
-    explicit tSharedMemoryReference(int unit);
+    tSharedMemoryReference(int unit, key_t firstKey);
     tSharedMemoryReference(const tSharedMemoryReference&) = delete;
     tSharedMemoryReference& operator=(const tSharedMemoryReference&) = delete;
     ~tSharedMemoryReference() override;
@@ -37,6 +37,7 @@ public:
 
 private:
     std::optional<tReferenceSample> take();
+    uint32_t* wordAt(size_t offset) const { return reinterpret_cast<uint32_t*>(segment + offset); }
 
     unsigned char* segment = nullptr;
     bool wide = false; // time_t of 64 bits
@@ -60,18 +61,16 @@ constexpr tLayout kWide = {96, 8, 16, 24, 32, 36, 48, 52, 56};
 
 constexpr uint32_t kNotSynchronised = 3; // of leap
 
-// What the other side writes meanwhile is loaded in the order of the calls.
+const tLayout& layoutOf(bool wide) { return wide ? kWide : kNarrow; }
+
+// The times in a segment.
 class tSegmentView
 {
 public:
-    tSegmentView(unsigned char* bytes, bool isWide)
-        : start(bytes), layout(isWide ? kWide : kNarrow), wide(isWide)
+    tSegmentView(const std::function<uint32_t(size_t)>& word, bool isWide)
+        : word(word), layout(layoutOf(isWide)), wide(isWide)
     {}
 
-    uint32_t word(size_t offset) const { return __atomic_load_n(wordAt(offset), __ATOMIC_ACQUIRE); }
-    bool isValid() const { return word(layout.valid) != 0; }
-    void markTaken() const { __atomic_store_n(wordAt(layout.valid), 0U, __ATOMIC_RELEASE); }
-    uint32_t leap() const { return word(layout.leap); }
     std::optional<uint64_t> referenceNs() const
     {
         return timeNs(layout.referenceSeconds, layout.referenceMicroseconds,
@@ -83,8 +82,6 @@ public:
     }
 
 private:
-    uint32_t* wordAt(size_t offset) const { return reinterpret_cast<uint32_t*>(start + offset); }
-
     // A second of 32 bits has no sign: it lasts until 2106. One of 64 is read in halves, which the
     // count of mode 1 keeps together.
     uint64_t seconds(size_t offset) const
@@ -108,40 +105,39 @@ private:
         return whole * kSecondNs + (finer ? nanoseconds : microseconds * 1000);
     }
 
-    unsigned char* start;
+    const std::function<uint32_t(size_t)>& word;
     const tLayout& layout;
     bool wide;
 };
 
-constexpr key_t kKey = 0x4e545030; // of unit 0
-
-[[noreturn]] void fail(int failure, int unit, const char* deed)
+[[noreturn]] void fail(int failure, int unit, key_t key, const char* deed)
 {
-    throw std::system_error(failure, std::generic_category(),
-                            fmt::format("cannot {} the shared memory segment of unit {} ({:#x})",
-                                        deed, unit, kKey + unit));
+    throw std::system_error(
+        failure, std::generic_category(),
+        fmt::format("cannot {} the shared memory segment of unit {} ({:#x})", deed, unit, key));
 }
 
 // One that is there already has the size that its maker gave it. By custom the first two units are
 // for producers of the same user only.
-int openSegment(int unit)
+int openSegment(int unit, key_t key)
 {
     constexpr int kFirstOfAll = 2;
     const int mode = unit < kFirstOfAll ? 0600 : 0666;
-    const int there = shmget(kKey + unit, 0, 0);
+    const int there = shmget(key, 0, 0);
     if (there >= 0) return there;
-    if (errno != ENOENT) fail(errno, unit, "open");
+    if (errno != ENOENT) fail(errno, unit, key, "open");
     const size_t size = sizeof(time_t) > 4 ? kWide.size : kNarrow.size;
-    const int made = shmget(kKey + unit, size, IPC_CREAT | mode);
-    if (made < 0) fail(errno, unit, "make");
+    const int made = shmget(key, size, IPC_CREAT | mode);
+    if (made < 0) fail(errno, unit, key, "make");
     return made;
 }
 
-tSharedMemoryReference::tSharedMemoryReference(int unit)
+tSharedMemoryReference::tSharedMemoryReference(int unit, key_t firstKey)
 {
-    const int id = openSegment(unit);
+    const key_t key = firstKey + unit;
+    const int id = openSegment(unit, key);
     shmid_ds state{};
-    if (shmctl(id, IPC_STAT, &state) != 0) fail(errno, unit, "look at");
+    if (shmctl(id, IPC_STAT, &state) != 0) fail(errno, unit, key, "look at");
     wide = state.shm_segsz == kWide.size;
     if (!wide && state.shm_segsz != kNarrow.size) {
         throw std::runtime_error(
@@ -149,7 +145,8 @@ tSharedMemoryReference::tSharedMemoryReference(int unit)
                         unit, state.shm_segsz, kNarrow.size, kWide.size));
     }
     void* const attached = shmat(id, nullptr, 0);
-    if (attached == reinterpret_cast<void*>(-1)) fail(errno, unit, "attach"); // NOLINT: its failure
+    if (attached == reinterpret_cast<void*>(-1))
+        fail(errno, unit, key, "attach"); // NOLINT: its failure
     segment = static_cast<unsigned char*>(attached);
 }
 
@@ -164,30 +161,42 @@ std::optional<tReferenceSample> tSharedMemoryReference::next(int64_t atMostNs)
     return take();
 }
 
-// In mode 1 a producer that is at work meanwhile shows in the count; in mode 0 it waits for its
-// turn.
+// What the other side writes meanwhile is loaded in the order of the calls.
 std::optional<tReferenceSample> tSharedMemoryReference::take()
 {
-    const tSegmentView view(segment, wide);
-    if (!view.isValid()) return std::nullopt;
-    const uint32_t mode = view.word(kMode);
-    const uint32_t countBefore = view.word(kCount);
-    const auto systemNs = view.systemNs();
-    const auto referenceNs = view.referenceNs();
-    const uint32_t leap = view.leap();
-    const bool undisturbed = mode == 0 || (mode == 1 && view.word(kCount) == countBefore);
-    view.markTaken();
-    if (undisturbed && systemNs && referenceNs && leap != kNotSynchronised)
-        return tReferenceSample{*systemNs, *referenceNs, false};
-    ++unusableCount;
-    return std::nullopt;
+    const auto word = [this](size_t offset) {
+        return __atomic_load_n(wordAt(offset), __ATOMIC_ACQUIRE);
+    };
+    const size_t valid = layoutOf(wide).valid;
+    if (word(valid) == 0) return std::nullopt;
+    const auto sample = sampleInSegment(word, wide);
+    __atomic_store_n(wordAt(valid), 0U, __ATOMIC_RELEASE); // taken
+    if (!sample) ++unusableCount;
+    return sample;
 }
 
 } // namespace
 
-std::unique_ptr<iReference> sharedMemoryReference(int unit)
+// In mode 1 a producer that is at work meanwhile shows in the count; in mode 0 it waits for its
+// turn.
+std::optional<tReferenceSample> sampleInSegment(const std::function<uint32_t(size_t)>& word,
+                                                bool wide)
 {
-    return std::make_unique<tSharedMemoryReference>(unit);
+    const tSegmentView view(word, wide);
+    const uint32_t mode = word(kMode);
+    const uint32_t countBefore = word(kCount);
+    const auto systemNs = view.systemNs();
+    const auto referenceNs = view.referenceNs();
+    const uint32_t leap = word(layoutOf(wide).leap);
+    const bool undisturbed = mode == 0 || (mode == 1 && word(kCount) == countBefore);
+    if (undisturbed && systemNs && referenceNs && leap != kNotSynchronised)
+        return tReferenceSample{*systemNs, *referenceNs, false};
+    return std::nullopt;
+}
+
+std::unique_ptr<iReference> sharedMemoryReference(int unit, int firstKey)
+{
+    return std::make_unique<tSharedMemoryReference>(unit, firstKey);
 }
 
 } // namespace dravikHost

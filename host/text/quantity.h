@@ -42,6 +42,6 @@ inline std::string signedDurationText(int64_t ns)
     return signedDurationText(static_cast<double>(ns));
 }
 std::string offsetText(double offsetPpb);
-std::string secondsText(int64_t ns, int digits);
+std::string secondsText(int64_t ns, int digits); // not negative; cut, not rounded
 
 } // namespace dravikHost

@@ -1,7 +1,13 @@
+#include "support/failureOf.h"
+#include "text/files.h"
+#include "text/json.h"
 #include "text/quantity.h"
+#include "text/words.h"
 
 #include <gtest/gtest.h>
 
+#include <fcntl.h>
+#include <filesystem>
 #include <stdexcept>
 
 using namespace dravikHost;
@@ -14,17 +20,160 @@ struct tQuantityRow {
     double value;
 };
 const tQuantityRow kQuantities[] = {
-    {"125ms", kDuration, 125e6}, {"-12ppm", kFrequency, -12e3}, {"1%", kRatio, 0.01},
-    {"+3us", kDuration, 3e3},    {"2min", kDuration, 120e9},    {"1e-3h", kDuration, 3.6e9},
-    {"0", kFrequency, 0},        {"7ppb", kFrequency, 7},       {"1.5s", kDuration, 1.5e9},
+    {"125ms", kDuration, 125e6},  {"-12ppm", kFrequency, -12e3}, {"1%", kRatio, 0.01},
+    {"+3us", kDuration, 3e3},     {"2min", kDuration, 120e9},    {"1e-3h", kDuration, 3.6e9},
+    {"0", kFrequency, 0},         {"7ppb", kFrequency, 7},       {"1.5s", kDuration, 1.5e9},
+    {"-0.25ns", kDuration, -.25},
+};
+
+struct tRefusedRow {
+    const char* text;
+    const tQuantityKind& kind;
+    const char* why;
+};
+const tRefusedRow kRefused[] = {
+    {"5", kDuration, "'5' has no unit; use ns, us, ms, s, min or h"},
+    {"5ppm", kDuration, "'5ppm' has an unknown unit 'ppm'; use ns, us, ms, s, min or h"},
+    {"5x", kFrequency, "'5x' has an unknown unit 'x'; use ppb or ppm"},
+    {"5", kRatio, "'5' has no unit; use %"},
+    {"1e999s", kDuration, "'1e999s' is out of range"},
+    {"+-1s", kDuration, "'+-1s' does not start with a number"},
+    {"nan", kDuration, "'nan' does not start with a number"},
+    {"inf%", kRatio, "'inf%' does not start with a number"},
+    {"", kDuration, "'' does not start with a number"},
+    {"+", kDuration, "'+' does not start with a number"},
+    {"1,5s", kDuration, "'1,5s' has an unknown unit ',5s'; use ns, us, ms, s, min or h"},
+    {"1 s", kDuration, "'1 s' has an unknown unit ' s'; use ns, us, ms, s, min or h"},
 };
 
 TEST(Quantity, isReadInItsBaseUnit)
 {
     for (const tQuantityRow& row : kQuantities)
         EXPECT_DOUBLE_EQ(row.value, parseQuantity(row.text, row.kind)) << row.text;
-    for (const char* const text : {"", "5", "5ppm", "s", "nan", "1e999s", "+-1s", "1,5s", "1 s"})
-        EXPECT_THROW(parseQuantity(text, kDuration), std::invalid_argument) << text;
+    for (const tRefusedRow& row : kRefused)
+        EXPECT_EQ(row.why, failureOf([&] { parseQuantity(row.text, row.kind); }));
+}
+
+TEST(Quantity, isWrittenForPeople)
+{
+    const struct {
+        double ns;
+        const char *text, *withSign;
+    } kDurations[] = {
+        {0, "0 ns", "+0 ns"},   {-0.5, "-0.5 ns", "-0.5 ns"},  {999.4, "999.4 ns", "+999.4 ns"},
+        {1e3, "1 us", "+1 us"}, {-1500, "-1.5 us", "-1.5 us"}, {1012345, "1.012 ms", "+1.012 ms"},
+        {1e9, "1 s", "+1 s"},   {7200e9, "7200 s", "+7200 s"}, {999999, "1000 us", "+1000 us"},
+        {-1e9, "-1 s", "-1 s"},
+    };
+    for (const auto& row : kDurations) {
+        EXPECT_EQ(row.text, durationText(row.ns));
+        EXPECT_EQ(row.withSign, signedDurationText(row.ns));
+    }
+    EXPECT_EQ("-1.5 us", durationText(int64_t{-1500}));
+    EXPECT_EQ("+2 ms", signedDurationText(int64_t{2'000'000}));
+    EXPECT_EQ("+11.980 ppm", offsetText(11980));
+    EXPECT_EQ("-0.001 ppm", offsetText(-1));
+    EXPECT_EQ("2.125", secondsText(2'125'999'999, 3));
+    EXPECT_EQ("0.000000007", secondsText(7, 9));
+    EXPECT_EQ("1000000000.0", secondsText(1'000'000'000'000'000'000, 1));
+    EXPECT_DOUBLE_EQ(-2.5, secondsOf(-2'500'000'000));
+    EXPECT_DOUBLE_EQ(-2.5e9, nsOf(-2.5));
+}
+
+TEST(Words, areSplitOff)
+{
+    std::string_view lines = "a b\r\n\nc";
+    for (const char* const line : {"a b", "", "c", ""})
+        EXPECT_EQ(line, takeLine(lines));
+    std::string_view words = " \tone  two\tthree ";
+    for (const char* const word : {"one", "two", "three", "", ""})
+        EXPECT_EQ(word, takeWord(words));
+    std::string_view fields = "x,, y,";
+    for (const char* const field : {"x", "", " y", "", ""})
+        EXPECT_EQ(field, takeField(fields));
+    EXPECT_EQ("/dev/ptp0", afterPrefix("phc:/dev/ptp0", "phc:"));
+    for (const char* const other : {"phc:", "shm:2", "a phc:x", ""})
+        EXPECT_FALSE(afterPrefix(other, "phc:")) << other;
+}
+
+TEST(Words, areNumbersAsAWhole)
+{
+    EXPECT_EQ(5, numberIn<int32_t>("+5"));
+    EXPECT_EQ(-2147483648, numberIn<int32_t>("-2147483648"));
+    EXPECT_EQ(-1.5e3, numberIn<double>("-1.5e3"));
+    for (const char* const text : {"", "+", "+-5", "5 ", " 5", "5x", "2147483648"})
+        EXPECT_FALSE(numberIn<int32_t>(text)) << text;
+
+    EXPECT_EQ(12'000'000'000, secondsIn("12"));
+    EXPECT_EQ(1'050'000'000, secondsIn("1.05"));
+    EXPECT_EQ(7, secondsIn("0.000000007"));
+    EXPECT_EQ(2'000'000'000'999'999'999, secondsIn("2000000000.999999999"));
+    for (const char* const text :
+         {"", ".5", "1.", "-1", "1.-5", "2000000001", "1.0000000001", "1.5s"})
+        EXPECT_FALSE(secondsIn(text)) << text;
+}
+
+TEST(Json, isWrittenMemberByMember)
+{
+    tJsonObject object;
+    object.add("a\"b", 0.1).add("none", std::nullopt).add("some", std::optional<double>(-2e-9));
+    object.add("text", jsonQuoted("one\ntwo"));
+    EXPECT_EQ(R"({"a\"b": 0.1, "none": null, "some": -2e-09, "text": "one\ntwo"})", object.line());
+    EXPECT_EQ("{\n  \"a\": 1,\n  \"b\": 2\n}\n", tJsonObject().add("a", 1).add("b", 2).lines());
+    EXPECT_EQ(R"({"a":[1,null]})", jsonText(parseJson(" { \"a\" : [1, null]}").get()));
+    EXPECT_EQ(nullptr, parseJson("{"));
+}
+
+class Files : public testing::Test
+{
+protected:
+    Files() : folder(testing::TempDir() + "dravik_files." + std::to_string(getpid()))
+    {
+        std::filesystem::create_directory(folder);
+    }
+    ~Files() override { std::filesystem::remove_all(folder); }
+
+    std::string folder;
+};
+
+TEST_F(Files, areWrittenAndReplacedAsAWhole)
+{
+    const std::string path = folder + "/text";
+    const std::string longText(10'000, 'x');
+    writeText(path, longText);
+    EXPECT_EQ(longText, readText(path));
+
+    const tFile reader(std::fopen(path.c_str(), "re"));
+    replaceText(path, "new");
+    EXPECT_EQ("new", readText(path));
+    EXPECT_EQ(longText, readToEnd(reader.get(), "reader")); // who reads meanwhile has the old one
+    EXPECT_FALSE(std::filesystem::exists(path + ".new"));
+}
+
+TEST_F(Files, nameWhatFailsAndWhy)
+{
+    const std::string gone = folder + "/no/file";
+    EXPECT_EQ("cannot read " + gone + ": No such file or directory",
+              failureOf([&] { readText(gone); }));
+    EXPECT_EQ("cannot read " + folder + ": Is a directory", failureOf([&] { readText(folder); }));
+    EXPECT_EQ("cannot write " + gone + ": No such file or directory",
+              failureOf([&] { writeText(gone, ""); }));
+    std::filesystem::create_directory(folder + "/folder");
+    EXPECT_EQ("cannot write " + folder + "/folder: Is a directory",
+              failureOf([&] { replaceText(folder + "/folder", ""); }));
+    for (const size_t size : {size_t{1}, size_t{1'000'000}}) // when flushed, and when written
+        EXPECT_EQ("cannot write /dev/full: No space left on device",
+                  failureOf([&] { writeText("/dev/full", std::string(size, 'x')); }));
+}
+
+TEST_F(Files, areClosedWithTheirScope)
+{
+    const int fd = open(folder.c_str(), O_RDONLY | O_CLOEXEC);
+    {
+        const tDescriptor owner(fd);
+        EXPECT_EQ(fd, owner.get());
+    }
+    EXPECT_EQ(-1, fcntl(fd, F_GETFD));
 }
 
 } // namespace

@@ -1,0 +1,306 @@
+#include "clocks/openClock.h"
+#include "clocks/systemTime.h"
+#include "clocks/tGuardedClock.h"
+#include "clocks/tKernelClock.h"
+#include "clocks/tRecordedClock.h"
+#include "clocks/tSoftClock.h"
+#include "clocks/tSteeredClock.h"
+#include "support/failureOf.h"
+
+#include <gtest/gtest.h>
+
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+#include <vector>
+
+using namespace dravikHost;
+
+namespace {
+
+// What the program asks of the kernel's clocks, in place of the kernel.
+struct tKernel {
+    std::vector<timex> requests;
+    long frequency = 0; // in force
+    long highest = 32'768'000;
+    int failure = 0;
+};
+tKernel kernel;
+
+} // namespace
+
+// The C library's own one is never reached: no clock of the machine is touched here.
+extern "C" int clock_adjtime(clockid_t /*id*/, timex* request) noexcept
+{
+    kernel.requests.push_back(*request);
+    if (kernel.failure != 0) {
+        errno = kernel.failure;
+        return -1;
+    }
+    if ((request->modes & ADJ_FREQUENCY) != 0)
+        kernel.frequency = std::min(request->freq, kernel.highest);
+    request->freq = kernel.frequency;
+    request->tolerance = kernel.highest;
+    return 0;
+}
+
+namespace {
+
+constexpr uint64_t kStart = 1'700'000'000'000'000'000;
+constexpr int64_t kSecond = 1'000'000'000;
+
+TEST(SteeredClock, passesWhatOscillatorAndOrderSay)
+{
+    const struct {
+        double oscillatorPpb;
+        int32_t orderedPpb;
+        double aheadNs; // after ten seconds
+        uint64_t shownNs;
+    } kRows[] = {
+        {0, 0, 0, 10'000'000'000},
+        {120, 0, 1200, 10'000'001'200},
+        {0, 120, 1200, 10'000'001'200},
+        {0, -7, -70, 9'999'999'930},
+        {-7, 5, -20, 9'999'999'980},
+        {-0.25, 0, -2.5, 9'999'999'997}, // cut downwards
+        {1e8, 100'000'000, 2.1e9, 12'100'000'000},
+        {-1e9, 100'000'000, -1e10, 0},
+    };
+    for (const auto& row : kRows) {
+        tSteeredClock clock(kStart, row.oscillatorPpb, 200'000'000);
+        clock.setOffsetPpb(row.orderedPpb);
+        clock.pass(10 * kSecond);
+        EXPECT_NEAR(row.aheadNs, clock.aheadOfNs(kStart + 10 * kSecond), 1e-5);
+        EXPECT_NEAR(row.shownNs, clock.timeNs() - kStart, 1) << row.aheadNs;
+    }
+}
+
+TEST(SteeredClock, keepsItsFractionsOverYears)
+{
+    tSteeredClock clock(kStart, 1e-4, 0);
+    const int64_t hourNs = 3600 * kSecond + 1;
+    for (int hour = 0; hour < 87'600; ++hour)
+        clock.pass(hourNs);
+    EXPECT_NEAR(31'536, clock.aheadOfNs(kStart + uint64_t{87'600} * hourNs), 1e-4);
+}
+
+TEST(SteeredClock, isSteppedAndKeepsToItsLimits)
+{
+    tSteeredClock clock(kStart, 0, 500);
+    clock.step(-3);
+    EXPECT_EQ(kStart - 3, clock.timeNs());
+    clock.step(5);
+    EXPECT_EQ(kStart + 2, clock.timeNs());
+    for (const int32_t offsetPpb : {500, -500}) {
+        clock.setOffsetPpb(offsetPpb);
+        EXPECT_THROW(clock.setOffsetPpb(501), std::out_of_range);
+        EXPECT_THROW(clock.setOffsetPpb(-501), std::out_of_range);
+        EXPECT_EQ(offsetPpb, clock.offsetPpb());
+    }
+    EXPECT_EQ(500, clock.maxOffsetPpb());
+    EXPECT_EQ(-500, clock.minOffsetPpb());
+}
+
+TEST(SimulatedClock, isAsNoisyAsItsModelSays)
+{
+    const struct {
+        tOscillatorModel model;
+        double phase, wander; // ns per first and ns/s per second number, in four seconds
+    } kRows[] = {{{}, 0, 0}, {{0, 10, 0}, 20, 0}, {{0, 0, 5}, 0, 10}};
+    for (const auto& row : kRows) {
+        tNoise noise(3);
+        tNoise same(3);
+        tSimulatedClock clock(kStart, row.model, 1000, noise);
+        clock.advance(4 * kSecond);
+        const double phaseNs = row.phase * same.normal();
+        const double wanderPpb = row.wander * same.normal();
+        EXPECT_NEAR(phaseNs, clock.aheadOfNs(kStart + 4 * kSecond), 1e-6);
+        const double before = clock.aheadOfNs(kStart + 4 * kSecond);
+        clock.advance(kSecond);
+        const double whiteNs = row.phase / 2 * same.normal();
+        EXPECT_NEAR(before + whiteNs + wanderPpb, clock.aheadOfNs(kStart + 5 * kSecond), 1e-6);
+        same.normal();
+        EXPECT_EQ(same.normal(), noise.normal()); // as many numbers at every level
+    }
+}
+
+TEST(RecordedClock, showsWhatWasRecorded)
+{
+    tRecordedClock clock(100);
+    clock.showTime(kStart);
+    clock.step(5);
+    EXPECT_EQ(kStart, clock.timeNs());
+    const struct {
+        double recordedPpb;
+        int32_t shownPpb;
+    } kRows[] = {{12.5, 13}, {-0.4, 0}, {1e12, 100}, {-1e12, -100}};
+    for (const auto& row : kRows) {
+        clock.showOffset(row.recordedPpb);
+        EXPECT_EQ(row.shownPpb, clock.offsetPpb());
+    }
+    clock.setOffsetPpb(7);
+    EXPECT_EQ(7, clock.offsetPpb());
+    EXPECT_EQ(100, clock.maxOffsetPpb());
+    EXPECT_EQ(-100, clock.minOffsetPpb());
+}
+
+TEST(GuardedClock, asksItsGuardAndHoldsBackInADryRun)
+{
+    for (const bool dryRun : {false, true}) {
+        tSteeredClock clock(kStart, 0, 500);
+        const auto guard = [](int64_t deltaNs) {
+            if (deltaNs == 13) throw std::runtime_error("refused");
+        };
+        tGuardedClock guarded(clock, guard, dryRun);
+        EXPECT_THROW(guarded.step(13), std::runtime_error);
+        guarded.step(10);
+        guarded.setOffsetPpb(20);
+        EXPECT_EQ(kStart + (dryRun ? 0 : 10), clock.timeNs());
+        EXPECT_EQ(dryRun ? 0 : 20, clock.offsetPpb());
+        EXPECT_EQ(clock.timeNs(), guarded.timeNs());
+        EXPECT_EQ(clock.offsetPpb(), guarded.offsetPpb());
+        EXPECT_EQ(500, guarded.maxOffsetPpb());
+        EXPECT_EQ(-500, guarded.minOffsetPpb());
+    }
+}
+
+// An oscillator that is slow by everything stands still, whatever time passes.
+TEST(SoftClock, passesTheTimeOfItsOscillator)
+{
+    tSoftClock still(kStart, -1e9, 500);
+    still.step(-4);
+    EXPECT_EQ(kStart - 4, still.timeNs());
+    const uint64_t beforeNs = systemTimeNs(CLOCK_REALTIME);
+    const tCrossReading reading = still.crossRead();
+    EXPECT_GE(reading.systemNs, beforeNs);
+    EXPECT_LE(reading.systemNs, systemTimeNs(CLOCK_REALTIME));
+    EXPECT_EQ(kStart - 4, reading.clockNs);
+    EXPECT_THROW(still.setOffsetPpb(501), std::out_of_range);
+    EXPECT_EQ(500, still.maxOffsetPpb());
+    EXPECT_EQ(-500, still.minOffsetPpb());
+}
+
+TEST(SoftClock, ranAtTheOldRateUntilItIsOrderedAnother)
+{
+    constexpr uint64_t kPassedNs = 1'000'000;
+    tSoftClock clock(kStart, 0, 1'000'000'000);
+    const uint64_t rawNs = rawTimeNs();
+    while (rawTimeNs() - rawNs < kPassedNs) {
+    }
+    clock.setOffsetPpb(-1'000'000'000); // which stops it
+    EXPECT_EQ(-1'000'000'000, clock.offsetPpb());
+    const uint64_t stoppedNs = clock.timeNs();
+    EXPECT_GE(stoppedNs, kStart + kPassedNs);
+    EXPECT_EQ(stoppedNs, clock.timeNs());
+}
+
+TEST(SystemTime, ofOneClockIsTheMiddleOfAWindow)
+{
+    const uint64_t beforeNs = rawTimeNs();
+    const tCrossReading reading = crossReadSystem(CLOCK_MONOTONIC_RAW);
+    const uint64_t afterNs = rawTimeNs();
+    EXPECT_GE(reading.clockNs - reading.windowNs / 2, beforeNs);
+    EXPECT_LE(reading.clockNs + reading.windowNs / 2, afterNs);
+    const tCrossReading itself = readSystemItself();
+    EXPECT_EQ(itself.systemNs, itself.clockNs);
+    EXPECT_EQ(0U, itself.windowNs);
+    EXPECT_THROW(systemTimeNs(1000), std::system_error);
+}
+
+TEST(KernelFrequency, givesBackWhatWasSet)
+{
+    const struct {
+        int32_t ppb;
+        long units;
+    } kRows[] = {{0, 0}, {1, 66}, {-1, -66}, {500'000, 32'768'000}, {-100'000, -6'553'600}};
+    for (const auto& row : kRows)
+        EXPECT_EQ(row.units, kernelFrequency(row.ppb)) << row.ppb;
+    EXPECT_EQ(1, ppbOfKernelFrequency(33));
+    EXPECT_EQ(0, ppbOfKernelFrequency(-32));
+    for (const int32_t ppb : {1, 2, 3, 7, 499'999, 999'999, 32'767'998, 2'147'483'647}) {
+        if (sizeof(long) == 4 && ppb > 32'767'999) continue;
+        EXPECT_EQ(ppb, ppbOfKernelFrequency(kernelFrequency(ppb)));
+        EXPECT_EQ(-ppb, ppbOfKernelFrequency(kernelFrequency(-ppb)));
+    }
+}
+
+class KernelClock : public testing::Test
+{
+protected:
+    KernelClock() { kernel = tKernel(); }
+
+    tKernelClock clock{CLOCK_REALTIME, "the clock", 600'000, readSystemItself};
+};
+
+TEST_F(KernelClock, isSteppedBySecondsAndNanoseconds)
+{
+    const struct {
+        int64_t deltaNs;
+        long seconds, nanoseconds;
+    } kRows[] = {{0, 0, 0},
+                 {1, 0, 1},
+                 {-1, -1, 999'999'999},
+                 {-kSecond, -1, 0},
+                 {2'500'000'000, 2, 500'000'000},
+                 {-2'500'000'000, -3, 500'000'000}};
+    for (const auto& row : kRows) {
+        clock.step(row.deltaNs);
+        const timex& request = kernel.requests.back();
+        EXPECT_EQ(unsigned{ADJ_SETOFFSET | ADJ_NANO}, request.modes);
+        EXPECT_EQ(row.seconds, request.time.tv_sec) << row.deltaNs;
+        EXPECT_EQ(row.nanoseconds, request.time.tv_usec) << row.deltaNs;
+    }
+}
+
+TEST_F(KernelClock, refusesAnOffsetThatIsNotTaken)
+{
+    clock.setOffsetPpb(-500'000);
+    EXPECT_EQ(unsigned{ADJ_FREQUENCY}, kernel.requests[0].modes);
+    EXPECT_EQ(-32'768'000, kernel.frequency);
+    EXPECT_EQ(-500'000, clock.offsetPpb());
+    EXPECT_EQ(0U, kernel.requests.back().modes); // only looked at
+    EXPECT_THROW(clock.setOffsetPpb(500'001), std::out_of_range);
+    EXPECT_EQ(600'000, clock.maxOffsetPpb());
+    EXPECT_EQ(-600'000, clock.minOffsetPpb());
+}
+
+TEST_F(KernelClock, saysWhatItLacks)
+{
+    const struct {
+        clockid_t id;
+        int failure;
+        const char* text;
+    } kRows[] = {
+        {CLOCK_REALTIME, EPERM,
+         "cannot step it, which takes CAP_SYS_TIME: Operation not permitted"},
+        {-5, EPERM, "cannot step it: Operation not permitted"},
+        {CLOCK_REALTIME, EINVAL, "cannot step it: Invalid argument"},
+    };
+    for (const auto& row : kRows) {
+        kernel.failure = row.failure;
+        tKernelClock failing(row.id, "it", 1, readSystemItself);
+        EXPECT_EQ(row.text, failureOf([&] { failing.step(1); }));
+    }
+    EXPECT_THROW(openClock({"realtime", 1}), std::system_error);
+}
+
+TEST_F(KernelClock, isOpenedByName)
+{
+    for (const char* const name : {"soft", "realtime", "phc:/dev/ptp0"})
+        EXPECT_TRUE(isClockName(name)) << name;
+    for (const char* const name : {"", "phc:", "Soft", "realtime2", "monotonic"})
+        EXPECT_FALSE(isClockName(name)) << name;
+    EXPECT_EQ(500'000, openClock({"realtime", 600'000})->maxOffsetPpb()); // the kernel's
+    EXPECT_EQ(400'000, openClock({"realtime", 400'000})->maxOffsetPpb());
+    EXPECT_THROW(openClock({"phc:/no/device", 1}), std::system_error);
+    EXPECT_THROW(openClock({"phc:/dev/null", 1}), std::system_error);
+
+    const uint64_t beforeNs = systemTimeNs(CLOCK_REALTIME);
+    const auto soft = openClock({"soft", 700, -3600 * kSecond, -1e9});
+    EXPECT_GE(soft->timeNs() + 3600 * kSecond, beforeNs);
+    EXPECT_LE(soft->timeNs() + 3600 * kSecond, systemTimeNs(CLOCK_REALTIME));
+    EXPECT_EQ(soft->timeNs(), soft->timeNs()); // slow by all of it
+    EXPECT_EQ(700, soft->maxOffsetPpb());
+}
+
+} // namespace

@@ -1,0 +1,94 @@
+#include "maths/median.h"
+#include "maths/patternSearch.h"
+#include "maths/tKalmanFilter.h"
+#include "maths/tNoise.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+using namespace dravikHost;
+
+namespace {
+
+// The ten thousandth number of this generator from this seed is fixed: 9981545732273789042.
+TEST(Noise, isTheSameEverywhere)
+{
+    tNoise noise(5489);
+    for (int i = 0; i < 9999; ++i)
+        noise.uniform();
+    EXPECT_EQ(std::ldexp(9981545732273789042U >> 11U, -53), noise.uniform());
+
+    tNoise normal(1);
+    for (const double value : {-0x1.42c3b2b72217p-5, -0x1.8c1da014dda08p-2, -0x1.fdd85e535a47ap-3,
+                               0x1.5fa75918ca312p-1, -0x1.bfaac17196979p-5, -0x1.971d689089fdcp-1})
+        EXPECT_EQ(value, normal.normal());
+}
+
+TEST(KalmanFilter, doesWhatIsWorkedOutByHand)
+{
+    tKalmanFilter filter{1, 3, {1, 0.5, 0.25}};
+    filter.predict(2, {0.1, 0.2, 0.3});
+    EXPECT_DOUBLE_EQ(7, filter.phase);
+    EXPECT_DOUBLE_EQ(4.1, filter.covariance.xx);
+    EXPECT_DOUBLE_EQ(1.2, filter.covariance.xy);
+    EXPECT_DOUBLE_EQ(0.55, filter.covariance.yy);
+
+    const tKalmanFilter::tGains gains = filter.update(2, 0.9);
+    EXPECT_DOUBLE_EQ(0.82, gains.phase);
+    EXPECT_DOUBLE_EQ(0.24, gains.frequency);
+    EXPECT_DOUBLE_EQ(8.64, filter.phase);
+    EXPECT_DOUBLE_EQ(3.48, filter.frequency);
+    EXPECT_NEAR(0.738, filter.covariance.xx, 1e-15);
+    EXPECT_NEAR(0.216, filter.covariance.xy, 1e-15);
+    EXPECT_NEAR(0.262, filter.covariance.yy, 1e-15);
+
+    const tCovariance added = disturbance(2, 3, 2);
+    EXPECT_DOUBLE_EQ(32, added.xx);
+    EXPECT_DOUBLE_EQ(18, added.xy);
+    EXPECT_DOUBLE_EQ(18, added.yy);
+}
+
+// Nothing known before and nothing added: the n-th gains are those of a straight line through n
+// points, 2 (2n - 1) / (n (n + 1)) and 6 / (n (n + 1) T).
+TEST(KalmanFilter, drawsTheStraightLineThroughAllPoints)
+{
+    constexpr double kSeconds = 4;
+    tKalmanFilter filter{0, 0, {1e9, 0, 1e9}};
+    for (int n = 1; n <= 20; ++n) {
+        if (n > 1) filter.predict(kSeconds, {});
+        const double measured = 5 - 2 * kSeconds * (n - 1);
+        const auto gains = filter.update(measured - filter.phase, 1);
+        if (n == 1) continue;
+        const double square = n * (n + 1.0);
+        EXPECT_NEAR(2 * (2 * n - 1) / square, gains.phase, 1e-5) << n;
+        EXPECT_NEAR(6 / (square * kSeconds), gains.frequency, 1e-5) << n;
+        EXPECT_NEAR(-2, filter.frequency, 1e-5) << n;
+    }
+}
+
+TEST(Median, isTheUpperOfTheMiddle)
+{
+    EXPECT_EQ(2, median<int>({3, 1, 2}));
+    EXPECT_EQ(3, median<int>({4, 1, 3, 2}));
+    EXPECT_EQ(0.5, median<double>({0.5}));
+}
+
+TEST(PatternSearch, goesDownhillUntilItsStepsAreSpent)
+{
+    const auto bowl = [](const std::vector<double>& at) {
+        return at[0] > 5 ? std::nan("") : std::hypot(at[0] - 3, 2 * (at[1] + 0.75)) + 0.5;
+    };
+    const struct {
+        int halvings;
+        double x, y;
+    } kRows[] = {{0, 4, -1}, {1, 4, -1}, {2, 3, -0.75}};
+    for (const auto& row : kRows) {
+        std::vector<double> place = {0, 0};
+        const double least = patternSearch(bowl, place, {4, 1}, row.halvings);
+        EXPECT_EQ(std::vector<double>({row.x, row.y}), place) << row.halvings;
+        EXPECT_EQ(bowl(place), least);
+    }
+}
+
+} // namespace

@@ -1,0 +1,279 @@
+#include "clocks/tSteeredClock.h"
+#include "servo/configDocument.h"
+#include "servo/tLockObserver.h"
+#include "servo/tServoHost.h"
+#include "servo/tServoParameters.h"
+#include "servo/tStatus.h"
+#include "servo/tuning.h"
+#include "support/failureOf.h"
+#include "text/files.h"
+#include "text/json.h"
+
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <map>
+#include <stdexcept>
+
+using namespace dravikHost;
+
+namespace {
+
+// What the plug-in did for one pair: s sets an offset inside the limits, u one just inside the
+// upper limit, U and L set the upper and the lower one, j steps, b steps and sets, - does nothing.
+const std::map<char, tHostCalls> kDeeds = {
+    {'s', {{kGetTime, 5}, {kSetFrequency, 0}}},
+    {'u', {{kSetFrequency, 199}}},
+    {'l', {{kSetFrequency, -99}}},
+    {'U', {{kSetFrequency, 200}}},
+    {'L', {{kSetFrequency, -100}}},
+    {'j', {{kGetTime, 5}, {kStepTime, 5}}},
+    {'b', {{kStepTime, 5}, {kSetFrequency, 0}}},
+    {'-', {{kGetTime, 5}}},
+};
+
+// Events by a letter each: nothing new (.), Measured, At the limit, Stepped, Not stepped, Gained,
+// missed (X), Lost.
+TEST(LockObserver, infersTheStateFromTheCalls)
+{
+    constexpr const char* kLetters = ".MASNGXL";
+    const struct {
+        const char *deeds, *events, *states; // - measuring, = between, + locked
+    } kRows[] = {
+        {"-sjss-ss", ".MSG.LMG", "-==++-=+"}, // by a step
+        {"s-s--", "MNGL.", "==+--"},          // near enough without
+        {"sj-", "MSX", "==-"},                // too far off after the step
+        {"s--", "MNX", "==-"},                // and without one
+        {"u-s", "MNG", "==+"},                // just inside the limits
+        {"l-s", "MNG", "==+"},                //
+        {"U-L-", "A.A.", "----"},             // measured over and over
+        {"UL", "AG", "-+"},                   // two pairs in a row that set it are phase lock
+        {"ss", "MG", "=+"},                   //
+        {"Ujs", "ASG", "-=+"},                // a step is always a snap
+        {"sjsjs", "MSGSG", "==+=+"},          // out of the lock, too
+        {"sjU", "MSG", "==+"},                // limits count only while it measures
+        {"bbb", "MG.", "=++"},                // what is set counts more than a step
+        {"srs-rs", "M.MN.M", "=-==-="},       // r: the plug-in's history is cleared
+        {"sjsrUU", "MSG.AG", "==+--+"},       //
+    };
+    for (const auto& row : kRows) {
+        tLockObserver observer(-100, 200);
+        std::string events;
+        std::string states;
+        for (const char* deed = row.deeds; *deed != '\0'; ++deed) {
+            if (*deed == 'r') observer.restart();
+            events += *deed == 'r' ? '.' : kLetters[observer.observe(kDeeds.at(*deed))];
+            states += observer.locked() ? '+' : observer.measuring() ? '-' : '=';
+        }
+        EXPECT_EQ(row.events, events) << row.deeds;
+        EXPECT_EQ(row.states, states) << row.deeds;
+    }
+}
+
+class ServoHost : public testing::Test
+{
+protected:
+    ServoHost() : folder(testing::TempDir() + "dravik_servo." + std::to_string(getpid()))
+    {
+        std::filesystem::create_directory(folder);
+    }
+    ~ServoHost() override { std::filesystem::remove_all(folder); }
+
+    std::string file(const std::string& text) const
+    {
+        writeText(folder + "/file", text);
+        return folder + "/file";
+    }
+
+    std::string folder;
+    tServoLibrary library{tServoLibrary::find("")};
+    tSteeredClock clock{1'000'000'000'000, 0, 100'000};
+};
+
+std::string told(const tHostCalls& calls)
+{
+    std::string text;
+    for (const tHostCall& call : calls)
+        text += std::string(kHostOperationNames[call.operation]) + " " +
+                std::to_string(call.value) + "; ";
+    return text;
+}
+
+TEST_F(ServoHost, notesWhatThePlugInDoesToTheClock)
+{
+    tServoHost host(library, clock);
+    const struct {
+        uint64_t referenceNs, clockNs;
+        const char* calls;
+    } kPairs[] = {
+        {10'000'000'000, 13'000'000'000, ""},
+        {11'000'000'000, 14'000'002'000, "getFrequency 0; setFrequency -2000; "},
+        {12'000'000'000, 15'000'000'000, "stepTime -3000000000; "},
+    };
+    for (const auto& pair : kPairs) {
+        host.adjustTime(pair.referenceNs, pair.clockNs);
+        EXPECT_EQ(pair.calls, told(host.calls()));
+    }
+    host.clearHistory();
+    host.adjustTime(20'000'000'000, 20'000'000'000);
+    EXPECT_EQ(nullptr, findCall(host.calls(), kSetFrequency));
+}
+
+// A clock whose orders fail, and that may work for another servo meanwhile.
+class tBusyClock : public tSteeredClock
+{
+public:
+    tBusyClock() : tSteeredClock(0, 0, 100'000) {}
+
+    void setOffsetPpb(int32_t offsetPpb) override
+    {
+        if (other != nullptr) other->adjustTime(1, 1);
+        if (broken) throw std::runtime_error("a \"loose\" wire");
+        tSteeredClock::setOffsetPpb(offsetPpb);
+    }
+    void step(int64_t /*deltaNs*/) override { throw 1; }
+
+    tServoHost* other = nullptr;
+    bool broken = false;
+};
+
+TEST_F(ServoHost, passesOnWhyTheClockFailed)
+{
+    tBusyClock busy;
+    tServoHost other(library, clock);
+    tServoHost host(library, busy);
+    host.adjustTime(1'000'000'000, 1'000'000'000);
+    busy.broken = true;
+    EXPECT_EQ("adjustTime failed with -1: {\"message\": \"a \\\"loose\\\" wire\"}",
+              failureOf([&] { host.adjustTime(2'000'000'000, 2'000'000'100); }));
+    EXPECT_EQ("getFrequency 0; ", told(host.calls()));
+    busy.broken = false;
+    busy.other = &other;
+    host.adjustTime(3'000'000'000, 3'000'000'100);
+    EXPECT_EQ("getFrequency 0; setFrequency -50; ", told(host.calls()));
+    EXPECT_EQ("", told(other.calls()));
+    EXPECT_EQ("adjustTime failed with -1: {\"message\": \"unknown failure of the clock\"}",
+              failureOf([&] { host.adjustTime(4'000'000'000, 5'000'000'000); }));
+}
+
+TEST_F(ServoHost, saysWhyADocumentIsRefused)
+{
+    const struct {
+        const char *document, *why;
+    } kRows[] = {
+        {"{\n\"phaseLockGain\": }", "it is not JSON, as of line 2"},
+        {R"({"snapTimeThreshold": 20, "phaseLockGain": 1})",
+         "snapTimeThreshold is 20, not within 1e-8 to 10 s; applied before it: phaseLockGain"},
+        {R"({"phaseLockGain": "x", "frequencyLockGain": 1, "phaseLockCoefficientA": 1})",
+         "phaseLockGain is \"x\", which is not a number; applied before it: frequencyLockGain"},
+        {R"({"PHASELOCKGAIN": 0})",
+         "phaseLockGain is 0, not within 1e-9 to 10; applied before it: nothing"},
+        {R"({"spikeFilterHistorySize": null, "snapTimeThreshold": 1})",
+         "spikeFilterHistorySize is null, which is not a number; applied before it: "
+         "snapTimeThreshold"},
+        {R"({"spikeFilterHistorySize": 1, "spikeFilterEnabled": 1, "phaseLockGain": 1})",
+         "spikeFilterHistorySize is 1, not within 2 to 100 pairs; applied before it: "
+         "phaseLockGain, "
+         "spikeFilterEnabled"},
+    };
+    tServoHost host(library, clock);
+    for (const auto& row : kRows)
+        EXPECT_EQ(std::string("refused with -52005: ") + row.why,
+                  failureOf([&] { host.writeConfig(row.document); }));
+    EXPECT_EQ(R"({"file": "elsewhere"})", refusalText("{}", R"({"file": "elsewhere"})"));
+}
+
+TEST(DocumentNotes, nameWhatIsOtherwiseThanItLooks)
+{
+    const struct {
+        const char* document;
+        std::vector<std::string> notes;
+    } kRows[] = {
+        {R"({"phaseLockGain": 1, "spikeFilterEnabled": 1, "SPIKEFILTERHISTORYSIZE": 7} )", {}},
+        {"[1]", {"it is not a JSON object, so it sets nothing"}},
+        {R"({"phaseLokGain": 1, "gain": 2})",
+         {"phaseLokGain is not a key and sets nothing; did you mean phaseLockGain?",
+          "gain is not a key and sets nothing"}},
+        {R"({"phaseLockGain": 1, "PhaseLockGain": 2})",
+         {"phaseLockGain stands there twice, and the first one counts"}},
+        {R"({"spikeFilterHistorySize": 7.9, "spikeFilterEnabled": 2})",
+         {"spikeFilterHistorySize is 7.9 and read as 7",
+          "spikeFilterEnabled is 2 and read as off"}},
+        {R"({"spikeFilterEnabled": 1.5} more)",
+         {"spikeFilterEnabled is 1.5 and read as 1, on",
+          "what stands behind the object sets nothing"}},
+    };
+    for (const auto& row : kRows)
+        EXPECT_EQ(row.notes, documentNotes(row.document)) << row.document;
+}
+
+TEST_F(ServoHost, readsBackItsParameters)
+{
+    tServoHost host(library, clock);
+    tServoParameters parameters;
+    EXPECT_EQ(parameters.documentText(), tServoParameters::of(host.readConfig()).documentText());
+
+    parameters.phaseLockGain = 0.123456789;
+    parameters.phaseLockCoefficientA = 1.00000012345678;
+    parameters.spikeFilterEnabled = 1;
+    host.writeConfig(parameters.documentText());
+    const tServoParameters inForce = tServoParameters::of(host.readConfig());
+    EXPECT_EQ(0.123457, inForce.phaseLockGain);
+    EXPECT_EQ(1.00000012346, inForce.phaseLockCoefficientA);
+    EXPECT_EQ(1, inForce.spikeFilterEnabled);
+    EXPECT_EQ(3, inForce.spikeFilterGrowthFactor);
+    EXPECT_EQ("the plug-in's document has no frequencyLockGain",
+              failureOf([] { tServoParameters::of(R"({"frequencyLockGain": "1"})"); }));
+    EXPECT_EQ(100, withinBounds(zvckmservo_kSpikeFilterHistorySize, 1e3));
+    EXPECT_EQ(-10, withinBounds(zvckmservo_kPhaseLockCoefficientC, -11));
+}
+
+TEST_F(ServoHost, isTunedByFiles)
+{
+    tServoHost host(library, clock);
+    tune(host, {});
+    const std::string path = file(R"({"phaseLockGain": 0.25})");
+    tune(host, {{}, "none that is known", path});
+    EXPECT_EQ(0.25, tServoParameters::of(host.readConfig()).phaseLockGain);
+    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, path));
+    EXPECT_EQ(0U, failureOf([&] {
+                      tune(host, {file("{"), {}, {}});
+                  }).find(path + ": applyMetaData failed with -52005: "));
+    EXPECT_EQ(path + ": refused with -52005: it is not JSON, as of line 1", failureOf([&] {
+                  tune(host, {{}, {}, file("{")});
+              }));
+}
+
+TEST(ServoLibrary, isThePlugInOrNothing)
+{
+    EXPECT_EQ("asked", tServoLibrary::find("asked"));
+    EXPECT_EQ("libc.so.6 is not the plug-in: it has no zvckmservo_initialize",
+              failureOf([] { tServoLibrary("libc.so.6"); }));
+    EXPECT_EQ(0U,
+              failureOf([] { tServoLibrary("/no/library"); }).find("cannot load the plug-in: "));
+}
+
+TEST(Status, keepsTheFirstFailure)
+{
+    tStatus status;
+    EXPECT_EQ("no details", status.details());
+    status.check("nothing");
+    const std::string reason(300, 'x');
+    setFailure(&status, -7, reason.c_str());
+    setFailure(&status, -8, "later");
+    EXPECT_EQ("it failed with -7: {\"message\": \"" + reason + "\"}",
+              failureOf([&] { status.check("it"); }));
+}
+
+TEST(Status, growsByTheRulesOfThePlugIn)
+{
+    tStatus status;
+    for (const uint32_t size : {2U, 10U, 5U})
+        ASSERT_TRUE(status.reallocJson(&status, size));
+    EXPECT_EQ(std::string("{}\0\0\0\0\0\0\0J", 10), std::string(status.json, status.capacity));
+    ASSERT_TRUE(status.reallocJson(&status, 0));
+    EXPECT_EQ(nullptr, status.json);
+    EXPECT_EQ(0U, status.capacity);
+}
+
+} // namespace
