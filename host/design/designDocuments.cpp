@@ -81,6 +81,8 @@ double takeUp(const tLoopGains& gains, const tNoiseModel& model, double measured
     return frequency / 2 / std::sqrt(gains.ki / model.interval());
 }
 
+} // namespace
+
 // A change to gains of a slower loop leaves it with the frequency that the quicker one had ordered
 // against the noise of the last pair. So they follow one another in steps: each loop works like a
 // filter that has seen three times as many pairs as the one before, from the measurement of the
@@ -115,8 +117,6 @@ void addQuick(tDesign& design, const tNoiseModel& model)
         design.quick.push_back(quick);
     }
 }
-
-} // namespace
 
 double snapThresholdFor(const tNoiseModel& model)
 {

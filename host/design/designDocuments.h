@@ -28,6 +28,9 @@ struct tDesign {
 // Throws std::runtime_error if no document can have such gains.
 tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model);
 
+// Adds the quick documents, if the quiet one of the design needs any.
+void addQuick(tDesign& design, const tNoiseModel& model);
+
 // The least threshold, in seconds, that such errors, outliers included, as good as never reach.
 double snapThresholdFor(const tNoiseModel& model);
 

@@ -1,0 +1,380 @@
+// Loops, filters and documents: against closed forms, and simulations of known noise.
+
+#include "design/designDocuments.h"
+#include "design/estimateNoise.h"
+#include "design/loopAdvice.h"
+#include "design/tLoopAnalysis.h"
+#include "design/tLoopGains.h"
+#include "design/tTrial.h"
+#include "maths/tNoise.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <stdexcept>
+
+using namespace dravikHost;
+
+namespace {
+
+tServoParameters law(double g, double a, double b = 1, double c = 1)
+{
+    tServoParameters parameters;
+    parameters.phaseLockGain = g;
+    parameters.phaseLockCoefficientA = a;
+    parameters.phaseLockCoefficientB = b;
+    parameters.phaseLockCoefficientC = c;
+    return parameters;
+}
+
+tNoiseModel noiseOf(double interval, double noiseNs, double frequencyNoisePpb, double wanderPpb)
+{
+    return {std::llround(interval * 1e9), noiseNs, frequencyNoisePpb, wanderPpb, 0, 0};
+}
+
+// With the poles z of z^2 - sz + p: one per cent is reached after ln 0.01 / ln |z| pairs; damping
+// is that of ln z; the noise that passes is the variance of x(n+1) = s x(n) - p x(n-1) - gT (A e(n)
+// - B e(n-1)). The overshoots are worked out pair by pair.
+TEST(LoopAnalysis, agreesWithClosedForms)
+{
+    const struct {
+        const char* name;
+        tServoParameters parameters;
+        double interval;
+        double damping, settling, overshoot, noiseGain;
+    } kRows[] = {
+        {"s = 1, p = 0.5", law(0.5, 2), 1, 0.40371275, 13.2877124, 0.5, 1.18321596},
+        {"the same at half the interval", law(1, 2), 0.5, 0.40371275, 6.6438562, 0.5, 1.18321596},
+        {"s = 1, p = 0.3", law(0.7, 10 / 7.0), 1, 0.81977928, 7.64995716, 0.3, 1.05441986},
+        {"real poles", law(0.1, 1.01), 1, 1.62289299, 411.574568, 0.07048957, 0.24119122},
+        {"deadbeat", law(1, 2), 1, 0, 2, 1, 2.23606798},
+        {"alternating", law(0.6, 1.2), 2, 0, 43.1107870, 0.44, 1.49509000},
+        {"one pole", law(0.5, 1, 0, 0), 1, 0, 6.6438562, 0, 0.57735027},
+    };
+    for (const auto& row : kRows) {
+        const tLoopAnalysis found(row.parameters, row.interval);
+        SCOPED_TRACE(row.name);
+        EXPECT_TRUE(found.stable);
+        EXPECT_NEAR(row.damping, found.damping.value_or(0), 1e-7);
+        EXPECT_NEAR(row.settling, found.settling, 1e-6 * row.settling);
+        EXPECT_NEAR(row.overshoot, found.overshoot, 1e-7);
+        EXPECT_NEAR(row.noiseGain, found.noiseGain, 1e-7);
+    }
+}
+
+TEST(LoopAnalysis, knowsWhereStabilityEnds)
+{
+    const struct {
+        tServoParameters parameters;
+        double below; // s; 0: none is told
+        double stable, unstable;
+    } kRows[] = {
+        {law(0.55, 2), 80 / 33.0, 2.42, 2.43},
+        {law(0.1, 1.2, 0.8), 20, 19.9, 20.1},
+        {law(1, 1, 1), 0, 0, 1}, // a double pole at 1
+        {law(1, 0.5, 1), 0, 0, 0.001},
+        {law(1, 2, -1), 0, 0, 0.001},
+        {law(1, -2, -3), 0, 0, 0.001},
+        {law(1, 1, 0.5, 0.5), 0, 1.99, 2.01}, // where s = -1 - p
+        {law(1, 0, -1, 0.5), 0, 0.49, 0.51},  // where p = 1
+    };
+    for (const auto& row : kRows) {
+        const tLoopAnalysis outside(row.parameters, row.unstable);
+        EXPECT_FALSE(outside.stable) << row.unstable;
+        EXPECT_NEAR(row.below, outside.stableBelow, 1e-12);
+        EXPECT_EQ(0, outside.settling);
+        EXPECT_EQ(row.stable > 0, tLoopAnalysis(row.parameters, row.stable).stable);
+    }
+}
+
+TEST(LoopGains, becomeALaw)
+{
+    const struct {
+        tLoopGains gains;
+        double g, a, b;
+    } kRows[] = {
+        {{0.7, 0.3}, 0.7, 1 / 0.7, 1}, {{0.1, 1e-7}, 0.1, 1.000001, 1},
+        {{0.01, 0.99}, 0.1, 10, 0.1}, // A at its bound
+        {{20, 5}, 10, 2.5, 2},        // the gain at its bound
+        {{60, 40}, 10, 10, 6},
+    };
+    for (const auto& row : kRows) {
+        tServoParameters parameters = law(1, 1, 1, 0);
+        EXPECT_TRUE(row.gains.fit());
+        row.gains.putInto(parameters);
+        EXPECT_DOUBLE_EQ(row.g, parameters.phaseLockGain);
+        EXPECT_DOUBLE_EQ(row.a, parameters.phaseLockCoefficientA);
+        EXPECT_DOUBLE_EQ(row.b, parameters.phaseLockCoefficientB);
+        EXPECT_EQ(1, parameters.phaseLockCoefficientC);
+        EXPECT_NEAR(row.gains.kp, tLoopGains::of(parameters).kp, 1e-12);
+        EXPECT_NEAR(row.gains.ki, tLoopGains::of(parameters).ki, 1e-12);
+    }
+    tServoParameters parameters;
+    EXPECT_FALSE((tLoopGains{60, 40.1}).fit());
+    EXPECT_THROW((tLoopGains{60, 40.1}).putInto(parameters), std::runtime_error);
+}
+
+// In the steady state, with a = K1 = kp T and b = K2 T = ki T, R the variance of a measurement and
+// q that of the wander after 1 s, f that of the white frequency noise:
+//     b^2 / (1 - a) = q T^3 / R        a^2 = b (2 - a) - b^2 / 6 + f T (1 - a) / R
+TEST(Kalman, standsStillWhereTheoryHasIt)
+{
+    for (const tNoiseModel& model : {noiseOf(1, 50, 0, 1), noiseOf(0.125, 50, 3, 10),
+                                     noiseOf(8, 5, 10, 1), noiseOf(1, 1000, 0.1, 0.5)}) {
+        const double t = model.interval();
+        const double r = model.noiseNs * model.noiseNs;
+        const double q = model.wanderPpb * model.wanderPpb;
+        const double f = model.frequencyNoisePpb * model.frequencyNoisePpb;
+        const tKalmanDesign found = steadyKalman(model);
+        const double a = found.gains.kp * t;
+        const double b = found.gains.ki * t;
+        EXPECT_NEAR(1, b * b / (1 - a) / (q * t * t * t / r), 1e-6);
+        EXPECT_NEAR(a * a, b * (2 - a) - b * b / 6 + f * t * (1 - a) / r, 1e-6 * a * a);
+        EXPECT_NEAR(std::sqrt(r * a / (1 - a)), found.rmsNs, 1e-6 * found.rmsNs);
+    }
+}
+
+// A straight line through n points by least squares tells its end and its slope.
+TEST(Kalman, growsLikeLeastSquares)
+{
+    for (const int n : {2, 3, 10}) {
+        double squares = 0; // of the points' distances from their middle, m
+        const double m = (n - 1) / 2.0;
+        for (int i = 0; i < n; ++i)
+            squares += (i - m) * (i - m);
+        EXPECT_NEAR(1.0 / n + m * m / squares, growingKalman(n, 1).kp, 1e-12);
+        EXPECT_NEAR(m / squares, growingKalman(n, 1).ki, 1e-12);
+        EXPECT_DOUBLE_EQ(growingKalman(n, 1).kp / 4, growingKalman(n, 4).kp);
+        EXPECT_DOUBLE_EQ(growingKalman(n, 1).ki / 4, growingKalman(n, 4).ki);
+    }
+}
+
+// What a clock under corrections that vary, but are known, shows of such noise.
+tRecording simulated(const tNoiseModel& model, int pairs)
+{
+    tNoise noise(1);
+    tRecording recording{"trace", "", {}, 0, {}};
+    const double t = model.interval();
+    double phaseNs = 0;
+    double frequencyPpb = 12e3;
+    for (int i = 0; i < pairs; ++i) {
+        const bool isOutlier = i % 100 < std::lround(model.outlierRate * 100);
+        const double outlierNs = !isOutlier ? 0 : i / 100 % 2 == 0 ? 1 : -1;
+        tRecordedPair pair{};
+        pair.elapsedNs = i * model.intervalNs;
+        pair.errorNs = phaseNs + model.noiseNs * noise.normal() + outlierNs * model.outlierSizeNs;
+        pair.orderedPpb = i % 7 * 300 - 13e3;
+        pair.stepNs = i % 50 == 0 ? -4000 : 0;
+        recording.pairs.push_back(pair);
+        phaseNs += static_cast<double>(pair.stepNs) + (frequencyPpb + *pair.orderedPpb) * t +
+                   model.frequencyNoisePpb * std::sqrt(t) * noise.normal();
+        frequencyPpb += model.wanderPpb * std::sqrt(t) * noise.normal();
+    }
+    return recording;
+}
+
+TEST(NoiseEstimate, findsWhatWasPutIn)
+{
+    const struct {
+        const char* name;
+        tNoiseModel model;
+        double noiseWithin, frequencyWithin, wanderWithin;
+    } kRows[] = {
+        {"quiet", {1'000'000'000, 50, 0, 1, 0, 0}, 2, 5, 0.2},
+        {"every two seconds", {2'000'000'000, 50, 0, 1, 0, 0}, 2, 5, 0.2},
+        {"white frequency", {1'000'000'000, 20, 20, 1, 0, 0}, 2, 2, 0.3},
+        {"outliers", {1'000'000'000, 50, 0, 1, 0.02, 3000}, 2, 5, 0.25},
+    };
+    for (const auto& row : kRows) {
+        const tNoiseModel found = estimateNoise(simulated(row.model, 5000));
+        SCOPED_TRACE(row.name);
+        EXPECT_EQ(row.model.intervalNs, found.intervalNs);
+        EXPECT_NEAR(row.model.noiseNs, found.noiseNs, row.noiseWithin);
+        EXPECT_NEAR(row.model.frequencyNoisePpb, found.frequencyNoisePpb, row.frequencyWithin);
+        EXPECT_NEAR(row.model.wanderPpb, found.wanderPpb, row.wanderWithin);
+        EXPECT_NEAR(row.model.outlierRate, found.outlierRate, 0.002);
+        EXPECT_NEAR(row.model.outlierSizeNs, found.outlierSizeNs, 100);
+    }
+}
+
+TEST(NoiseEstimate, needsEnoughToGoBy)
+{
+    tRecording recording = simulated(noiseOf(1, 50, 0, 1), 400);
+    for (size_t i = 100; i < 400; ++i) // steps, not outliers
+        recording.pairs[i].errorNs += i < 250 ? 5000 : -5000;
+    EXPECT_EQ(0, estimateNoise(recording).outlierRate);
+    EXPECT_NEAR(50, estimateNoise(recording).noiseNs, 5);
+    recording.pairs.resize(100);
+    EXPECT_NO_THROW(estimateNoise(recording));
+    recording.pairs.resize(99);
+    EXPECT_THROW(estimateNoise(recording), std::runtime_error);
+    recording = simulated(noiseOf(1, 50, 0, 1), 100);
+    recording.pairs[40].orderedPpb.reset();
+    EXPECT_THROW(estimateNoise(recording), std::runtime_error);
+}
+
+TEST(Design, hasThresholdAndFilterAboveTheNoise)
+{
+    tNoiseModel model = noiseOf(2, 50, 0, 1);
+    tServoParameters parameters;
+    EXPECT_NEAR(600e-9, snapThresholdFor(model), 1e-15);
+    setSpikeFilter(parameters, model); // mean steps of 2 / sqrt(pi) deviations in two seconds
+    EXPECT_EQ(1, parameters.spikeFilterEnabled);
+    EXPECT_EQ(4, parameters.spikeFilterHistorySize);
+    EXPECT_EQ(4, parameters.spikeFilterGrowthFactor);
+    EXPECT_NEAR(101.554e-9, parameters.spikeFilterMinThreshold, 1e-12);
+    EXPECT_NEAR(677.028e-9, parameters.spikeFilterMaxThreshold, 1e-12);
+    model.outlierRate = 0.01;
+    model.outlierSizeNs = 1000;
+    EXPECT_NEAR(1800e-9, snapThresholdFor(model), 1e-15);
+    setSpikeFilter(parameters, model);
+    EXPECT_EQ(1.7, parameters.spikeFilterGrowthFactor);
+    EXPECT_EQ(1e-8, snapThresholdFor(noiseOf(1, 0, 0, 0))); // the bounds of documents
+    setSpikeFilter(parameters, noiseOf(1, 0, 0, 0));
+    EXPECT_EQ(1e-9, parameters.spikeFilterMinThreshold);
+    EXPECT_EQ(1e-9, parameters.spikeFilterMaxThreshold);
+}
+
+// From 10 pairs, over which the frequency was measured, to the 264 of the quiet loop.
+TEST(Design, getsQuietInSteps)
+{
+    tDesign design;
+    tLoopGains{4 / 264.0, 1e-4}.putInto(design.quiet);
+    design.quiet.snapTimeThreshold = 120e-6;
+    addQuick(design, noiseOf(1, 10'000, 0.1, 1));
+    EXPECT_EQ(10'000'000'000, design.measureOverNs);
+    ASSERT_EQ(2U, design.quick.size());
+    const tLoopGains quicker = tLoopGains::of(design.quick[0].parameters);
+    EXPECT_NEAR(growingKalman(264 / 9.0, 1).kp, quicker.kp, 1e-12);
+    EXPECT_NEAR(growingKalman(264 / 3.0, 1).ki, tLoopGains::of(design.quick[1].parameters).ki,
+                1e-12);
+    EXPECT_EQ(88'000'000'000, design.quick[0].heldNs);
+    EXPECT_EQ(264'000'000'000, design.quick[1].heldNs);
+    const double wrong = 3 * std::sqrt(2.0) * 10e-6 / 10; // of the frequency that was measured
+    EXPECT_NEAR(120e-6 + wrong / 2 / std::sqrt(quicker.ki),
+                design.quick[0].parameters.snapTimeThreshold, 1e-12);
+    EXPECT_EQ(120e-6, design.quick[1].parameters.snapTimeThreshold);
+
+    for (const auto& [interval, pairs, measured, documents] :
+         {std::tuple(1.0, 11.9, 0.0, 0U), {0.5, 12.1, 1.0, 1U}, {43200.0, 264.0, 86400.0, 3U}}) {
+        tDesign other;
+        tLoopGains{4 / pairs / interval, 1e-9}.putInto(other.quiet);
+        addQuick(other, noiseOf(interval, 50, 0, 1));
+        EXPECT_EQ(std::llround(measured * 1e9), other.measureOverNs) << pairs;
+        EXPECT_EQ(documents, other.quick.size()) << pairs;
+    }
+}
+
+TEST(Trial, isLongEnoughForTheLoop)
+{
+    const struct {
+        double ki, interval;
+        int64_t settling, counted;
+    } kRows[] = {{1e-2, 1, 100, 2000},
+                 {0.0025, 1, 200, 4000},
+                 {1e-4, 4, 500, 10000},
+                 {1, 1, 50, 2000},
+                 {1e-6, 1, 2000, 10000}};
+    for (const auto& row : kRows) {
+        const tTrialOptions options = trialFor({1, row.ki}, noiseOf(row.interval, 1, 1, 1));
+        EXPECT_EQ(row.settling, options.settlingPairs);
+        EXPECT_EQ(row.counted, options.countedPairs);
+        EXPECT_EQ(32U, options.seeds);
+    }
+}
+
+// The built-in law passes 124.62 % of the noise. Of normal errors the tail is 105^(1/8) deviations.
+TEST(Trial, showsWhatTheLoopMakesOfNoise)
+{
+    const tServoLibrary library(tServoLibrary::find(""));
+    const std::string builtIn = tServoParameters().documentText();
+    const tTrialResult quiet = runTrial(library, builtIn, noiseOf(1, 50, 0, 0), {100, 2000, 4});
+    EXPECT_NEAR(62.3, quiet.rmsNs, 1.5);
+    EXPECT_NEAR(62.3 * 1.789, quiet.tailNs, 9);
+    EXPECT_GT(quiet.peakNs, 3 * quiet.rmsNs);
+    EXPECT_LT(quiet.peakNs, 6 * quiet.rmsNs);
+    EXPECT_EQ(0, quiet.lostPerHour);
+    for (const double interval : {1.0, 0.5}) { // roughly, as errors in a row are not independent
+        const std::string document = law(0.55 / interval, 2).documentText();
+        const auto noisy =
+            runTrial(library, document, noiseOf(interval, 500, 0, 0), {100, 2000, 4});
+        EXPECT_NEAR(465 / interval, noisy.lostPerHour, 150 / interval);
+    }
+    EXPECT_THROW(runTrial(library, "{", noiseOf(1, 50, 0, 0), {1, 1, 1}), std::runtime_error);
+}
+
+TEST(Design, comesNearToTheory)
+{
+    const tDesign design =
+        designDocuments(tServoLibrary(tServoLibrary::find("")), noiseOf(1, 50, 0.1, 1));
+    EXPECT_NEAR(23.8, design.theoreticalRmsNs, 0.05);
+    EXPECT_NEAR(0.184, tLoopGains::of(design.quiet).kp, 0.015);
+    EXPECT_NEAR(0.0188, tLoopGains::of(design.quiet).ki, 0.003);
+    EXPECT_NEAR(12 * std::hypot(50, 23.8) * 1e-9, design.quiet.snapTimeThreshold, 1e-9);
+    EXPECT_EQ(1, design.quiet.spikeFilterEnabled);
+    EXPECT_EQ(1U, design.quick.size());
+}
+
+struct tAdviceRow {
+    const char* line;
+    tServoParameters parameters;
+    double interval = 1;
+    double noiseNs = 0; // 0: not known
+};
+
+tServoParameters filtered(double growth)
+{
+    tServoParameters parameters;
+    parameters.spikeFilterEnabled = 1;
+    parameters.spikeFilterGrowthFactor = growth;
+    return parameters;
+}
+
+TEST(LoopAdvice, hasALineForEachMatter)
+{
+    const tAdviceRow kRows[] = {
+        {"at one pair every 125 ms:", {}, 0.125},
+        {"  like a PI controller with kp 0.7 and ki 0.3 per second and pair", law(0.7, 10 / 7.0)},
+        {"! C is 0.9, below 1: frequency is forgotten, so an oscillator that is 1 ppm off keeps "
+         "the clock 181.8 ns off",
+         law(0.55, 2, 1, 0.9)},
+        {"! C is 1.5, above 1: frequency runs away", law(0.55, 2, 1, 1.5)},
+        {"  stable", law(0.55, 2, 1, 0.9)},
+        {"  stable below 2.424 s", {}, 0.125},
+        {"! unstable: at most 2.424 s from pair to pair, or a smaller gain", {}, 2.5},
+        {"! unstable at any interval", law(0.55, 0.5)},
+        {"! damping 0.13; settles within 16.16 s, overshoots by 71 %", {}, 0.125},
+        {"! damping 0.38; settles within 12.37 s, overshoots by 61 %", law(0.525, 2.2)},
+        {"  damping 0.43; settles within 11.53 s, overshoots by 54 %", {}},
+        {"  damping 0.82; settles within 7.65 s, overshoots by 30 %", law(0.7, 10 / 7.0)},
+        {"! too quick: alternates from pair to pair; settles within 2 s, overshoots by 100 %",
+         law(1, 2)},
+        {"  passes 224 % of the noise on to the clock", law(1, 2)},
+        {"  passes 40 % of the noise on to the clock, 20.24 ns", law(0.1846, 1.1018), 1, 50},
+        {"  snapTimeThreshold, 1 us, is 12.5 deviations of what it is compared with", {}, 1, 50},
+        {"! snapTimeThreshold, 1 us, is 1.3 deviations of what it is compared with: the lock is "
+         "lost about 465 times an hour; better 9.6e-06",
+         {},
+         1,
+         500},
+        {"  spike filter off", {}, 1, 50},
+        {"  spike filter limits to 3.0 mean steps of the noise", filtered(3), 1, 50},
+        {"! spike filter limits to 1.4 mean steps of the noise, which it cuts into: the loop is "
+         "slowed",
+         filtered(1.4), 1, 50},
+    };
+    for (const tAdviceRow& row : kRows) {
+        const auto noise = row.noiseNs > 0 ? std::optional(row.noiseNs) : std::nullopt;
+        const std::string found = "\n" + loopAdvice(row.parameters, row.interval, noise);
+        EXPECT_NE(std::string::npos, found.find("\n" + std::string(row.line) + "\n"))
+            << row.line << found;
+    }
+    const auto lines = [](const std::string& text) {
+        return std::count(text.begin(), text.end(), '\n');
+    };
+    EXPECT_EQ(3, lines(loopAdvice({}, 2.5, 50.0))); // nothing more on what is not stable
+    EXPECT_EQ(5, lines(loopAdvice({}, 1, std::nullopt)));
+    EXPECT_EQ(7, lines(loopAdvice({}, 1, 50.0)));
+}
+
+} // namespace
