@@ -192,6 +192,7 @@ key() { printf 0x%08x $((0x4e545030 + unit)); }
 unit=$((10 + RANDOM % 240))
 while ipcs -m | grep -q "$(key)"; do unit=$((unit % 250 + 2)); done
 mkfifo fifo
+step=
 for reference in "shm:$unit" sock:here; do
     host --reference "$reference" --config calm.json > fifo & pid=$!
     ${EMULATOR:+"$EMULATOR"} ./producer "${reference%:*}" "${reference#*:}" & producer=$!

@@ -222,6 +222,7 @@ start=$EPOCHREALTIME
 (real --duration 300ms) > out
 expect "real time" "0 1" "$? $((${EPOCHREALTIME/./} - ${start/./} >= 300000))"
 mkfifo fifo
+last=
 real --config calm.json > fifo & pid=$!
 while IFS= read -r line; do
     case $line in

@@ -13,13 +13,13 @@
 #include <unistd.h>
 
 #if defined(__x86_64__)
-enum { kArchitecture = AUDIT_ARCH_X86_64 };
+static const uint32_t kArchitecture = AUDIT_ARCH_X86_64;
 #elif defined(__aarch64__)
-enum { kArchitecture = AUDIT_ARCH_AARCH64 };
+static const uint32_t kArchitecture = AUDIT_ARCH_AARCH64;
 #elif defined(__arm__)
-enum { kArchitecture = AUDIT_ARCH_ARM };
+static const uint32_t kArchitecture = AUDIT_ARCH_ARM;
 #elif defined(__i386__)
-enum { kArchitecture = AUDIT_ARCH_I386 };
+static const uint32_t kArchitecture = AUDIT_ARCH_I386;
 #endif
 
 static const long kSetters[] = {
@@ -59,7 +59,7 @@ static int installFilter(void)
 #define ADD(...) program[length++] = (struct sock_filter)__VA_ARGS__
 #define REFUSE ADD(BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EPERM))
     ADD(BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(struct seccomp_data, arch)));
-    ADD(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, (uint32_t)kArchitecture, 1, 0));
+    ADD(BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, kArchitecture, 1, 0));
     REFUSE;
     ADD(BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(struct seccomp_data, nr)));
     ADD(BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, kCallMask, 0, 1));
