@@ -2,7 +2,7 @@
 # Sourced by tests in bash that run programs under a simulated machine, see
 # simulated_machine/machine.h. $bin is the folder of dravik-host; $asUser what gives permissions away.
 simulated() { # PROGRAM ARGUMENT...: under the machine that the file machine describes
-    local under=("SIMULATED_MACHINE=machine" "LD_PRELOAD=$bin/../tests/libsimulated_machine.so"
+    local under=("SIMULATED_MACHINE=machine" "LD_PRELOAD=$bin/libsimulated_machine.so"
         ${LIBRARIES:+"LD_LIBRARY_PATH=$LIBRARIES"})
     if [ -n "${EMULATOR:-}" ]; then
         echo emulator >> machine

@@ -1,35 +1,57 @@
 #pragma once
+// clang-format off
 /* A simulated machine for unchanged programs: loaded before the C library it keeps all their clocks
  * and lets time pass only while they wait, so that an hour takes no time and gives the same bytes
  * again. Nothing under it can set a clock of the real machine. Not for programs of several threads.
  *
  * SIMULATED_MACHINE names a file of statements, one a line; # begins a comment. Times have a unit
  * of ns, us, ms, s, frequencies one of ppb, ppm.
- *   seed N                 of all noise; start T: true time at the start; tai N: seconds
+ *   seed N                 of all noise
+ *   start T                true time at the start
+ *   tai N                  seconds between TAI and UTC
  *   grid T                 how often oscillators change (10ms), whatever the program does
- *   reading T              what each reading of a clock takes (20ns); wake T: lateness of a waker
+ *   reading T              what each reading of a clock takes (20ns)
+ *   wake T                 lateness of a waker
  *   trace FILE [pace=T]    rows of elapsed_s,clock,error_ns,ordered_ppb,event: the true error of
  *                          each clock at each order given to it, and at a pace
  *   emulator               run by an emulator: a filter of system calls cannot be had
+ *
  *   system KEY=VALUE...    the machine's oscillator, which all CLOCK_... share
  *   ptp PATH KEY=VALUE...  a PTP hardware clock that is opened by that name
- *     offset= frequency=   at the start, against true time; max= the largest order
+ *     offset= frequency=   at the start, against true time
+ *     max=                 the largest order
  *     white= wander=       noise of the frequency: deviation over 1 s, of its walk in 1 s
- *     sine= period= ramp=  ppb, time, ppb each second; file=FILE: ppb, a line for each second
- *     status=              system: bits of the kernel's clock at the start (64: not synchronised);
- * delay= ptp: a reading's quirks=LETTERS       p no permission to set; orders beyond 10 ppm are c
- * cut, r refused; no PTP_SYS_OFFSET_PRECISE e, nor _EXTENDED b shm UNIT KEY=VALUE...  a segment of
- * NTP with a producer in it; sock PATH KEY=VALUE...: a producer of datagrams to that socket of the
- * program interval= first=     when samples come; none without an interval count= offset=       how
- * many of them; true time as they tell it bits=32|64 mode=0|1  of a time_t; of a segment, where
- * absent=1 leaves making it to the program micro=1 leap=N       nanoseconds are left at 0; leap
- * indicator pulse=1              only the fraction of a second of an offset holds, the rest is
- * wrong spoilt=WORD/...      the first samples, one word each: leap old magic short long torn ok
- * Clocks of PTP, segments and sockets also take what their readings have of errors: noise=
- * outliers= size=  deviation; share of outliers and their size; errors=FILE: ns, a line each at T
- * signal HUP|INT|TERM       at T run SHELL COMMAND at T step NAME T | frequency NAME F    by
- * somebody else; NAME: system, a PATH or a UNIT at T silence NAME | resume NAME        no samples;
- * readings of a PTP clock fail */
+ *     sine= period= ramp=  ppb, time, ppb each second
+ *     file=FILE            ppb, a line for each second
+ *     status=              system: bits of the kernel's clock at the start (64: not synchronised)
+ *     delay=               ptp: of a reading
+ *     quirks=LETTERS       p: no permission to set; orders beyond 10 ppm are c: cut, r: refused;
+ *                          e: no PTP_SYS_OFFSET_PRECISE; b: nor _EXTENDED
+ *
+ *   shm UNIT KEY=VALUE...  a segment of NTP with a producer in it
+ *   sock PATH KEY=VALUE... a producer of datagrams to that socket of the program
+ *     interval= first=     when samples come; none without an interval
+ *     count=               how many of them
+ *     offset=              true time as they have it
+ *     bits=32|64           of a time_t
+ *     mode=0|1             of a segment; absent=1 leaves making it to the program
+ *     micro=1              nanoseconds are left at 0
+ *     leap=N               leap indicator
+ *     pulse=1              only the fraction of a second of an offset holds, the rest is wrong
+ *     spoilt=WORD/...      the first samples, one word each: leap old magic short long torn ok
+ *
+ * Clocks of PTP, segments and sockets also take what their readings have of errors:
+ *     noise=               deviation
+ *     outliers= size=      share of outliers, and their size
+ *     errors=FILE          ns, a line each
+ *
+ *   at T signal HUP|INT|TERM
+ *   at T run SHELL COMMAND
+ *   at T step NAME T       by somebody else; NAME is system, a PATH or a UNIT
+ *   at T frequency NAME F
+ *   at T silence NAME      no samples; readings of a PTP clock fail
+ *   at T resume NAME */
+// clang-format on
 #define _GNU_SOURCE
 #include <dlfcn.h>
 #include <errno.h>
