@@ -202,6 +202,18 @@ TEST_F(LiveSource, endsWithASignal)
     EXPECT_TRUE(signals.stopRaised());
 }
 
+TEST(Signals, endTheProgramAgainAfterwards)
+{
+    {
+        const tSignals meanwhile;
+    }
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP}) {
+        struct sigaction now = {};
+        sigaction(signal, nullptr, &now);
+        EXPECT_EQ(SIG_DFL, now.sa_handler) << signal;
+    }
+}
+
 TEST(ClockReference, isReadAtItsPaceAndSilentWhereItFails)
 {
     rawNow = 1000;
@@ -523,10 +535,12 @@ tRecording recording()
 
 TEST(RecordedSource, givesThePairsAndTheClockAsTheyWere)
 {
-    const tRecording made = recording();
+    tRecording made = recording();
+    made.pairs[0].orderedPpb.reset();
     tRecordedClock clock(1000);
+    clock.setOffsetPpb(7);
     tRecordedSource source(made, clock);
-    const int32_t kOffsets[] = {0, 0, -5}; // in force until the pair
+    const int32_t kOffsets[] = {7, 7, -5}; // in force until the pair
     for (size_t i = 0; i < 3; ++i) {
         const auto pair = source.next();
         EXPECT_EQ(made.pairs[i].elapsedNs, pair->elapsedNs);
@@ -564,18 +578,23 @@ TEST(FreeRunningSource, takesTheRecordedCorrectionsOutAndPutsItsOwnIn)
 TEST(SimulatedSource, seesThePairsThroughItsModel)
 {
     tNoise noise(1);
+    tNoise same(1);
     tSimulatedClock clock(tSimulatedSource::kStartNs, {150, 0, 0}, 0, noise);
     tMeasurementModel model;
     model.intervalNs = kSecond;
     model.durationNs = 3 * kSecond;
+    model.noiseNs = 1000;
     model.granularityNs = 100;
     tSimulatedSource source(clock, model, noise);
     for (int64_t i = 0; i < 3; ++i) {
         const auto pair = source.next();
         EXPECT_EQ(i * kSecond, pair->elapsedNs);
-        EXPECT_EQ(tSimulatedSource::kStartNs + static_cast<uint64_t>(i * kSecond),
-                  pair->referenceNs);
-        EXPECT_EQ(i * 150 / 100 * 100, pair->errorNs());
+        const uint64_t trueNs = tSimulatedSource::kStartNs + static_cast<uint64_t>(i * kSecond);
+        EXPECT_EQ((trueNs + static_cast<uint64_t>(i * 150)) / 100 * 100, pair->clockNs);
+        for (int taken = 0; i > 0 && taken < 2; ++taken) // by the clock
+            same.normal();
+        const auto errorNs = static_cast<int64_t>(std::floor(measurementErrorNs(model, same)));
+        EXPECT_EQ((trueNs + static_cast<uint64_t>(errorNs)) / 100 * 100, pair->referenceNs);
         EXPECT_NEAR(i * 150.0, *pair->trueErrorNs, 1e-6);
     }
     EXPECT_FALSE(source.next());
