@@ -357,6 +357,11 @@ TEST(LoopAdvice, hasALineForEachMatter)
          {},
          1,
          500},
+        {"! snapTimeThreshold, 1 us, is 3.9 deviations of what it is compared with: the lock is "
+         "lost about 0.33 times an hour; better 3.1e-06",
+         {},
+         1,
+         160},
         {"  spike filter off", {}, 1, 50},
         {"  spike filter limits to 3.0 mean steps of the noise", filtered(3), 1, 50},
         {"! spike filter limits to 1.4 mean steps of the noise, which it cuts into: the loop is "

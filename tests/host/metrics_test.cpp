@@ -101,7 +101,7 @@ TEST(Series, areFilteredAndFlattened)
     }
     EXPECT_EQ(sloped.phase, lowPass(sloped, 0.2).phase);
     EXPECT_NO_THROW(behindMaskFilter({1, {1}}));
-    EXPECT_THROW(behindMaskFilter({1.1, {1}}), std::runtime_error);
+    EXPECT_THROW(behindMaskFilter({1.01, {1}}), std::runtime_error);
 }
 
 struct tPoint {
@@ -413,8 +413,18 @@ TEST(Masks, areFilteredAndLimitTausWithinReason)
     const char* const mean = "constant TE 10 ns";
     EXPECT_EQ(tMaskLine::kHeld, verdict("g8273.2-d", "max |TEL| 5 ns", alternating(60)));
     EXPECT_EQ(tMaskLine::kHeld, verdict("g8273.2-a", "dTEH peak to peak 70 ns", constant(999)));
+    EXPECT_EQ(tMaskLine::kHeld, verdict("g8273.2-a", "dTEH peak to peak 70 ns", ramp(200)));
+    EXPECT_EQ(tMaskLine::kHeld,
+              verdict("g8273.2-a", "dTEL MTIE up to 1000 s 40 ns", alternating(60)));
+    EXPECT_EQ(tMaskLine::kHeld, verdict("g8273.2-a", "dTEL TDEV up to 1000 s 4 ns", flip(0.05, 5)));
+    EXPECT_EQ(tMaskLine::kBroken, // at a third of the points, which is no octave
+              verdict("g8273.2-c", "dTEL TDEV up to 1000 s 2 ns", square(2.1, 200, 601)));
+    EXPECT_EQ(tMaskLine::kBroken, // at 0.05 s, though it is much larger, but allowed, at 10 s
+              verdict("802.1as", slope, shaped(0.05, 600, [](double i) {
+                          return (std::fmod(i, 2) < 1 ? 0.17 : -0.17) + 40 * i * i / (200 * 200);
+                      })));
     EXPECT_EQ(tMaskLine::kHeld, verdict("g8273.2-d", "max |TEL| 5 ns", everySeconds(1)));
-    EXPECT_EQ(tMaskLine::kNotChecked, verdict("g8273.2-d", "max |TEL| 5 ns", everySeconds(1.1)));
+    EXPECT_EQ(tMaskLine::kNotChecked, verdict("g8273.2-d", "max |TEL| 5 ns", everySeconds(1.01)));
     EXPECT_EQ(tMaskLine::kHeld, verdict("802.1as", slope, flip(0.05, 0.15)));
     EXPECT_EQ(tMaskLine::kBroken, verdict("802.1as", slope, flip(0.05, 0.16)));
     EXPECT_EQ(tMaskLine::kHeld, verdict("802.1as", slope, flip(0.049, 100)));
