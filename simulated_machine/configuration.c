@@ -222,6 +222,17 @@ static struct noise seeded(const struct machine* made, int cause)
     return noise;
 }
 
+/* A loader that cannot load this library goes on without it. Who must not do so looks for
+ * FILE.loaded. */
+static void leaveSign(const char* path)
+{
+    char sign[512];
+    const int length = snprintf(sign, sizeof sign, "%s.loaded", path);
+    FILE* const file = length < (int)sizeof sign ? fopen(sign, "we") : NULL;
+    if (!file) giveUp("cannot write", sign);
+    (void)fclose(file);
+}
+
 void configure(struct machine* made)
 {
     made->startNs = 1e18;
@@ -241,6 +252,7 @@ void configure(struct machine* made)
         take(made, line);
     }
     (void)fclose(file);
+    leaveSign(path);
     for (int i = 0; i < made->clockCount; ++i) {
         struct clock* const clock = &made->clocks[i];
         clock->steppedNs = (int64_t)clock->offsetNs;

@@ -4,7 +4,8 @@
  * and lets time pass only while they wait, so that an hour takes no time and gives the same bytes
  * again. Nothing under it can set a clock of the real machine. Not for programs of several threads.
  *
- * SIMULATED_MACHINE names a file of statements, one a line; # begins a comment. Times have a unit
+ * SIMULATED_MACHINE names a file of statements, one a line; # begins a comment. Beside it a file
+ * with .loaded at the end of its name shows that the library was loaded indeed. Times have a unit
  * of ns, us, ms, s, frequencies one of ppb, ppm.
  *   seed N                 of all noise
  *   start T                true time at the start

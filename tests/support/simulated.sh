@@ -2,13 +2,28 @@
 # Sourced by tests in bash that run programs under a simulated machine, see
 # simulated_machine/machine.h. $bin is the folder of dravik-host; $asUser what gives permissions away.
 simulated() { # PROGRAM ARGUMENT...: under the machine that the file machine describes
-    local under=("SIMULATED_MACHINE=machine" "LD_PRELOAD=$bin/libsimulated_machine.so"
+    # The loader takes blanks and colons of a path as its end.
+    [ -e libsimulated_machine.so ] || ln -s "$bin/libsimulated_machine.so" .
+    local under=("SIMULATED_MACHINE=machine" "LD_PRELOAD=./libsimulated_machine.so"
         ${LIBRARIES:+"LD_LIBRARY_PATH=$LIBRARIES"})
     if [ -n "${EMULATOR:-}" ]; then
         echo emulator >> machine
         under=("QEMU_SET_ENV=$(IFS=,; echo "${under[*]}")")
     fi
+    requireMachine
     ${asUser:-} env ASAN_OPTIONS="${ASAN_OPTIONS:-}:verify_asan_link_order=0" "${under[@]}" "$@"
+}
+
+# Without the library a program would have the clocks of the real machine.
+requireMachine()
+{
+    [ ! -e machine.loaded ] || return 0
+    env ASAN_OPTIONS="${ASAN_OPTIONS:-}:verify_asan_link_order=0" "${under[@]}" \
+        ${EMULATOR:+"$EMULATOR"} "$bin/dravik-host" --version > /dev/null
+    [ ! -e machine.loaded ] || return 0
+    echo "the simulated machine cannot be loaded: nothing is run" >&2
+    kill $$
+    exit 1
 }
 
 simulatedHost() { # STATEMENTS ARGUMENT...: dravik-host, statements with ; between them
@@ -40,6 +55,6 @@ expectRun() { # HEAD EXPECTED
     status=$?
     sed -i '/^run: /d' out
     [[ $2 == *'pairs  '* ]] || sed -i '/^pairs  /,$d' out
-    [ $status == 0 ] || echo "exit $status" >> out
+    [ "$status" == 0 ] || echo "exit $status" >> out
     expect "${name% }" "${2%$'\n'}" "$(cat out; eval "$command")"
 }
