@@ -13,6 +13,8 @@ set(DRAVIK_SANITIZE "" CACHE STRING "Sanitizers to build everything with")
 if(DRAVIK_SANITIZE)
     list(JOIN DRAVIK_SANITIZE "," sanitizers)
     target_compile_options(dravik_flags INTERFACE
-        -fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer)
+        -fsanitize=${sanitizers} -fno-sanitize-recover=all -fno-omit-frame-pointer
+        # GCC takes what the checks leave of inlined code for uninitialised.
+        $<$<CXX_COMPILER_ID:GNU>:-Wno-maybe-uninitialized>)
     target_link_options(dravik_flags INTERFACE -fsanitize=${sanitizers})
 endif()
