@@ -137,35 +137,28 @@ TEST(RecordedClock, showsWhatWasRecorded)
     clock.showTime(kStart);
     clock.step(5);
     EXPECT_EQ(kStart, clock.timeNs());
-    const struct {
-        double recordedPpb;
-        int32_t shownPpb;
-    } kRows[] = {{12.5, 13}, {-0.4, 0}, {1e12, 100}, {-1e12, -100}};
-    for (const auto& row : kRows) {
-        clock.showOffset(row.recordedPpb);
-        EXPECT_EQ(row.shownPpb, clock.offsetPpb());
+    for (const auto& [recordedPpb, shownPpb] :
+         {std::pair(12.5, 13), {-0.4, 0}, {1e12, 100}, {-1e12, -100}}) {
+        clock.showOffset(recordedPpb);
+        EXPECT_EQ(shownPpb, clock.offsetPpb());
     }
-    clock.setOffsetPpb(7);
-    EXPECT_EQ(7, clock.offsetPpb());
     EXPECT_EQ(100, clock.maxOffsetPpb());
     EXPECT_EQ(-100, clock.minOffsetPpb());
 }
 
 TEST(GuardedClock, asksItsGuardAndHoldsBackInADryRun)
 {
+    const auto guard = [](int64_t deltaNs) {
+        if (deltaNs == 13) throw std::runtime_error("refused");
+    };
     for (const bool dryRun : {false, true}) {
         tSteeredClock clock(kStart, 0, 500);
-        const auto guard = [](int64_t deltaNs) {
-            if (deltaNs == 13) throw std::runtime_error("refused");
-        };
         tGuardedClock guarded(clock, guard, dryRun);
         EXPECT_THROW(guarded.step(13), std::runtime_error);
         guarded.step(10);
         guarded.setOffsetPpb(20);
-        EXPECT_EQ(kStart + (dryRun ? 0 : 10), clock.timeNs());
-        EXPECT_EQ(dryRun ? 0 : 20, clock.offsetPpb());
-        EXPECT_EQ(clock.timeNs(), guarded.timeNs());
-        EXPECT_EQ(clock.offsetPpb(), guarded.offsetPpb());
+        EXPECT_EQ(kStart + (dryRun ? 0 : 10), guarded.timeNs());
+        EXPECT_EQ(dryRun ? 0 : 20, guarded.offsetPpb());
         EXPECT_EQ(500, guarded.maxOffsetPpb());
         EXPECT_EQ(-500, guarded.minOffsetPpb());
     }
@@ -176,15 +169,10 @@ TEST(SoftClock, passesTheTimeOfItsOscillator)
 {
     tSoftClock still(kStart, -1e9, 500);
     still.step(-4);
-    EXPECT_EQ(kStart - 4, still.timeNs());
-    const uint64_t beforeNs = systemTimeNs(CLOCK_REALTIME);
     const tCrossReading reading = still.crossRead();
-    EXPECT_GE(reading.systemNs, beforeNs);
     EXPECT_LE(reading.systemNs, systemTimeNs(CLOCK_REALTIME));
     EXPECT_EQ(kStart - 4, reading.clockNs);
     EXPECT_THROW(still.setOffsetPpb(501), std::out_of_range);
-    EXPECT_EQ(500, still.maxOffsetPpb());
-    EXPECT_EQ(-500, still.minOffsetPpb());
 }
 
 TEST(SoftClock, ranAtTheOldRateUntilItIsOrderedAnother)
@@ -209,23 +197,16 @@ TEST(SystemTime, ofOneClockIsTheMiddleOfAWindow)
 {
     const uint64_t beforeNs = rawTimeNs();
     const tCrossReading reading = crossReadSystem(CLOCK_MONOTONIC_RAW);
-    const uint64_t afterNs = rawTimeNs();
     EXPECT_GE(reading.clockNs - reading.windowNs / 2, beforeNs);
-    EXPECT_LE(reading.clockNs + reading.windowNs / 2, afterNs);
-    const tCrossReading itself = readSystemItself();
-    EXPECT_EQ(itself.systemNs, itself.clockNs);
-    EXPECT_EQ(0U, itself.windowNs);
+    EXPECT_LE(reading.clockNs + reading.windowNs / 2, rawTimeNs());
     EXPECT_THROW(systemTimeNs(1000), std::system_error);
 }
 
 TEST(KernelFrequency, givesBackWhatWasSet)
 {
-    const struct {
-        int32_t ppb;
-        long units;
-    } kRows[] = {{0, 0}, {1, 66}, {-1, -66}, {500'000, 32'768'000}, {-100'000, -6'553'600}};
-    for (const auto& row : kRows)
-        EXPECT_EQ(row.units, kernelFrequency(row.ppb)) << row.ppb;
+    for (const auto& [ppb, units] :
+         {std::pair(0, 0L), {1, 66}, {-1, -66}, {500'000, 32'768'000}, {-100'000, -6'553'600}})
+        EXPECT_EQ(units, kernelFrequency(ppb)) << ppb;
     EXPECT_EQ(1, ppbOfKernelFrequency(33));
     EXPECT_EQ(0, ppbOfKernelFrequency(-32));
     for (const int32_t ppb : {1, 2, 3, 7, 499'999, 999'999, 32'767'998, 2'147'483'647}) {
@@ -248,12 +229,9 @@ TEST_F(KernelClock, isSteppedBySecondsAndNanoseconds)
     const struct {
         int64_t deltaNs;
         long seconds, nanoseconds;
-    } kRows[] = {{0, 0, 0},
-                 {1, 0, 1},
-                 {-1, -1, 999'999'999},
-                 {-kSecond, -1, 0},
-                 {2'500'000'000, 2, 500'000'000},
-                 {-2'500'000'000, -3, 500'000'000}};
+    } kRows[] = {
+        {1, 0, 1},       {-1, -1, 999'999'999},           {-kSecond, -1, 0},
+        {kSecond, 1, 0}, {2'500'000'000, 2, 500'000'000}, {-2'500'000'000, -3, 500'000'000}};
     for (const auto& row : kRows) {
         clock.step(row.deltaNs);
         const timex& request = kernel.requests.back();
@@ -277,21 +255,13 @@ TEST_F(KernelClock, refusesAnOffsetThatIsNotTaken)
 
 TEST_F(KernelClock, saysWhatItLacks)
 {
-    const struct {
-        clockid_t id;
-        int failure;
-        const char* text;
-    } kRows[] = {
-        {CLOCK_REALTIME, EPERM,
-         "cannot step it, which takes CAP_SYS_TIME: Operation not permitted"},
-        {-5, EPERM, "cannot step it: Operation not permitted"},
-        {CLOCK_REALTIME, EINVAL, "cannot step it: Invalid argument"},
-    };
-    for (const auto& row : kRows) {
-        kernel.failure = row.failure;
-        tKernelClock failing(row.id, "it", 1, readSystemItself);
-        EXPECT_EQ(row.text, failureOf([&] { failing.step(1); }));
-    }
+    kernel.failure = EPERM;
+    EXPECT_EQ("cannot step the clock, which takes CAP_SYS_TIME: Operation not permitted",
+              failureOf([&] { clock.step(1); }));
+    tKernelClock device{-5, "it", 1, readSystemItself};
+    EXPECT_EQ("cannot step it: Operation not permitted", failureOf([&] { device.step(1); }));
+    kernel.failure = EINVAL;
+    EXPECT_EQ("cannot step the clock: Invalid argument", failureOf([&] { clock.step(1); }));
     EXPECT_THROW(openClock({"realtime", 1}), std::system_error);
 }
 
@@ -305,11 +275,9 @@ TEST_F(KernelClock, isOpenedByName)
     EXPECT_EQ(400'000, openClock({"realtime", 400'000})->maxOffsetPpb());
     EXPECT_THROW(openClock({"phc:/no/device", 1}), std::system_error);
     EXPECT_THROW(openClock({"phc:/dev/null", 1}), std::system_error);
-
     const uint64_t beforeNs = systemTimeNs(CLOCK_REALTIME);
     const auto soft = openClock({"soft", 700, -3600 * kSecond, -1e9});
     EXPECT_GE(soft->timeNs() + 3600 * kSecond, beforeNs);
-    EXPECT_LE(soft->timeNs() + 3600 * kSecond, systemTimeNs(CLOCK_REALTIME));
     EXPECT_EQ(soft->timeNs(), soft->timeNs()); // slow by all of it
     EXPECT_EQ(700, soft->maxOffsetPpb());
 }

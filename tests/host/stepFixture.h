@@ -1,6 +1,7 @@
 #pragma once
 
 #include "loop/tStep.h"
+#include "servo/tServoLibrary.h"
 #include "text/files.h"
 
 #include <gtest/gtest.h>
@@ -29,7 +30,14 @@ inline tStep stepAt(double seconds, int64_t errorNs, bool locked, double inForce
     return step;
 }
 
-// A file that lives as long as the test.
+// The plug-in beside the test program.
+inline const tServoLibrary& library()
+{
+    static const tServoLibrary loaded(tServoLibrary::find(""));
+    return loaded;
+}
+
+// A file that lives as long as the test; it is there once something writes it.
 class tTestFile
 {
 public:

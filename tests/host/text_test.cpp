@@ -1,57 +1,49 @@
+#include "host/stepFixture.h"
 #include "support/failureOf.h"
-#include "text/files.h"
 #include "text/json.h"
 #include "text/quantity.h"
 #include "text/words.h"
 
-#include <gtest/gtest.h>
-
 #include <fcntl.h>
-#include <filesystem>
-#include <stdexcept>
+#include <sys/stat.h>
 
 using namespace dravikHost;
 
 namespace {
 
-struct tQuantityRow {
-    const char* text;
-    const tQuantityKind& kind;
-    double value;
-};
-const tQuantityRow kQuantities[] = {
-    {"125ms", kDuration, 125e6},  {"-12ppm", kFrequency, -12e3}, {"1%", kRatio, 0.01},
-    {"+3us", kDuration, 3e3},     {"2min", kDuration, 120e9},    {"1e-3h", kDuration, 3.6e9},
-    {"0", kFrequency, 0},         {"7ppb", kFrequency, 7},       {"1.5s", kDuration, 1.5e9},
-    {"-0.25ns", kDuration, -.25},
-};
-
-struct tRefusedRow {
-    const char* text;
-    const tQuantityKind& kind;
-    const char* why;
-};
-const tRefusedRow kRefused[] = {
-    {"5", kDuration, "'5' has no unit; use ns, us, ms, s, min or h"},
-    {"5ppm", kDuration, "'5ppm' has an unknown unit 'ppm'; use ns, us, ms, s, min or h"},
-    {"5x", kFrequency, "'5x' has an unknown unit 'x'; use ppb or ppm"},
-    {"5", kRatio, "'5' has no unit; use %"},
-    {"1e999s", kDuration, "'1e999s' is out of range"},
-    {"+-1s", kDuration, "'+-1s' does not start with a number"},
-    {"nan", kDuration, "'nan' does not start with a number"},
-    {"inf%", kRatio, "'inf%' does not start with a number"},
-    {"", kDuration, "'' does not start with a number"},
-    {"+", kDuration, "'+' does not start with a number"},
-    {"1,5s", kDuration, "'1,5s' has an unknown unit ',5s'; use ns, us, ms, s, min or h"},
-    {"1 s", kDuration, "'1 s' has an unknown unit ' s'; use ns, us, ms, s, min or h"},
-};
-
 TEST(Quantity, isReadInItsBaseUnit)
 {
-    for (const tQuantityRow& row : kQuantities)
+    const struct {
+        const char* text;
+        const tQuantityKind& kind;
+        double value;
+    } kQuantities[] = {
+        {"125ms", kDuration, 125e6},  {"-12ppm", kFrequency, -12e3}, {"1%", kRatio, 0.01},
+        {"+3us", kDuration, 3e3},     {"2min", kDuration, 120e9},    {"1e-3h", kDuration, 3.6e9},
+        {"0", kFrequency, 0},         {"7ppb", kFrequency, 7},       {"1.5s", kDuration, 1.5e9},
+        {"-0.25ns", kDuration, -.25},
+    };
+    const struct {
+        const char* text;
+        const tQuantityKind& kind;
+        const char* why;
+    } kRefused[] = {
+        {"5ppm", kDuration, " has an unknown unit 'ppm'; use ns, us, ms, s, min or h"},
+        {"5x", kFrequency, " has an unknown unit 'x'; use ppb or ppm"},
+        {"5", kRatio, " has no unit; use %"},
+        {"1e999s", kDuration, " is out of range"},
+        {"+-1s", kDuration, " does not start with a number"},
+        {"nan", kDuration, " does not start with a number"},
+        {"inf%", kRatio, " does not start with a number"},
+        {"", kDuration, " does not start with a number"},
+        {"1,5s", kDuration, " has an unknown unit ',5s'; use ns, us, ms, s, min or h"},
+        {"1 s", kDuration, " has an unknown unit ' s'; use ns, us, ms, s, min or h"},
+    };
+    for (const auto& row : kQuantities)
         EXPECT_DOUBLE_EQ(row.value, parseQuantity(row.text, row.kind)) << row.text;
-    for (const tRefusedRow& row : kRefused)
-        EXPECT_EQ(row.why, failureOf([&] { parseQuantity(row.text, row.kind); }));
+    for (const auto& row : kRefused)
+        EXPECT_EQ(std::string("'") + row.text + "'" + row.why,
+                  failureOf([&] { parseQuantity(row.text, row.kind); }));
 }
 
 TEST(Quantity, isWrittenForPeople)
@@ -124,51 +116,38 @@ TEST(Json, isWrittenMemberByMember)
     EXPECT_EQ(nullptr, parseJson("{"));
 }
 
-class Files : public testing::Test
+TEST(Files, areWrittenAndReplacedAsAWhole)
 {
-protected:
-    Files() : folder(testing::TempDir() + "dravik_files." + std::to_string(getpid()))
-    {
-        std::filesystem::create_directory(folder);
-    }
-    ~Files() override { std::filesystem::remove_all(folder); }
-
-    std::string folder;
-};
-
-TEST_F(Files, areWrittenAndReplacedAsAWhole)
-{
-    const std::string path = folder + "/text";
     const std::string longText(10'000, 'x');
-    writeText(path, longText);
-    EXPECT_EQ(longText, readText(path));
-
-    const tFile reader(std::fopen(path.c_str(), "re"));
-    replaceText(path, "new");
-    EXPECT_EQ("new", readText(path));
+    const tTestFile file("text", longText);
+    EXPECT_EQ(longText, readText(file.path));
+    const tFile reader(std::fopen(file.path.c_str(), "re"));
+    replaceText(file.path, "new");
+    EXPECT_EQ("new", readText(file.path));
     EXPECT_EQ(longText, readToEnd(reader.get(), "reader")); // who reads meanwhile has the old one
-    EXPECT_FALSE(std::filesystem::exists(path + ".new"));
+    EXPECT_NE(0, access((file.path + ".new").c_str(), F_OK));
 }
 
-TEST_F(Files, nameWhatFailsAndWhy)
+TEST(Files, nameWhatFailsAndWhy)
 {
-    const std::string gone = folder + "/no/file";
-    EXPECT_EQ("cannot read " + gone + ": No such file or directory",
-              failureOf([&] { readText(gone); }));
-    EXPECT_EQ("cannot read " + folder + ": Is a directory", failureOf([&] { readText(folder); }));
-    EXPECT_EQ("cannot write " + gone + ": No such file or directory",
-              failureOf([&] { writeText(gone, ""); }));
-    std::filesystem::create_directory(folder + "/folder");
-    EXPECT_EQ("cannot write " + folder + "/folder: Is a directory",
-              failureOf([&] { replaceText(folder + "/folder", ""); }));
+    EXPECT_EQ("cannot read /no/file: No such file or directory",
+              failureOf([] { readText("/no/file"); }));
+    EXPECT_EQ("cannot read /: Is a directory", failureOf([] { readText("/"); }));
+    EXPECT_EQ("cannot write /no/file: No such file or directory",
+              failureOf([] { writeText("/no/file", ""); }));
+    const tTestFile folder("folder");
+    ASSERT_EQ(0, mkdir(folder.path.c_str(), 0700));
+    EXPECT_EQ("cannot write " + folder.path + ": Is a directory",
+              failureOf([&] { replaceText(folder.path, ""); }));
+    rmdir(folder.path.c_str());
     for (const size_t size : {size_t{1}, size_t{1'000'000}}) // when flushed, and when written
         EXPECT_EQ("cannot write /dev/full: No space left on device",
                   failureOf([&] { writeText("/dev/full", std::string(size, 'x')); }));
 }
 
-TEST_F(Files, areClosedWithTheirScope)
+TEST(Files, areClosedWithTheirScope)
 {
-    const int fd = open(folder.c_str(), O_RDONLY | O_CLOEXEC);
+    const int fd = open("/", O_RDONLY | O_CLOEXEC);
     {
         const tDescriptor owner(fd);
         EXPECT_EQ(fd, owner.get());
