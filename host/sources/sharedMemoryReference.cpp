@@ -145,8 +145,8 @@ tSharedMemoryReference::tSharedMemoryReference(int unit, key_t firstKey)
                         unit, state.shm_segsz, kNarrow.size, kWide.size));
     }
     void* const attached = shmat(id, nullptr, 0);
-    if (attached == reinterpret_cast<void*>(-1))
-        fail(errno, unit, key, "attach"); // NOLINT: its failure
+    if (attached == reinterpret_cast<void*>(-1)) // NOLINT(performance-no-int-to-ptr): its failure
+        fail(errno, unit, key, "attach");
     segment = static_cast<unsigned char*>(attached);
 }
 
