@@ -24,7 +24,7 @@ int32_t withinKernel(double limitPpb)
     return static_cast<int32_t>(std::min<double>(limitPpb, widestPpb));
 }
 
-std::unique_ptr<iLiveClock> openPtp(const std::string& path, int32_t limitPpb)
+std::unique_ptr<tKernelClock> openPtp(const std::string& path, int32_t limitPpb)
 {
     const auto device = std::make_shared<tPtpDevice>(path);
     const int32_t narrower = std::min(limitPpb, withinKernel(device->maxOffsetPpb()));
@@ -32,7 +32,7 @@ std::unique_ptr<iLiveClock> openPtp(const std::string& path, int32_t limitPpb)
                                           [device] { return device->crossRead(); });
 }
 
-std::unique_ptr<iLiveClock> openRealtime(int32_t limitPpb)
+std::unique_ptr<tKernelClock> openRealtime(int32_t limitPpb)
 {
     timex state{};
     if (clock_adjtime(CLOCK_REALTIME, &state) < 0)
@@ -58,9 +58,11 @@ bool isClockName(const std::string& name)
 
 std::unique_ptr<iLiveClock> openClock(const tClockChoice& choice)
 {
-    if (const auto path = afterPrefix(choice.name, "phc:")) return openPtp(*path, choice.limitPpb);
-    if (choice.name == "realtime") return openRealtime(choice.limitPpb);
-    return startSoft(choice);
+    if (choice.name == "soft") return startSoft(choice);
+    const auto path = afterPrefix(choice.name, "phc:");
+    auto clock = path ? openPtp(*path, choice.limitPpb) : openRealtime(choice.limitPpb);
+    if (choice.isToBeSet) clock->requireSettable();
+    return clock;
 }
 
 } // namespace dravikHost

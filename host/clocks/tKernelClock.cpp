@@ -40,6 +40,14 @@ tKernelClock::tKernelClock(clockid_t id, std::string name, int32_t limitPpb,
     : id(id), name(std::move(name)), limitPpb(limitPpb), reader(std::move(reader))
 {}
 
+void tKernelClock::requireSettable()
+{
+    timex request{};
+    request.freq = adjust({}, "read").freq;
+    request.modes = ADJ_FREQUENCY;
+    adjust(request, "set the frequency of");
+}
+
 uint64_t tKernelClock::timeNs() { return systemTimeNs(id); }
 
 // The kernel wants seconds of either sign and nanoseconds that are not negative.

@@ -17,6 +17,9 @@ public:
     tKernelClock(clockid_t id, std::string name, int32_t limitPpb,
                  std::function<tCrossReading()> reader);
 
+    // Sets the frequency to what it is: who may not do so finds out at once.
+    void requireSettable();
+
     tCrossReading crossRead() override { return reader(); }
 
     uint64_t timeNs() override;

@@ -4,27 +4,21 @@
 
 namespace dravikHost {
 
-namespace {
-
-tServoHost& tuned(tServoHost& host, const tTuning& tuning)
-{
-    tune(host, tuning);
-    return host;
-}
-
-} // namespace
-
 tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
                          const tDisciplineOptions& options)
     : library(library), options(options), host(library, clock), callsThatMadeIt(host.calls()),
       lock(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
-      later(tuned(host, options.tuning), options.later), inForcePpb(clock.offsetPpb())
-{}
+      tuningNotes(tune(host, options.tuning)), later(host, options.later),
+      inForcePpb(clock.offsetPpb())
+{
+    tuningNotes.insert(tuningNotes.end(), later.notes().begin(), later.notes().end());
+}
 
 tStep tDiscipline::take(const tPair& pair)
 {
     tStep step;
     step.pair = pair;
+    step.dryRun = options.dryRun;
     step.heldBack = spacing.holdsBack(pair.elapsedNs);
     if (!step.heldBack) hand(pair, step);
     step.locked = lock.locked();
@@ -70,24 +64,39 @@ void tDiscipline::clearHistory()
     spacing.restart();
 }
 
-void tDiscipline::retune()
+tNotes tDiscipline::retune()
 {
     tStillClock still;
     tServoHost trial(library, still);
-    tune(trial, options.tuning);
+    tNotes notes = tune(trial, options.tuning);
     tLaterDocuments anew(trial, options.later);
+    notes.insert(notes.end(), anew.notes().begin(), anew.notes().end());
     host.writeConfig(trial.readConfig()); // all keys: what is no longer in a document goes back
     anew.takeOver(later);
     later = anew;
+    return notes;
+}
+
+void begin(const tDiscipline& discipline, const std::string& scenario, iStepObserver& observers)
+{
+    observers.begin(scenario, discipline.firstCalls());
+    for (const std::string& note : discipline.notes())
+        observers.note(0, note);
 }
 
 void disciplineAll(tDiscipline& discipline, iPairSource& source, const std::string& scenario,
                    iStepObserver& observers)
 {
-    observers.begin(scenario, discipline.firstCalls());
-    while (const auto pair = source.next())
-        show(discipline.take(*pair), observers);
+    begin(discipline, scenario, observers);
+    std::exception_ptr failure;
+    try {
+        while (const auto pair = source.next())
+            show(discipline.take(*pair), observers);
+    } catch (...) {
+        failure = std::current_exception();
+    }
     observers.end("");
+    if (failure) std::rethrow_exception(failure);
 }
 
 void show(const tStep& step, iStepObserver& observers)

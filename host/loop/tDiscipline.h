@@ -31,8 +31,9 @@ public:
     // All are borrowed. Throws std::runtime_error if the servo cannot be made or tuned.
     tDiscipline(const tServoLibrary& library, iClock& clock, const tDisciplineOptions& options);
 
-    // The calls that made the servo.
+    // The calls that made the servo, and what is to be known of its documents.
     const tHostCalls& firstCalls() const { return callsThatMadeIt; }
+    const tNotes& notes() const { return tuningNotes; }
 
     tStep take(const tPair& pair);
 
@@ -40,8 +41,8 @@ public:
     void clearHistory();
 
     // Reads all documents again, on a servo of its own first: if it throws std::runtime_error, all
-    // is as it was.
-    void retune();
+    // is as it was. Returns what is to be known of them.
+    tNotes retune();
 
 private:
     void hand(const tPair& pair, tStep& step);
@@ -53,16 +54,20 @@ private:
     tHostCalls callsThatMadeIt;
     tLockObserver lock;
     tMeasureSpacing spacing;
+    tNotes tuningNotes;
     tLaterDocuments later;
     double inForcePpb;
     int64_t steps = 0;
     int64_t locksLost = 0;
 };
 
-// All pairs of a source, one step each. Throws std::runtime_error at the first failure of the
-// servo, once the observers have seen it.
+// All pairs of a source, one step each. The first failure of the servo ends it, and is thrown once
+// the observers have seen the end.
 void disciplineAll(tDiscipline& discipline, iPairSource& source, const std::string& scenario,
                    iStepObserver& observers);
+
+// Shows how a discipline begins.
+void begin(const tDiscipline& discipline, const std::string& scenario, iStepObserver& observers);
 
 // Shows a step, and throws its failure if there is one.
 void show(const tStep& step, iStepObserver& observers);

@@ -13,7 +13,7 @@ tLaterDocuments::tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocu
     if (options.empty()) return;
     firstTuning = servo.readConfig();
     for (const tLaterDocument& option : options)
-        documents.push_back({option, applyConfigFile(servo, option.file)});
+        documents.push_back({option, applyConfigFile(servo, option.file, found)});
     servo.writeConfig(firstTuning);
 }
 

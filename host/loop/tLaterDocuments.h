@@ -1,6 +1,6 @@
 #pragma once
 
-#include "servo/tServoHost.h"
+#include "servo/tuning.h"
 
 #include <cstdint>
 #include <optional>
@@ -24,6 +24,9 @@ public:
     // Throws std::runtime_error if a file cannot be read, or is refused.
     tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& options);
 
+    // What has no effect in a document, or another one than it seems.
+    const tNotes& notes() const { return found; }
+
     // Returns what was done to the servo, for people; mostly "".
     std::string observe(tServoHost& servo, int64_t elapsedNs, bool locked);
 
@@ -35,6 +38,7 @@ private:
         tLaterDocument option;
         std::string text;
     };
+    tNotes found;
     std::string firstTuning;
     std::vector<tDocument> documents;
     size_t applied = 0;

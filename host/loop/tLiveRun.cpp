@@ -18,16 +18,23 @@ tLiveRun::tLiveRun(const tServoLibrary& library, iClock& clock, tSignals& signal
 
 void tLiveRun::run(const std::string& scenario, iLiveSource& source)
 {
-    observers.begin(scenario, discipline.firstCalls());
-    while (const auto moment = source.next()) {
-        if (signals.takeReload()) reload(moment->elapsedNs);
-        if (moment->pair) {
-            take(*moment->pair);
-        } else {
-            silence(moment->elapsedNs);
+    begin(discipline, scenario, observers);
+    std::exception_ptr failure;
+    try {
+        while (const auto moment = source.next()) {
+            if (signals.takeReload()) reload(moment->elapsedNs);
+            leftOut = moment->leftOut;
+            if (moment->pair) {
+                take(*moment->pair);
+            } else {
+                silence(moment->elapsedNs);
+            }
         }
+    } catch (...) { // people see the end of a run that fails too
+        failure = std::current_exception();
     }
     observers.end(source.remarks());
+    if (failure) std::rethrow_exception(failure);
 }
 
 // A step that a guard refuses ends the run: so large an offset is for a person to judge.
@@ -48,7 +55,8 @@ void tLiveRun::take(const tPair& pair)
 {
     endSilence(pair);
     checkSanity(pair);
-    const tStep step = discipline.take(pair);
+    tStep step = discipline.take(pair);
+    step.leftOut = leftOut;
     hadLock = hadLock || step.locked;
     steppedNs += step.stepNs;
     estimate.see(step);
@@ -87,15 +95,17 @@ void tLiveRun::silence(int64_t elapsedNs)
                                            : "no sample from the reference yet");
     }
     const bool inHoldover = isSilent && latestNs;
-    observers.see(inHoldover ? tSilence{elapsedNs, lengthNs, estimate.errorNs(lengthNs)}
-                             : tSilence{elapsedNs, {}, {}});
+    observers.see(inHoldover ? tSilence{elapsedNs, leftOut, lengthNs, estimate.errorNs(lengthNs)}
+                             : tSilence{elapsedNs, leftOut, {}, {}});
 }
 
 void tLiveRun::reload(int64_t elapsedNs)
 {
     try {
-        discipline.retune();
+        const tNotes notes = discipline.retune();
         observers.note(elapsedNs, "documents read again");
+        for (const std::string& note : notes)
+            observers.note(elapsedNs, note);
     } catch (const std::runtime_error& failure) {
         observers.note(elapsedNs, fmt::format("documents stay as they are: {}", failure.what()));
     }

@@ -47,6 +47,7 @@ private:
     tSanityCheck sanity;
     tHoldoverEstimate estimate;
     bool hadLock = false;
+    tLeftOut leftOut;
     int64_t steppedNs = 0;           // the sum of all steps
     std::optional<int64_t> latestNs; // when the latest pair came
     bool isSilent = false;           // for so long that it was noted

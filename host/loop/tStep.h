@@ -15,6 +15,8 @@ namespace dravikHost {
 struct tStep {
     tPair pair{};
     bool heldBack = false;      // for a longer measurement: the servo did not see it
+    bool dryRun = false;        // no order reaches the clock: steps and frequencies are only wishes
+    tLeftOut leftOut;           // samples so far, of a live source
     tHostCalls calls;           // that the servo made
     std::exception_ptr failure; // of the servo; what stands below is of the pair before
     tLockEvent event = kNothingNew;
@@ -29,6 +31,7 @@ struct tStep {
 // The reference says nothing.
 struct tSilence {
     int64_t elapsedNs;
+    tLeftOut leftOut;
     std::optional<int64_t> holdoverNs; // since the last pair, once that is a holdover
     std::optional<double> errorNs;     // by how far the clock may be off, one deviation; if known
 };

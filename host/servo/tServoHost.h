@@ -3,7 +3,9 @@
 #include "clocks/iClock.h"
 #include "servo/tHostCall.h"
 #include "servo/tServoLibrary.h"
+#include "servo/tStatus.h"
 
+#include <exception>
 #include <string>
 
 namespace dravikHost {
@@ -12,13 +14,14 @@ namespace dravikHost {
 class tServoHost
 {
 public:
-    // Library and clock are borrowed. Throws std::runtime_error with the plug-in's code.
+    // Library and clock are borrowed. Throws as adjustTime does.
     tServoHost(const tServoLibrary& library, iClock& clock);
     tServoHost(const tServoHost&) = delete; // the plug-in keeps the address of the table
     tServoHost& operator=(const tServoHost&) = delete;
     ~tServoHost();
 
-    // Throws std::runtime_error with code and payload; the calls made until then are kept.
+    // Throws what the clock threw, or else std::runtime_error with the plug-in's code and payload;
+    // the calls made until then are kept.
     void adjustTime(uint64_t referenceNs, uint64_t clockNs);
 
     // Forgets what it measured. Throws std::runtime_error.
@@ -36,9 +39,12 @@ public:
     struct tSubject {
         iClock& clock;
         tHostCalls calls;
+        std::exception_ptr failure; // of the clock, in the latest call
     };
 
 private:
+    void check(const tStatus& status, const char* what);
+
     const tServoLibrary& library;
     tSubject subject;
     zvckmservo_HostTable table;

@@ -1,7 +1,8 @@
 #include "servo/tuning.h"
 
+#include "servo/configDocument.h"
+#include "servo/defaultDocument.h"
 #include "text/files.h"
-#include "text/json.h"
 
 #include <fmt/format.h>
 
@@ -11,38 +12,50 @@ namespace dravikHost {
 
 namespace {
 
-std::string metaDataOf(const std::string& referenceType)
+// The name is the type's or the file's.
+void applyMetaData(tServoHost& host, const std::string& metaData, const std::string& name,
+                   tNotes& notes)
 {
-    const std::string reference = tJsonObject().add("type", jsonQuoted(referenceType)).line();
-    const std::string references = tJsonObject().add("selected", reference).line();
-    return tJsonObject().add("selectedTRInstID", "\"selected\"").add("TRs", references).line();
-}
-
-// Hands over the text of a file and returns it; a failure names the file.
-std::string handOver(tServoHost& host, void (tServoHost::*take)(const std::string&),
-                     const std::string& path)
-{
-    std::string text = readText(path);
-    try {
-        (host.*take)(text);
-    } catch (const std::runtime_error& failure) {
-        throw std::runtime_error(fmt::format("{}: {}", path, failure.what()));
+    const tDefaultDocument document = applyAndListen(host, metaData);
+    if (!document.failure.empty())
+        throw std::runtime_error(fmt::format("{}: {}", name, document.failure));
+    if (!document.isLogged) return;
+    if (document.file.empty()) {
+        notes.push_back(fmt::format("{}: loads no default document; the types '{}' do", name,
+                                    fmt::join(typesWithDocument(), "' and '")));
+    } else if (document.unreadable) {
+        notes.push_back(fmt::format("{}: its default document {} cannot be read, so the values "
+                                    "stay as they were",
+                                    name, document.file));
     }
-    return text;
 }
 
 } // namespace
 
-void tune(tServoHost& host, const tTuning& tuning)
+tNotes tune(tServoHost& host, const tTuning& tuning)
 {
-    if (tuning.metaDataFile) handOver(host, &tServoHost::applyMetaData, *tuning.metaDataFile);
-    if (tuning.referenceType) host.applyMetaData(metaDataOf(*tuning.referenceType));
-    if (tuning.configFile) applyConfigFile(host, *tuning.configFile);
+    tNotes notes;
+    if (tuning.metaDataFile)
+        applyMetaData(host, readText(*tuning.metaDataFile), *tuning.metaDataFile, notes);
+    if (tuning.referenceType) {
+        applyMetaData(host, metaDataOf(*tuning.referenceType),
+                      fmt::format("type '{}'", *tuning.referenceType), notes);
+    }
+    if (tuning.configFile) applyConfigFile(host, *tuning.configFile, notes);
+    return notes;
 }
 
-std::string applyConfigFile(tServoHost& host, const std::string& path)
+std::string applyConfigFile(tServoHost& host, const std::string& path, tNotes& notes)
 {
-    return handOver(host, &tServoHost::writeConfig, path);
+    std::string text = readText(path);
+    try {
+        host.writeConfig(text);
+    } catch (const std::runtime_error& failure) {
+        throw std::runtime_error(fmt::format("{}: {}", path, failure.what()));
+    }
+    for (const std::string& note : documentNotes(text))
+        notes.push_back(fmt::format("{}: {}", path, note));
+    return text;
 }
 
 } // namespace dravikHost

@@ -4,6 +4,7 @@
 
 #include <optional>
 #include <string>
+#include <vector>
 
 namespace dravikHost {
 
@@ -14,11 +15,15 @@ struct tTuning {
     std::optional<std::string> configFile;
 };
 
-// The metadata come first, so that the document given wins over the default one of their type.
-// Throws std::runtime_error that tells what could not be read, or was refused and why.
-void tune(tServoHost& host, const tTuning& tuning);
+// Things that a person should know, a line each.
+using tNotes = std::vector<std::string>;
 
-// Returns the text of the file.
-std::string applyConfigFile(tServoHost& host, const std::string& path);
+// The metadata come first, so that the document given wins over the default one of their type.
+// Returns what has no effect or another one than it seems. Throws std::runtime_error that says what
+// could not be read, or was refused and why.
+tNotes tune(tServoHost& host, const tTuning& tuning);
+
+// Returns the text of the file, and adds to the notes.
+std::string applyConfigFile(tServoHost& host, const std::string& path, tNotes& notes);
 
 } // namespace dravikHost

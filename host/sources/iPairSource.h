@@ -27,9 +27,18 @@ public:
     virtual std::optional<tPair> next() = 0;
 };
 
+// Samples of a reference that became no pair, so far.
+struct tLeftOut {
+    int64_t outOfDate = 0; // from before the latest order to the clock, or from the future
+    int64_t unusable = 0;  // as the reference itself says, or malformed
+
+    int64_t all() const { return outOfDate + unusable; }
+};
+
 // Now, and what there is.
 struct tLiveMoment {
     int64_t elapsedNs; // since the start, by CLOCK_MONOTONIC_RAW
+    tLeftOut leftOut;
     std::optional<tPair> pair;
 };
 

@@ -26,7 +26,7 @@ std::optional<tLiveMoment> tLiveSource::next()
     const auto sample = reference.next(std::clamp<int64_t>(leftNs, 0, kNapNs));
     if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
         return std::nullopt;
-    if (!sample) return tLiveMoment{elapsedNs(), {}};
+    if (!sample) return tLiveMoment{elapsedNs(), leftOut(), {}};
     const tMoment now = crossRead();
     const bool even = ranEvenly(now);
     const bool upToDate =
@@ -34,19 +34,22 @@ std::optional<tLiveMoment> tLiveSource::next()
     if (even && upToDate) {
         const tPair pair = pairAt(*sample, now);
         ordered.reset();
-        return tLiveMoment{pair.elapsedNs, pair};
+        return tLiveMoment{pair.elapsedNs, leftOut(), pair};
     }
     ++outOfDate;
     if (!even) ordered = now;
-    return tLiveMoment{now.elapsedNs, {}};
+    return tLiveMoment{now.elapsedNs, leftOut(), {}};
 }
 
 std::string tLiveSource::remarks() const
 {
-    if (outOfDate == 0 && reference.unusable() == 0) return "";
+    const tLeftOut samples = leftOut();
+    if (samples.all() == 0) return "";
     return fmt::format("left out of the reference's samples: {} out of date, {} not usable",
-                       outOfDate, reference.unusable());
+                       samples.outOfDate, samples.unusable);
 }
+
+tLeftOut tLiveSource::leftOut() const { return {outOfDate, reference.unusable()}; }
 
 int64_t tLiveSource::elapsedNs() const
 {

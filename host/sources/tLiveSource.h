@@ -32,6 +32,7 @@ private:
     };
 
     int64_t elapsedNs() const;
+    tLeftOut leftOut() const;
     tMoment crossRead();
     bool ranEvenly(const tMoment& now) const;
     tPair pairAt(const tReferenceSample& sample, const tMoment& now) const;

@@ -27,10 +27,11 @@ void run(const tCheck& options)
     const tServoLibrary library(tServoLibrary::find(options.library));
     tStillClock clock;
     tServoHost host(library, clock);
-    const std::string document = applyConfigFile(host, options.file);
+    tNotes notes;
+    applyConfigFile(host, options.file, notes);
     writeText("-", host.readConfig() + "\n");
-    for (const std::string& note : documentNotes(document))
-        fmt::print(stderr, "dravik-host: {}: {}\n", options.file, note);
+    for (const std::string& note : notes)
+        fmt::print(stderr, "dravik-host: {}\n", note);
     if (options.intervalNs == 0) return;
     const auto inForce = tServoParameters::of(host.readConfig());
     fmt::print(stderr, "{}", loopAdvice(inForce, secondsOf(options.intervalNs), options.noiseNs));

@@ -54,14 +54,14 @@ void run(const tRun& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.discipline.library));
     tSignals signals;
-    const auto clock =
-        openClock({options.clock, options.discipline.maxFrequencyOffsetPpb,
-                   options.initialError.offsetNs, options.initialError.frequencyPpb});
+    const auto clock = openClock({options.clock, options.discipline.maxFrequencyOffsetPpb,
+                                  !options.discipline.dryRun, options.initialError.offsetNs,
+                                  options.initialError.frequencyPpb});
     const auto reference = openReference(options.reference, options.intervalNs);
     tLiveSource source(*clock, *reference, signals, options.source);
 
     tConsole console(options.discipline.csv == "-");
-    tTraceFile trace(options.discipline.csv, options.discipline.dryRun);
+    tTraceFile trace(options.discipline.csv);
     tReport report(console);
     tStatusLines status(options.statusIntervalNs, console);
     tMetricsFile metrics(options.metricsFile, console);

@@ -124,7 +124,7 @@ void runInMadeTime(const tServoLibrary& library, iClock& clock, iPairSource& sou
                    const std::string& scenario, const tDisciplineOptions& options)
 {
     tConsole console(options.csv == "-");
-    tTraceFile trace(options.csv, options.dryRun);
+    tTraceFile trace(options.csv);
     tReport report(console);
     tSummary summary(console);
     tObservers observers = {&trace, &report, &summary};

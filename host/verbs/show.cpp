@@ -5,6 +5,9 @@
 #include "text/files.h"
 #include "verbs/shared.h"
 
+#include <fmt/format.h>
+
+#include <cstdio>
 #include <memory>
 
 namespace dravikHost {
@@ -21,7 +24,8 @@ void run(const tShow& options)
     const tServoLibrary library(tServoLibrary::find(options.library));
     tStillClock clock;
     tServoHost host(library, clock);
-    tune(host, options.tuning);
+    for (const std::string& note : tune(host, options.tuning))
+        fmt::print(stderr, "dravik-host: {}\n", note);
     writeText("-", host.readConfig() + "\n");
 }
 

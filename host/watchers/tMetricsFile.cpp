@@ -25,7 +25,7 @@ void tMetricsFile::see(const tStep& step)
     if (step.failure) return;
     latest = step;
     pairs += step.heldBack ? 0 : 1;
-    write({step.pair.elapsedNs, {}, {}});
+    write({step.pair.elapsedNs, step.leftOut, {}, {}});
 }
 
 void tMetricsFile::see(const tSilence& silence) { write(silence); }
@@ -64,11 +64,18 @@ std::string tMetricsFile::text(const tSilence& now) const
         {"dravik_locks_lost_total", "counter", "Locks lost.",
          static_cast<double>(latest.locksLost)},
         {"dravik_steps_total", "counter", "Steps of the clock.", static_cast<double>(latest.steps)},
+        {"dravik_samples_out_of_date_total", "counter",
+         "Samples of the reference from before the latest order to the clock.",
+         static_cast<double>(now.leftOut.outOfDate)},
+        {"dravik_samples_unusable_total", "counter", "Samples of the reference not usable.",
+         static_cast<double>(now.leftOut.unusable)},
     };
     std::string text;
     for (const tMetric& metric : metrics) {
-        text += fmt::format("# HELP {0} {1}\n# TYPE {0} {2}\n{0} {3:.9g}\n", metric.name,
-                            metric.help, metric.type, metric.value);
+        const std::string value =
+            std::isnan(metric.value) ? "NaN" : fmt::format("{:.9g}", metric.value);
+        text += fmt::format("# HELP {0} {1}\n# TYPE {0} {2}\n{0} {3}\n", metric.name, metric.help,
+                            metric.type, value);
     }
     return text;
 }

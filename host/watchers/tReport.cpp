@@ -20,13 +20,15 @@ std::string eventText(const tStep& step)
     const std::string error = signedDurationText(step.pair.errorNs());
     switch (step.event) {
     case kFrequencyMeasured: // the correction, the other way round, is how far it had been off
-        return fmt::format("frequency measured: {} off, now steered by {}",
+        return fmt::format("frequency measured: {} off, {} by {}",
                            offsetText(valueOf(step.calls, kGetFrequency) - orderedPpb),
+                           step.dryRun ? "would be steered" : "now steered",
                            offsetText(orderedPpb));
     case kFrequencyAtLimit:
         return fmt::format("frequency at its limit, {}", offsetText(orderedPpb));
     case kStepped:
-        return fmt::format("stepped by {}", signedDurationText(valueOf(step.calls, kStepTime)));
+        return fmt::format("{} by {}", step.dryRun ? "would step" : "stepped",
+                           signedDurationText(valueOf(step.calls, kStepTime)));
     case kNotStepped:
         return fmt::format("no step needed, error {}", error);
     case kLockGained:

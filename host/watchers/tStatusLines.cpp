@@ -35,9 +35,9 @@ void tStatusLines::see(const tStep& step)
 
 void tStatusLines::printPair(const tStep& step)
 {
-    console.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}\n",
+    console.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}{}\n",
                               headText(step.pair.elapsedNs), step.pair.errorNs(), stateOf(step),
-                              0 - step.inForcePpb));
+                              0 - step.inForcePpb, newlyLeftOut(step.leftOut)));
 }
 
 void tStatusLines::printStretch(const tStep& step)
@@ -46,11 +46,20 @@ void tStatusLines::printStretch(const tStep& step)
     figures.add(step.pair, step.inForcePpb);
     if (!lineNs) lineNs = elapsedNs;
     if (elapsedNs - *lineNs < *intervalNs) return;
-    console.print(fmt::format("{} rms {:>4.0f} max {:>4.0f} freq {:>+7.0f} +/- {:>3.0f}\n",
+    console.print(fmt::format("{} rms {:>4.0f} max {:>4.0f} freq {:>+7.0f} +/- {:>3.0f}{}\n",
                               headText(elapsedNs), figures.rmsNs(), figures.peakNs(),
-                              0 - figures.meanPpb(), figures.deviationPpb()));
+                              0 - figures.meanPpb(), figures.deviationPpb(),
+                              newlyLeftOut(step.leftOut)));
     lineNs = elapsedNs;
     figures = {};
+}
+
+// Samples that became no pair since the last line.
+std::string tStatusLines::newlyLeftOut(const tLeftOut& leftOut)
+{
+    const int64_t count = leftOut.all() - leftOutBefore;
+    leftOutBefore = leftOut.all();
+    return count == 0 ? "" : fmt::format(" left out {}", count);
 }
 
 // At most once a second.

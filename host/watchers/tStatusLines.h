@@ -14,6 +14,7 @@ namespace dravikHost {
 //     dravik-host[60.000]: rms   23 max   45 freq  +12345 +/-   12
 //     dravik-host[90.000]: holdover for 20 s, error about 34 ns
 //
+// followed by " left out 3" if so many samples since the last line became no pair.
 // The offset is clock minus reference, in ns. The state is s0 before the lock, s1 if the clock was
 // stepped, s2 when locked. Freq is by how many ppb the clock was found to be fast: minus the offset
 // in force.
@@ -31,11 +32,13 @@ public:
 private:
     void printPair(const tStep& step);
     void printStretch(const tStep& step);
+    std::string newlyLeftOut(const tLeftOut& leftOut);
 
     std::optional<int64_t> intervalNs;
     tConsole& console;
     tRunningFigures figures; // since the last line
     std::optional<int64_t> lineNs;
+    int64_t leftOutBefore = 0; // samples, at the last line
 };
 
 } // namespace dravikHost

@@ -9,35 +9,64 @@
 
 namespace dravikHost {
 
-void tSummary::addCalls(const tHostCalls& calls)
+namespace {
+
+std::string times(int64_t count) { return fmt::format("{} time{}", count, count == 1 ? "" : "s"); }
+
+} // namespace
+
+void tSummary::tErrors::add(double errorNs)
+{
+    ++pairs;
+    squares += errorNs * errorNs;
+    peak = std::max(peak, std::fabs(errorNs));
+}
+
+std::string tSummary::tErrors::text() const
+{
+    return fmt::format("RMS {}, peak {}",
+                       durationText(std::sqrt(squares / static_cast<double>(pairs))),
+                       durationText(peak));
+}
+
+void tSummary::begin(const std::string& /*scenario*/, const tHostCalls& calls)
+{
+    addCalls(calls, false);
+}
+
+// What a dry run held back was not done, so it does not count as a call.
+void tSummary::addCalls(const tHostCalls& calls, bool held)
 {
     for (const tHostCall& call : calls) {
-        if (call.operation == kSetFrequency) {
-            const bool first = callCounts[kSetFrequency] == 0;
-            lowestPpb = first ? call.value : std::min(lowestPpb, call.value);
-            highestPpb = first ? call.value : std::max(highestPpb, call.value);
-            lastPpb = call.value;
-        }
-        ++callCounts[call.operation];
+        if (!held || !isOrder(call.operation)) ++callCounts[call.operation];
+        if (call.operation != kSetFrequency) continue;
+        lowestPpb = lastPpb ? std::min(lowestPpb, call.value) : call.value;
+        highestPpb = lastPpb ? std::max(highestPpb, call.value) : call.value;
+        lastPpb = call.value;
     }
 }
 
-void tSummary::begin(const std::string& /*scenario*/, const tHostCalls& calls) { addCalls(calls); }
-
 void tSummary::see(const tStep& step)
 {
-    const tPair& pair = step.pair;
+    if (firstLockNs && !locked) unlockedNs += step.pair.elapsedNs - lastElapsedNs;
     ++pairs;
-    lastElapsedNs = pair.elapsedNs;
     heldBack += step.heldBack ? 1 : 0;
+    lastElapsedNs = step.pair.elapsedNs;
     locksLost = step.locksLost;
-    addCalls(step.calls);
-    if (step.heldBack || !step.locked) return;
-    if (lockedPairs++ == 0) firstLockNs = pair.elapsedNs;
-    againstTruth = pair.trueErrorNs.has_value();
-    lastErrorNs = pair.trueErrorNs.value_or(static_cast<double>(pair.errorNs()));
-    squaresNs2 += lastErrorNs * lastErrorNs;
-    peakNs = std::max(peakNs, std::fabs(lastErrorNs));
+    locksMissed += step.event == kLockMissed ? 1 : 0;
+    locked = step.locked;
+    dryRun = step.dryRun;
+    addCalls(step.calls, step.dryRun);
+    if (!firstLockNs && locked) firstLockNs = lastElapsedNs;
+    if (firstLockNs) addError(step);
+}
+
+void tSummary::addError(const tStep& step)
+{
+    againstTruth = step.pair.trueErrorNs.has_value();
+    lastErrorNs = step.pair.trueErrorNs.value_or(static_cast<double>(step.pair.errorNs()));
+    sinceLock.add(lastErrorNs);
+    if (step.locked) whileLocked.add(lastErrorNs);
 }
 
 void tSummary::end(const std::string& /*remarks*/) { console.print(text()); }
@@ -46,33 +75,43 @@ std::string tSummary::text() const
 {
     const std::string held = heldBack > 0 ? fmt::format("; {} held back", heldBack) : "";
     return fmt::format("pairs       {} in {} s{}\n", pairs, secondsText(lastElapsedNs, 3), held) +
-           lockText() + errorText() + frequencyText() + callsText();
+           lockText() + errorText() + frequencyText() + callsText() + warningText();
+}
+
+double tSummary::shareUnlocked() const
+{
+    const int64_t sinceNs = firstLockNs ? lastElapsedNs - *firstLockNs : 0;
+    return sinceNs > 0 ? static_cast<double>(unlockedNs) / static_cast<double>(sinceNs) : 0;
 }
 
 std::string tSummary::lockText() const
 {
-    if (lockedPairs == 0) return "lock        never\n";
-    return fmt::format("lock        after {} s, lost {} time{}; {} pairs locked\n",
-                       secondsText(firstLockNs, 3), locksLost, locksLost == 1 ? "" : "s",
-                       lockedPairs);
+    if (!firstLockNs) return fmt::format("lock        never; missed {}\n", times(locksMissed));
+    return fmt::format("lock        after {} s, lost {}, missed {}; {} of {} pairs locked since\n",
+                       secondsText(*firstLockNs, 3), times(locksLost), times(locksMissed),
+                       whileLocked.pairs, sinceLock.pairs);
 }
 
 std::string tSummary::errorText() const
 {
-    if (lockedPairs == 0) return "";
-    return fmt::format("error       RMS {}, peak {}, last {}\n"
-                       "            (of the clock against {}, while locked)\n",
-                       durationText(std::sqrt(squaresNs2 / static_cast<double>(lockedPairs))),
-                       durationText(peakNs), signedDurationText(lastErrorNs),
+    if (!firstLockNs) return "";
+    const std::string locked =
+        whileLocked.pairs < sinceLock.pairs
+            ? fmt::format("            while locked: {}\n", whileLocked.text())
+            : "";
+    return fmt::format("error       {}, last {}\n{}            (of the clock against {}, all pairs "
+                       "since the first lock)\n",
+                       sinceLock.text(), signedDurationText(lastErrorNs), locked,
                        againstTruth ? "the true time" : "the reference as measured");
 }
 
 std::string tSummary::frequencyText() const
 {
-    if (callCounts[kSetFrequency] == 0) return "frequency   never ordered\n";
+    if (!lastPpb) return "frequency   never ordered\n";
     const auto text = [](int64_t ppb) { return offsetText(static_cast<double>(ppb)); };
-    return fmt::format("frequency   ordered {} to {}, last {}\n", text(lowestPpb), text(highestPpb),
-                       text(lastPpb));
+    return fmt::format("frequency   {} {} to {}, last {}\n",
+                       dryRun ? "would be ordered" : "ordered", text(lowestPpb), text(highestPpb),
+                       text(*lastPpb));
 }
 
 std::string tSummary::callsText() const
@@ -84,6 +123,23 @@ std::string tSummary::callsText() const
         list += fmt::format("{} {}", kHostOperationNames[i], callCounts[i]);
     }
     return list + "\n";
+}
+
+// A run that was without its lock is not judged by the time that it had one.
+std::string tSummary::warningText() const
+{
+    constexpr const char* kAdvice =
+        "            Compare the document with the noise: dravik-host check DOCUMENT --interval "
+        "TIME\n"
+        "            --noise TIME; or design one: dravik-host tune TRACE\n";
+    if (dryRun || pairs == 0) return "";
+    if (!firstLockNs)
+        return fmt::format("WARNING     the clock was never locked\n{}",
+                           locksMissed > 0 ? kAdvice : "");
+    if (locksLost == 0) return "";
+    return fmt::format(
+        "WARNING     the lock did not hold: lost {}, {:.3g} % of the time without it\n{}",
+        times(locksLost), shareUnlocked() * 100, kAdvice);
 }
 
 } // namespace dravikHost

@@ -6,7 +6,7 @@
 
 namespace dravikHost {
 
-tTraceFile::tTraceFile(const std::string& path, bool dryRun) : dryRun(dryRun)
+tTraceFile::tTraceFile(const std::string& path)
 {
     if (path.empty()) return;
     file.emplace(path);
@@ -15,7 +15,7 @@ tTraceFile::tTraceFile(const std::string& path, bool dryRun) : dryRun(dryRun)
 
 void tTraceFile::begin(const std::string& /*scenario*/, const tHostCalls& calls)
 {
-    if (file) addCalls(0, calls);
+    if (file) addCalls(0, calls, false);
 }
 
 // After a failure nothing follows, so what led to it is written out.
@@ -27,17 +27,16 @@ void tTraceFile::see(const tStep& step)
         pair.trueErrorNs ? fmt::format("{:.3f}", *pair.trueErrorNs) : std::string();
     file->write(fmt::format("pair,{},{},{},{},{},,\n", secondsText(pair.elapsedNs, 9),
                             pair.referenceNs, pair.clockNs, pair.errorNs(), trueError));
-    addCalls(pair.elapsedNs, step.calls);
+    addCalls(pair.elapsedNs, step.calls, step.dryRun);
     if (step.failure) file->flush();
 }
 
-void tTraceFile::addCalls(int64_t elapsedNs, const tHostCalls& calls)
+void tTraceFile::addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held)
 {
     for (const tHostCall& call : calls) {
-        const bool held = dryRun && isOrder(call.operation);
-        file->write(fmt::format("{},{},,,,,{},{}\n", held ? "held" : "call",
-                                secondsText(elapsedNs, 9), kHostOperationNames[call.operation],
-                                call.value));
+        const char* const kind = held && isOrder(call.operation) ? "held" : "call";
+        file->write(fmt::format("{},{},,,,,{},{}\n", kind, secondsText(elapsedNs, 9),
+                                kHostOperationNames[call.operation], call.value));
     }
 }
 

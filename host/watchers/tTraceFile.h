@@ -13,7 +13,7 @@ namespace dravikHost {
 class tTraceFile : public iStepObserver
 {
 public:
-    tTraceFile(const std::string& path, bool dryRun); // "": none is written; "-": stdout
+    explicit tTraceFile(const std::string& path); // "": none is written; "-": stdout
 
     void begin(const std::string& scenario, const tHostCalls& calls) override;
     void see(const tStep& step) override;
@@ -21,10 +21,9 @@ public:
     using iStepObserver::see;
 
 private:
-    void addCalls(int64_t elapsedNs, const tHostCalls& calls);
+    void addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held);
 
     std::optional<tOutputFile> file;
-    bool dryRun;
 };
 
 } // namespace dravikHost
