@@ -1,14 +1,13 @@
 #include "servo/configDocument.h"
 
 #include "text/json.h"
+#include "text/words.h"
 #include "zvckmservo/parameters.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
-#include <cctype>
 #include <cstring>
-#include <numeric>
 #include <string_view>
 #include <strings.h>
 
@@ -74,34 +73,12 @@ const zvckmservo_Parameter* keyNamed(const char* name)
     return key == std::end(zvckmservo_parameters) ? nullptr : key;
 }
 
-// Letters to insert, leave out or replace to make one word of the other.
-size_t distance(std::string_view one, std::string_view other)
-{
-    std::vector<size_t> row(other.size() + 1);
-    std::iota(row.begin(), row.end(), size_t{0});
-    for (size_t i = 0; i < one.size(); ++i) {
-        size_t diagonal = row[0];
-        row[0] = i + 1;
-        for (size_t j = 0; j < other.size(); ++j) {
-            const bool same = std::tolower(one[i]) == std::tolower(other[j]);
-            const size_t replaced = diagonal + (same ? 0 : 1);
-            diagonal = row[j + 1];
-            row[j + 1] = std::min({replaced, row[j] + 1, row[j + 1] + 1});
-        }
-    }
-    return row.back();
-}
-
 std::string unknownText(const char* name)
 {
-    const auto nearest = std::min_element(
-        std::begin(zvckmservo_parameters), std::end(zvckmservo_parameters),
-        [name](const zvckmservo_Parameter& one, const zvckmservo_Parameter& other) {
-            return distance(name, one.key) < distance(name, other.key);
-        });
-    const bool near = distance(name, nearest->key) <= std::strlen(nearest->key) / 3;
-    return fmt::format("{} is not a key and sets nothing{}", name,
-                       near ? fmt::format("; did you mean {}?", nearest->key) : "");
+    std::vector<std::string> keys;
+    for (const zvckmservo_Parameter& parameter : zvckmservo_parameters)
+        keys.emplace_back(parameter.key);
+    return fmt::format("{} is not a key and sets nothing{}", name, didYouMean(name, keys));
 }
 
 // "" if the value is taken as it looks.

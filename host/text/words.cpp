@@ -3,8 +3,32 @@
 #include "text/quantity.h"
 
 #include <algorithm>
+#include <cctype>
+#include <numeric>
 
 namespace dravikHost {
+
+namespace {
+
+// Letters to insert, leave out or replace to make one word of the other.
+size_t distance(std::string_view one, std::string_view other)
+{
+    std::vector<size_t> row(other.size() + 1);
+    std::iota(row.begin(), row.end(), size_t{0});
+    for (size_t i = 0; i < one.size(); ++i) {
+        size_t diagonal = row[0];
+        row[0] = i + 1;
+        for (size_t j = 0; j < other.size(); ++j) {
+            const bool same = std::tolower(one[i]) == std::tolower(other[j]);
+            const size_t replaced = diagonal + (same ? 0 : 1);
+            diagonal = row[j + 1];
+            row[j + 1] = std::min({replaced, row[j] + 1, row[j + 1] + 1});
+        }
+    }
+    return row.back();
+}
+
+} // namespace
 
 std::string_view takeLine(std::string_view& text)
 {
@@ -45,6 +69,18 @@ std::optional<int64_t> secondsIn(std::string_view text)
     for (size_t i = digits.size(); i < 9; ++i)
         fractionNs *= 10;
     return ns + fractionNs;
+}
+
+std::string didYouMean(std::string_view word, const std::vector<std::string>& words)
+{
+    constexpr size_t kLettersPerSlip = 3;
+    const auto nearest = std::min_element(words.begin(), words.end(),
+                                          [word](const std::string& one, const std::string& other) {
+                                              return distance(word, one) < distance(word, other);
+                                          });
+    if (nearest == words.end() || distance(word, *nearest) > nearest->size() / kLettersPerSlip)
+        return "";
+    return "; did you mean " + *nearest + "?";
 }
 
 } // namespace dravikHost

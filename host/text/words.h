@@ -5,6 +5,7 @@
 #include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace dravikHost {
 
@@ -39,5 +40,8 @@ inline std::optional<std::string> afterPrefix(const std::string& text, std::stri
         return std::nullopt;
     return text.substr(prefix.size());
 }
+
+// "; did you mean X?" with the likeliest of the words for a misspelt one; "" if none is like it.
+std::string didYouMean(std::string_view word, const std::vector<std::string>& words);
 
 } // namespace dravikHost

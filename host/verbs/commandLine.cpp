@@ -1,5 +1,6 @@
 #include "verbs/commandLine.h"
 
+#include "text/words.h"
 #include "verbs/verbs.h"
 
 #include <CLI/CLI.hpp>
@@ -36,6 +37,25 @@ void takeOrRefuse(const std::string& names, const tOptionSet::tTake& take, const
     }
 }
 
+int misspelt(const CLI::App& app, const std::vector<tVerb>& verbs)
+{
+    const auto chosen = app.get_subcommands();
+    const CLI::App& verb = chosen.empty() ? app : *chosen.front();
+    const std::vector<std::string> extras = app.remaining(true);
+    const std::string word =
+        extras.empty() ? "" : extras.front().substr(0, extras.front().find('='));
+    std::vector<std::string> known;
+    for (const CLI::Option* const option : verb.get_options())
+        known.push_back(option->get_name());
+    if (chosen.empty())
+        for (const tVerb& each : verbs)
+            known.emplace_back(each.name);
+    const char* const kind = word.front() == '-' ? "option" : chosen.empty() ? "verb" : "argument";
+    (void)std::fprintf(stderr, "dravik-host: unknown %s %s%s\n", kind, word.c_str(),
+                       didYouMean(word, known).c_str());
+    return kUsage;
+}
+
 int parseAndRun(int argc, char** argv, const std::vector<tVerb>& verbs)
 {
     CLI::App app("Reference host of the clock servo plug-in", "dravik-host");
@@ -52,9 +72,14 @@ int parseAndRun(int argc, char** argv, const std::vector<tVerb>& verbs)
     }
     try {
         app.parse(argc, argv);
-        if (!chosen) throw CLI::RequiredError("A verb, such as simulate or run,");
+    } catch (const CLI::ExtrasError&) {
+        return misspelt(app, verbs);
     } catch (const CLI::ParseError& outcome) { // help and version come this way too
         return app.exit(outcome) == 0 ? kGood : kUsage;
+    }
+    if (!chosen) {
+        (void)std::fputs(app.help().c_str(), stderr);
+        return kUsage;
     }
     chosen();
     return kGood;
