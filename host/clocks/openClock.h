@@ -11,9 +11,9 @@ namespace dravikHost {
 struct tClockChoice {
     std::string name = "soft";
     int32_t limitPpb = 0;      // the widest offset of its rate that is wanted
-    bool isToBeSet = true;     // or only read, in a dry run
     int64_t startOffsetNs = 0; // how wrong the soft clock starts
     double startFrequencyPpb = 0;
+    bool isToBeSet = true; // or only read, in a dry run
 };
 
 bool isClockName(const std::string& name);

@@ -6,7 +6,7 @@
 
 namespace dravikHost {
 
-void tHoldoverEstimate::see(const tStep& step)
+void tHoldoverEstimate::add(const tStep& step)
 {
     if (!step.locked) {
         window = previous = {};

@@ -9,11 +9,10 @@ namespace dravikHost {
 
 // A clock whose reference is silent keeps the frequency that it was last given, and its error grows
 // with what that frequency was unsure by.
-class tHoldoverEstimate : public iStepObserver
+class tHoldoverEstimate
 {
 public:
-    void see(const tStep& step) override;
-    using iStepObserver::see;
+    void add(const tStep& step);
 
     // By how far the clock may be off after so long, one deviation; nothing if it has not been
     // locked for long enough to know.

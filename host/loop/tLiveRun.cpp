@@ -59,7 +59,7 @@ void tLiveRun::take(const tPair& pair)
     step.leftOut = leftOut;
     hadLock = hadLock || step.locked;
     steppedNs += step.stepNs;
-    estimate.see(step);
+    estimate.add(step);
     show(step, observers);
 }
 
@@ -95,8 +95,8 @@ void tLiveRun::silence(int64_t elapsedNs)
                                            : "no sample from the reference yet");
     }
     const bool inHoldover = isSilent && latestNs;
-    observers.see(inHoldover ? tSilence{elapsedNs, leftOut, lengthNs, estimate.errorNs(lengthNs)}
-                             : tSilence{elapsedNs, leftOut, {}, {}});
+    observers.see(inHoldover ? tSilence{elapsedNs, lengthNs, estimate.errorNs(lengthNs), leftOut}
+                             : tSilence{elapsedNs, {}, {}, leftOut});
 }
 
 void tLiveRun::reload(int64_t elapsedNs)

@@ -30,10 +30,10 @@ struct tStep {
 
 // The reference says nothing.
 struct tSilence {
-    int64_t elapsedNs;
-    tLeftOut leftOut;
-    std::optional<int64_t> holdoverNs; // since the last pair, once that is a holdover
-    std::optional<double> errorNs;     // by how far the clock may be off, one deviation; if known
+    int64_t elapsedNs = 0;
+    std::optional<int64_t> holdoverNs{}; // since the last pair, once that is a holdover
+    std::optional<double> errorNs{};     // by how far the clock may be off, one deviation; if known
+    tLeftOut leftOut{};                  // samples so far
 };
 
 // Somebody who watches a clock under discipline. Nobody asks a watcher what to do next.

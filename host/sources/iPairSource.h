@@ -38,8 +38,8 @@ struct tLeftOut {
 // Now, and what there is.
 struct tLiveMoment {
     int64_t elapsedNs; // since the start, by CLOCK_MONOTONIC_RAW
-    tLeftOut leftOut;
     std::optional<tPair> pair;
+    tLeftOut leftOut{};
 };
 
 // Where pairs come from at the pace of real time, or do not.

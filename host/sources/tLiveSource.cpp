@@ -26,7 +26,7 @@ std::optional<tLiveMoment> tLiveSource::next()
     const auto sample = reference.next(std::clamp<int64_t>(leftNs, 0, kNapNs));
     if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
         return std::nullopt;
-    if (!sample) return tLiveMoment{elapsedNs(), leftOut(), {}};
+    if (!sample) return tLiveMoment{elapsedNs(), {}, leftOut()};
     const tMoment now = crossRead();
     const bool even = ranEvenly(now);
     const bool upToDate =
@@ -34,11 +34,11 @@ std::optional<tLiveMoment> tLiveSource::next()
     if (even && upToDate) {
         const tPair pair = pairAt(*sample, now);
         ordered.reset();
-        return tLiveMoment{pair.elapsedNs, leftOut(), pair};
+        return tLiveMoment{pair.elapsedNs, pair, leftOut()};
     }
     ++outOfDate;
     if (!even) ordered = now;
-    return tLiveMoment{now.elapsedNs, leftOut(), {}};
+    return tLiveMoment{now.elapsedNs, {}, leftOut()};
 }
 
 std::string tLiveSource::remarks() const

@@ -55,8 +55,8 @@ void run(const tRun& options)
     const tServoLibrary library(tServoLibrary::find(options.discipline.library));
     tSignals signals;
     const auto clock = openClock({options.clock, options.discipline.maxFrequencyOffsetPpb,
-                                  !options.discipline.dryRun, options.initialError.offsetNs,
-                                  options.initialError.frequencyPpb});
+                                  options.initialError.offsetNs, options.initialError.frequencyPpb,
+                                  !options.discipline.dryRun});
     const auto reference = openReference(options.reference, options.intervalNs);
     tLiveSource source(*clock, *reference, signals, options.source);
 

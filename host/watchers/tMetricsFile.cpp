@@ -25,15 +25,27 @@ void tMetricsFile::see(const tStep& step)
     if (step.failure) return;
     latest = step;
     pairs += step.heldBack ? 0 : 1;
-    write({step.pair.elapsedNs, step.leftOut, {}, {}});
+    write({step.pair.elapsedNs, {}, {}, step.leftOut});
 }
 
 void tMetricsFile::see(const tSilence& silence) { write(silence); }
 
+// What happened last is to be seen, however soon after the file before.
+void tMetricsFile::end(const std::string& /*remarks*/)
+{
+    if (!path.empty() && writtenNs) put(last);
+}
+
 void tMetricsFile::write(const tSilence& now)
 {
     if (path.empty()) return;
+    last = now;
     if (writtenNs && now.elapsedNs - *writtenNs < kSecondNs) return;
+    put(now);
+}
+
+void tMetricsFile::put(const tSilence& now)
+{
     const bool isFirst = !writtenNs;
     writtenNs = now.elapsedNs;
     try {
@@ -52,7 +64,7 @@ std::string tMetricsFile::text(const tSilence& now) const
     const double errorNs = now.holdoverNs ? now.errorNs.value_or(unknown) : 0;
     const tMetric metrics[] = {
         {"dravik_offset_seconds", "gauge", "Clock minus reference, as measured last.",
-         secondsOf(latest.pair.errorNs())},
+         pairs > 0 ? secondsOf(latest.pair.errorNs()) : unknown},
         {"dravik_frequency_offset", "gauge", "Offset of the clock's rate in force, a fraction.",
          latest.inForcePpb * 1e-9},
         {"dravik_locked", "gauge", "Whether the servo is locked.", latest.locked ? 1.0 : 0.0},

@@ -20,14 +20,17 @@ public:
     // the discipline goes on.
     void see(const tStep& step) override;
     void see(const tSilence& silence) override;
+    void end(const std::string& remarks) override;
 
 private:
     void write(const tSilence& now);
+    void put(const tSilence& now);
     std::string text(const tSilence& now) const;
 
     std::string path;
     tConsole& console;
     tStep latest;
+    tSilence last{};   // moment, of a pair or of silence
     int64_t pairs = 0; // handed to the servo
     std::optional<int64_t> writtenNs;
     bool failing = false;

@@ -52,7 +52,7 @@ void tReport::begin(const std::string& scenario, const tHostCalls& /*calls*/)
 
 void tReport::see(const tStep& step)
 {
-    if (step.heldBack || step.failure) return;
+    if (step.failure) return;
     const int64_t elapsedNs = step.pair.elapsedNs;
     if (step.event != kNothingNew) console.note(elapsedNs, eventText(step));
     if (!step.tuning.empty()) console.note(elapsedNs, step.tuning);

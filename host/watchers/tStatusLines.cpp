@@ -68,6 +68,7 @@ void tStatusLines::see(const tSilence& silence)
     if (!intervalNs || !silence.holdoverNs) return;
     if (lineNs && silence.elapsedNs - *lineNs < std::max(*intervalNs, kSecondNs)) return;
     lineNs = silence.elapsedNs;
+    figures = {};
     console.print(
         fmt::format("{} holdover for {}, error {}\n", headText(silence.elapsedNs),
                     durationText(*silence.holdoverNs),

@@ -16,7 +16,7 @@ void lockFor(int pairs, tHoldoverEstimate& estimate, double deviationPpb = 4)
 {
     for (int i = 0; i < pairs; ++i) {
         const int sign = i % 2 == 0 ? 1 : -1;
-        estimate.see(stepAt(i, 30 * sign, true, 5000 + deviationPpb * sign));
+        estimate.add(stepAt(i, 30 * sign, true, 5000 + deviationPpb * sign));
     }
 }
 
@@ -34,7 +34,7 @@ TEST(HoldoverEstimate, growsWithTimeAndForgetsALostLock)
     EXPECT_DOUBLE_EQ(50, estimate.errorNs(nsOfSeconds(10)).value_or(-1));
     lockFor(1, estimate, 100);
     EXPECT_NEAR(1000, estimate.errorNs(nsOfSeconds(10)).value_or(-1), 5);
-    estimate.see(stepAt(200, 5000, false, 5000));
+    estimate.add(stepAt(200, 5000, false, 5000));
     EXPECT_FALSE(estimate.errorNs(0));
     lockFor(7, estimate);
     EXPECT_FALSE(estimate.errorNs(0));

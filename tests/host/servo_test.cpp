@@ -210,7 +210,9 @@ TEST_F(ServoHost, isTunedByFiles)
     tune(host, {});
     tune(host, {{}, "none that is known", good.path});
     EXPECT_EQ(0.25, tServoParameters::of(host.readConfig()).phaseLockGain);
-    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, good.path));
+    tNotes notes;
+    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, good.path, notes));
+    EXPECT_EQ(tNotes(), notes);
     EXPECT_EQ(0U, failureOf([&] {
                       tune(host, {bad.path, {}, {}});
                   }).find(bad.path + ": applyMetaData failed with -52005: "));

@@ -212,11 +212,12 @@ TEST(TraceFile, holdsPairsAndCallsInOrder)
 {
     for (const bool dryRun : {false, true}) {
         const tTestFile file("trace.csv");
-        tTraceFile trace(file.path, dryRun);
+        tTraceFile trace(file.path);
         trace.begin("", {{kGetMaxFrequencyOffset, 5}});
         tStep step = withEvent(stepAt(1.25, -40, true, 0), kNothingNew,
                                {{kGetFrequency, 7}, {kSetFrequency, -20000}, {kStepTime, -3}});
         step.pair.trueErrorNs = -38.0625;
+        step.dryRun = dryRun;
         trace.see(step);
         trace.see(failed(stepAt(2, 5, true, 0))); // is on the disk before the end
         const std::string order = dryRun ? "held,1.250000000,,,,," : "call,1.250000000,,,,,";
