@@ -45,11 +45,11 @@ as JSON           |0|^\{"points": 89, "from": 10, "to": 99, .*"locksLost": 0, "i
 a limit broken    |3|^dravik-host: peak<40ns does not hold: it is 40 ns$|trace.csv --assert peak<=40ns --assert peak<40ns
 two broken        |3|^dravik-host: rms<1ns .*; locks-lost>0 does not hold: it is 0$|trace.csv --assert rms<1ns --assert locks-lost>0
 without its slope |0|^mean .* peak to peak 136.9 ns$|trace.csv --remove-slope
-numbers           |0|^numbers: phase, 3 points from 0\.000 s to 1\.000 s$|numbers --interval 500ms
-a frequency       |0|^numbers: phase of the frequency, 4 points|numbers --interval 1s --frequency
+numbers           |0|^numbers: measured error, 3 points from 0\.000 s to 1\.000 s$|numbers --interval 500ms
+a frequency       |0|^numbers: measured error, 4 points|numbers --interval 1s --frequency
 no slope          |1|^dravik-host: one measurement has no slope$|trace.csv --from 20s --to 20s --remove-slope
 nothing selected  |1|^dravik-host: trace.csv has no measurement in that time$|trace.csv --from 1h
-no numbers        |1|^dravik-host: trace.csv: line 1 is not one number$|trace.csv --interval 1s
+no numbers        |1|^dravik-host: trace.csv has times of its own; leave --interval out$|trace.csv --interval 1s
 no figure         |2|'rmse' is none of rms, peak, |trace.csv --assert rmse<1ns
 frequency of what |2|--frequency requires --interval|trace.csv --frequency
 no such mask      |2|--mask|trace.csv --mask g8273.2-e

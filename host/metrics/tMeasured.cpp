@@ -1,11 +1,7 @@
 #include "metrics/tMeasured.h"
 
 #include "maths/median.h"
-#include "text/files.h"
 #include "text/quantity.h"
-#include "text/words.h"
-
-#include <fmt/format.h>
 
 #include <algorithm>
 #include <cmath>
@@ -15,8 +11,6 @@
 namespace dravikHost {
 
 namespace {
-
-using tPairs = std::vector<const tRecordedPair*>;
 
 bool isLocked(const tRecordedPair& pair) { return pair.locked.value_or(false); }
 
@@ -31,40 +25,50 @@ void lookAtLocks(tMeasured& measured, const std::vector<tRecordedPair>& pairs)
     }
 }
 
-tPairs select(const std::vector<tRecordedPair>& pairs, const tSelection& selection)
+bool isLocked(const tRecordedSummary& /*summary*/) { return false; }
+
+template <typename Measurement>
+std::vector<const Measurement*> select(const std::vector<Measurement>& all,
+                                       const tSelection& selection)
 {
-    const auto locked = std::find_if(pairs.begin(), pairs.end(), isLocked);
-    const int64_t lockNs = locked == pairs.end() ? 0 : locked->elapsedNs;
+    const auto locked =
+        std::find_if(all.begin(), all.end(), [](const Measurement& one) { return isLocked(one); });
+    const int64_t lockNs = locked == all.end() ? 0 : locked->elapsedNs;
     const int64_t fromNs = selection.fromNs.value_or(lockNs);
-    tPairs selected;
-    for (const tRecordedPair& pair : pairs) {
-        if (pair.elapsedNs < fromNs) continue;
-        if (selection.toNs && pair.elapsedNs > *selection.toNs) break;
-        selected.push_back(&pair);
+    std::vector<const Measurement*> selected;
+    for (const Measurement& one : all) {
+        if (one.elapsedNs < fromNs) continue;
+        if (selection.toNs && one.elapsedNs > *selection.toNs) break;
+        selected.push_back(&one);
     }
     return selected;
 }
 
-int64_t medianSpacingNs(const tPairs& pairs)
+// Across a new stretch there is none. 0: no spacing at all.
+template <typename Measurement>
+int64_t medianSpacingNs(const std::vector<const Measurement*>& selected)
 {
     std::vector<int64_t> spacings;
-    spacings.reserve(pairs.size());
-    for (size_t i = 1; i < pairs.size(); ++i)
-        spacings.push_back(pairs[i]->elapsedNs - pairs[i - 1]->elapsedNs);
-    return median(std::move(spacings));
+    spacings.reserve(selected.size());
+    for (size_t i = 1; i < selected.size(); ++i)
+        if (!selected[i]->beginsStretch)
+            spacings.push_back(selected[i]->elapsedNs - selected[i - 1]->elapsedNs);
+    return spacings.empty() ? 0 : median(std::move(spacings));
 }
 
 // Moments are rounded in logs, so half of the spacing more or less is still the same one.
-tSeries longestStretch(const tPairs& pairs, const std::vector<double>& errors)
+template <typename Measurement>
+tSeries longestStretch(const std::vector<const Measurement*>& pairs,
+                       const std::vector<double>& errors)
 {
-    if (pairs.size() < 2) return {};
     const int64_t spacingNs = medianSpacingNs(pairs);
+    if (spacingNs == 0) return {};
     size_t start = 0;
     size_t bestStart = 0;
     size_t bestEnd = 0;
     for (size_t i = 1; i <= pairs.size(); ++i) {
         const bool goes =
-            i < pairs.size() &&
+            i < pairs.size() && !pairs[i]->beginsStretch &&
             std::llabs(pairs[i]->elapsedNs - pairs[i - 1]->elapsedNs - spacingNs) * 2 <= spacingNs;
         if (goes) continue;
         if (i - start > bestEnd - bestStart) {
@@ -80,13 +84,36 @@ tSeries longestStretch(const tPairs& pairs, const std::vector<double>& errors)
     return {secondsOf(intervalNs), {at(bestStart), at(bestEnd)}};
 }
 
+void requireSome(size_t count, const tRecording& recording)
+{
+    if (count == 0) throw std::runtime_error(recording.name + " has no measurement in that time");
+}
+
+tMeasured measureSummaries(const tRecording& recording, const tSelection& selection)
+{
+    const auto summaries = select(recording.summaries, selection);
+    requireSome(summaries.size(), recording);
+    tMeasured measured;
+    measured.what = "summaries of measured errors";
+    measured.fromSeconds = secondsOf(summaries.front()->elapsedNs);
+    measured.toSeconds = secondsOf(summaries.back()->elapsedNs);
+    for (const tRecordedSummary* const summary : summaries) {
+        measured.errors.push_back(secondsOf(summary->rmsNs));
+        measured.greatest.push_back(secondsOf(summary->greatestNs));
+        measured.times.push_back(secondsOf(summary->elapsedNs));
+    }
+    measured.series = longestStretch(summaries, measured.errors);
+    measured.series.phase.clear(); // an RMS is no phase
+    return measured;
+}
+
 } // namespace
 
 tMeasured measure(const tRecording& recording, const tSelection& selection)
 {
-    const tPairs pairs = select(recording.pairs, selection);
-    if (pairs.empty())
-        throw std::runtime_error(recording.name + " has no measurement in that time");
+    if (recording.pairs.empty()) return measureSummaries(recording, selection);
+    const auto pairs = select(recording.pairs, selection);
+    requireSome(pairs.size(), recording);
     const bool allTrue = std::all_of(pairs.begin(), pairs.end(), [](const tRecordedPair* pair) {
         return pair->trueErrorNs.has_value();
     });
@@ -107,33 +134,9 @@ tMeasured measure(const tRecording& recording, const tSelection& selection)
     return measured;
 }
 
-tMeasured readNumbers(const std::string& file, double interval, bool frequency)
-{
-    const std::string text = readText(file);
-    std::string_view rest = text;
-    tSeries series{interval, {}};
-    for (int64_t number = 1; !rest.empty(); ++number) {
-        std::string_view line = takeLine(rest);
-        const std::string_view word = takeWord(line);
-        if (word.empty() || word.front() == '#') continue;
-        const auto value = numberIn<double>(word);
-        if (!value || !std::isfinite(*value) || !takeWord(line).empty())
-            throw std::runtime_error(fmt::format("{}: line {} is not one number", file, number));
-        series.phase.push_back(*value);
-    }
-    if (series.phase.empty()) throw std::runtime_error(file + " has no number");
-    tMeasured measured;
-    measured.what = frequency ? "phase of the frequency" : "phase";
-    measured.series = frequency ? phaseOf(series) : series;
-    measured.errors = measured.series.phase;
-    for (size_t i = 0; i < measured.errors.size(); ++i)
-        measured.times.push_back(static_cast<double>(i) * interval);
-    measured.toSeconds = static_cast<double>(measured.errors.size() - 1) * interval;
-    return measured;
-}
-
 void tMeasured::removeSlope()
 {
+    if (!greatest.empty()) throw std::runtime_error("summaries have no slope");
     if (errors.size() < 2) throw std::runtime_error("one measurement has no slope");
     const double first = errors.front();
     const double slope = (errors.back() - first) / (times.back() - times.front());
@@ -142,11 +145,13 @@ void tMeasured::removeSlope()
     series = withoutSlope(series);
 }
 
-double tMeasured::mean() const
+std::optional<double> tMeasured::mean() const
 {
+    if (!greatest.empty()) return std::nullopt;
     return std::accumulate(errors.begin(), errors.end(), 0.0) / static_cast<double>(errors.size());
 }
 
+// Of summaries, too: each stands for as many measurements, so their squares are averaged.
 double tMeasured::rms() const
 {
     const double squares = std::inner_product(errors.begin(), errors.end(), errors.begin(), 0.0);
@@ -155,12 +160,14 @@ double tMeasured::rms() const
 
 double tMeasured::peak() const
 {
-    const auto extremes = std::minmax_element(errors.begin(), errors.end());
+    const auto& values = greatest.empty() ? errors : greatest;
+    const auto extremes = std::minmax_element(values.begin(), values.end());
     return std::max(-*extremes.first, *extremes.second);
 }
 
-double tMeasured::peakToPeak() const
+std::optional<double> tMeasured::peakToPeak() const
 {
+    if (!greatest.empty()) return std::nullopt;
     const auto extremes = std::minmax_element(errors.begin(), errors.end());
     return *extremes.second - *extremes.first;
 }

@@ -25,22 +25,19 @@ struct tMeasured {
     tSeries series;                   // the longest stretch without a gap
     std::optional<double> timeToLock; // s; if the trace tells of locks
     std::optional<int64_t> locksLost;
+    std::vector<double> greatest; // s, of summaries: then errors are RMS values, without a mean
 
     // Takes out the straight line from the first point to the last, of errors and series each.
     // Throws std::runtime_error if there is but one.
     void removeSlope();
 
-    double mean() const;
+    std::optional<double> mean() const;
     double rms() const;
     double peak() const;
-    double peakToPeak() const;
+    std::optional<double> peakToPeak() const;
 };
 
 // Throws std::runtime_error if nothing is selected.
 tMeasured measure(const tRecording& recording, const tSelection& selection);
-
-// Of a file of numbers, one a line, "#" beginning a comment: phase in seconds, or fractional
-// frequency. Throws std::runtime_error that names a line that is no number.
-tMeasured readNumbers(const std::string& file, double interval, bool frequency);
 
 } // namespace dravikHost

@@ -2,28 +2,32 @@
 
 #include "servo/tLockObserver.h"
 #include "text/words.h"
+#include "traces/lineShape.h"
+#include "traces/tableRow.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
 #include <array>
+#include <cctype>
 #include <cmath>
 #include <optional>
+#include <stdexcept>
 
 namespace dravikHost {
 
 namespace {
 
-// CSV with a header that names at least reference_ns and clock_ns, in any order. Also read are
+// CSV with a header that names at least reference_ns and clock_ns, in any order and case, between
+// commas, semicolons or tabs, as spreadsheets write it. Also read are
 // elapsed_s, true_error_ns, frequency_ppb (in force from this pair on), step_ns (by which the clock
 // was stepped after it), and what this program writes: kind, call and value, the calls of each pair
 // in rows of their own, and orders of a dry run, which did not reach the clock.
 class tCsvFormat : public iTraceFormat
 {
 public:
-    const char* name() const override { return "CSV"; }
-    bool recognises(std::string_view line) const override;
-    std::string read(std::string_view line, tRecordingBuilder& builder) override;
+    std::string name() const override { return "CSV with reference_ns and clock_ns"; }
+    tLine read(std::string_view line, tRecordingBuilder& builder) override;
     void finish(tRecordingBuilder& builder) override;
 
 private:
@@ -39,16 +43,20 @@ private:
         kValue,
         kColumns
     };
-    using tFields = std::array<std::string_view, kColumns>;
+    using tFields = std::array<std::string, kColumns>;
 
-    static int columnOf(std::string_view title);
-    void readHeader(std::string_view line);
-    tFields split(std::string_view line) const;
-    std::string readPair(const tFields& fields, tRecordingBuilder& builder);
-    std::string readCall(const tFields& fields, tRecordingBuilder& builder);
+    static int columnOf(const std::string& title);
+    bool readHeader(std::string_view line);
+    std::optional<tFields> split(std::string_view line) const;
+    tLine readPair(const tFields& fields, tRecordingBuilder& builder);
+    tLine readCall(const tFields& fields, tRecordingBuilder& builder);
+    std::string cutShort(const tFields& fields);
     void endPair(tRecordingBuilder& builder);
 
+    std::string header;
+    char separator = ',';
     std::vector<int> columns; // of the file's fields in turn; -1: not used
+    size_t latestDigits = 0;  // of the last field of a pair, if that is a time
     bool hasCalls = false;
     tHostCalls calls; // of the last pair
     std::optional<tLockObserver> observer;
@@ -71,88 +79,130 @@ template <typename Number> std::optional<std::optional<Number>> optionalIn(std::
     return number;
 }
 
-int tCsvFormat::columnOf(std::string_view title)
+int tCsvFormat::columnOf(const std::string& title)
 {
-    const auto found = std::find(kTitles.begin(), kTitles.end(), title);
+    std::string name = title;
+    std::transform(name.begin(), name.end(), name.begin(), [](unsigned char character) {
+        return character == ' ' ? '_' : static_cast<char>(std::tolower(character));
+    });
+    const auto found = std::find(kTitles.begin(), kTitles.end(), name);
     return found == kTitles.end() ? -1 : static_cast<int>(found - kTitles.begin());
 }
 
-bool tCsvFormat::recognises(std::string_view line) const
+tLine tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
 {
-    bool reference = false;
-    bool clock = false;
-    while (!line.empty()) {
-        const int column = columnOf(takeField(line));
-        reference = reference || column == kReference;
-        clock = clock || column == kClock;
+    if (line.find_first_not_of(" \t,;") == std::string_view::npos || line.front() == '#')
+        return {tLine::kFrame, ""};
+    if (columns.empty())
+        return readHeader(line) ? tLine{tLine::kFrame, ""}
+                                : tLine::unread("no header with reference_ns and clock_ns");
+    if (line == header) return {tLine::kFrame, ""};
+    const auto fields = split(line);
+    if (!fields) return tLine::unread("not as many fields as the header has");
+    const std::string& kind = (*fields)[kKind];
+    if (kind.empty() || kind == "pair") return readPair(*fields, builder);
+    if (kind == "call" || kind == "held") return readCall(*fields, builder);
+    return tLine::unread(fmt::format("a row of the unknown kind '{}'", kind.substr(0, 20)));
+}
+
+// Throws std::runtime_error if it is one, but cannot be told what it means.
+bool tCsvFormat::readHeader(std::string_view line)
+{
+    separator = separatorOf(line);
+    const std::vector<std::string> titles = fieldsOf(line, separator);
+    std::array<int, kColumns> counts{};
+    for (const std::string& title : titles) {
+        columns.push_back(columnOf(title));
+        if (columns.back() >= 0) ++counts[static_cast<size_t>(columns.back())];
     }
-    return reference && clock;
-}
-
-std::string tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
-{
-    if (columns.empty()) {
-        readHeader(line);
-        return "";
+    if (counts[kReference] == 0 || counts[kClock] == 0) {
+        columns.clear();
+        return false;
     }
-    const tFields fields = split(line);
-    if (fields[kKind].empty() || fields[kKind] == "pair") return readPair(fields, builder);
-    if (fields[kKind] == "call" || fields[kKind] == "held") return readCall(fields, builder);
-    return fmt::format("a row of the unknown kind '{}'", fields[kKind]);
+    for (size_t i = 0; i < kColumns; ++i)
+        if (counts[i] > 1)
+            throw std::runtime_error(
+                fmt::format("the column {} stands there {} times", kTitles[i], counts[i]));
+    header = line;
+    return true;
 }
 
-void tCsvFormat::readHeader(std::string_view line)
+// Nothing if there are fewer or more fields than titles; spreadsheets add empty ones.
+std::optional<tCsvFormat::tFields> tCsvFormat::split(std::string_view line) const
 {
-    while (!line.empty())
-        columns.push_back(columnOf(takeField(line)));
-}
-
-tCsvFormat::tFields tCsvFormat::split(std::string_view line) const
-{
+    const std::vector<std::string> found = fieldsOf(line, separator);
+    if (found.size() < columns.size()) return std::nullopt;
     tFields fields;
-    for (const int column : columns) {
-        const std::string_view field = takeField(line);
-        if (column >= 0) fields[static_cast<size_t>(column)] = field;
+    for (size_t i = 0; i < found.size(); ++i) {
+        if (i >= columns.size()) {
+            if (!found[i].empty()) return std::nullopt;
+        } else if (columns[i] >= 0) {
+            fields[static_cast<size_t>(columns[i])] = found[i];
+        }
     }
     return fields;
 }
 
-std::string tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
+// A time that ends the row and lost digits against the one before.
+std::string tCsvFormat::cutShort(const tFields& fields)
 {
-    const auto referenceNs = numberIn<uint64_t>(fields[kReference]);
-    const auto clockNs = numberIn<uint64_t>(fields[kClock]);
-    if (!referenceNs || !clockNs) return "no whole number in reference_ns or in clock_ns";
+    if (columns.back() != kClock && columns.back() != kReference) return "";
+    const std::string& field = fields[static_cast<size_t>(columns.back())];
+    const size_t digits = std::min(field.find('.'), field.size());
+    const bool shorter = digits < latestDigits;
+    if (shorter) return "cut short";
+    latestDigits = digits;
+    return "";
+}
+
+tLine tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
+{
+    const auto readsTime = [this](const std::string& field) -> std::optional<tExactNs> {
+        if (field.find_first_of("eE-") != std::string::npos) return std::nullopt;
+        return exactNsOf(field, separator, 1);
+    };
+    for (const tColumn column : {kReference, kClock})
+        if (fields[column].find_first_of("eE") != std::string::npos && finiteIn(fields[column]))
+            return tLine::unread("a time whose last digits a spreadsheet has rounded away");
+    const auto reference = readsTime(fields[kReference]);
+    const auto clock = readsTime(fields[kClock]);
+    if (!reference || !clock) return tLine::unread("no number in reference_ns or in clock_ns");
     const auto elapsedNs = fields[kElapsed].empty()
-                               ? std::optional(static_cast<int64_t>(*referenceNs))
+                               ? std::optional(static_cast<int64_t>(reference->whole))
                                : secondsIn(fields[kElapsed]);
-    if (!elapsedNs) return "elapsed_s is not a time";
+    if (!elapsedNs) return tLine::unread("elapsed_s is not a time");
     const auto trueErrorNs = optionalIn<double>(fields[kTrueError]);
     const auto stepNs = optionalIn<int64_t>(fields[kStep]);
     const auto frequencyPpb = optionalIn<double>(fields[kFrequency]);
     if (!trueErrorNs || !stepNs || !frequencyPpb)
-        return "no number in true_error_ns, step_ns or frequency_ppb";
+        return tLine::unread("no number in true_error_ns, step_ns or frequency_ppb");
+    const std::string cut = cutShort(fields);
+    if (!cut.empty()) return tLine::unread(cut);
     endPair(builder);
     tRecordedPair pair{};
     pair.elapsedNs = *elapsedNs;
-    pair.referenceNs = *referenceNs;
-    pair.clockNs = *clockNs;
-    pair.errorNs = static_cast<double>(static_cast<int64_t>(*clockNs - *referenceNs));
+    pair.referenceNs = reference->whole;
+    pair.clockNs = clock->whole;
+    pair.errorNs = static_cast<double>(static_cast<int64_t>(clock->whole - reference->whole)) +
+                   (clock->fraction - reference->fraction);
     pair.trueErrorNs = *trueErrorNs;
     pair.stepNs = stepNs->value_or(0);
     pair.orderedPpb = *frequencyPpb ? *frequencyPpb : orderedPpb;
-    return builder.add("", pair);
+    const std::string why = builder.add("", pair);
+    return why.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(why);
 }
 
 // Calls in front of the first pair tell the limits of the clock.
-std::string tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
+tLine tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
 {
     const auto operation =
         std::find(kHostOperationNames.begin(), kHostOperationNames.end(), fields[kCall]);
     const auto value = numberIn<int64_t>(fields[kValue]);
-    if (operation == kHostOperationNames.end() || !value) return "no call that is known";
+    if (operation == kHostOperationNames.end() || !value)
+        return tLine::unread("no call that is known");
     hasCalls = true;
     calls.push_back({static_cast<tHostOperation>(operation - kHostOperationNames.begin()), *value});
-    if (fields[kKind] == "held") return "";
+    if (fields[kKind] == "held") return {tLine::kFrame, ""};
     const auto ppb = static_cast<double>(*value);
     switch (static_cast<tHostOperation>(operation - kHostOperationNames.begin())) {
     case kGetMaxFrequencyOffset:
@@ -174,7 +224,7 @@ std::string tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& build
     case kGetTime:
         break;
     }
-    return "";
+    return {tLine::kFrame, ""};
 }
 
 // What the calls of the pair before say of its state.
@@ -191,7 +241,8 @@ void tCsvFormat::endPair(tRecordingBuilder& builder)
 void tCsvFormat::finish(tRecordingBuilder& builder)
 {
     endPair(builder);
-    for (tRecordedPair& pair : builder.all()) { // those before the first order
+    if (builder.pairs() == nullptr) return;
+    for (tRecordedPair& pair : *builder.pairs()) { // those before the first order
         if (pair.orderedPpb) break;
         pair.orderedPpb = initialPpb;
     }
@@ -199,6 +250,9 @@ void tCsvFormat::finish(tRecordingBuilder& builder)
 
 } // namespace
 
-std::unique_ptr<iTraceFormat> csvFormat() { return std::make_unique<tCsvFormat>(); }
+void addCsvFormat(std::vector<tMakeFormat>& formats)
+{
+    formats.emplace_back([](const tReadOptions&) { return std::make_unique<tCsvFormat>(); });
+}
 
 } // namespace dravikHost

@@ -3,37 +3,44 @@
 #include "traces/tRecordingBuilder.h"
 
 #include <cstdint>
+#include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace dravikHost {
 
-// One way in which traces are written, line by line.
+// What a line turned out to be. The order tells how much it speaks for the format.
+struct tLine {
+    enum tKind { kUnread, kEvent, kFrame, kMeasurement } kind;
+    std::string why; // of what is unread
+
+    static tLine unread(std::string why) { return {kUnread, std::move(why)}; }
+};
+
+// One way in which traces are written, line by line. Which one a file has shows in how many of its
+// lines can be read.
 class iTraceFormat
 {
 public:
     virtual ~iTraceFormat() = default;
 
-    virtual const char* name() const = 0; // in words
+    virtual std::string name() const = 0; // in words
 
-    // Whether the line belongs to this format and to no other.
-    virtual bool recognises(std::string_view line) const = 0;
-
-    // Takes one line; returns why it is no measurement, "" if it is one or belongs to the frame.
-    virtual std::string read(std::string_view line, tRecordingBuilder& builder) = 0;
+    virtual tLine read(std::string_view line, tRecordingBuilder& builder) = 0;
 
     // All lines have been taken.
     virtual void finish(tRecordingBuilder& /*builder*/) {}
 };
 
-// Logs tell differences of time and moments of their own. Their references start here, so that no
-// difference, however negative, takes a clock below zero.
-constexpr uint64_t kMadeUpStartNs = 1'700'000'000'000'000'000;
-
-// The formats that there are, each in the file of its name.
-std::unique_ptr<iTraceFormat> csvFormat();
-std::unique_ptr<iTraceFormat> daemonLogFormat();
-std::unique_ptr<iTraceFormat> refclocksLogFormat();
+// The formats that there are, each made anew, in the order in which they are preferred.
+using tMakeFormat = std::function<std::unique_ptr<iTraceFormat>(const tReadOptions& options)>;
+void addCsvFormat(std::vector<tMakeFormat>& formats);
+void addDaemonLogFormat(std::vector<tMakeFormat>& formats);
+void addShapedFormats(std::vector<tMakeFormat>& formats);
+void addOtherDaemonFormats(std::vector<tMakeFormat>& formats);
+void addColumnsFormat(std::vector<tMakeFormat>& formats);
 
 } // namespace dravikHost

@@ -8,6 +8,32 @@
 
 namespace dravikHost {
 
+void keepLongestStretch(tRecording& recording)
+{
+    auto& pairs = recording.pairs;
+    size_t bestStart = 0;
+    size_t bestEnd = 0;
+    for (size_t start = 0; start < pairs.size();) {
+        size_t end = start + 1;
+        while (end < pairs.size() && !pairs[end].beginsStretch)
+            ++end;
+        if (end - start > bestEnd - bestStart) {
+            bestStart = start;
+            bestEnd = end;
+        }
+        start = end;
+    }
+    if (bestEnd - bestStart == pairs.size()) return;
+    recording.notes.push_back(fmt::format("only the longest stretch is used, {} of {} measurements",
+                                          bestEnd - bestStart, pairs.size()));
+    const int64_t startNs = pairs[bestStart].elapsedNs;
+    pairs = {pairs.begin() + static_cast<std::ptrdiff_t>(bestStart),
+             pairs.begin() + static_cast<std::ptrdiff_t>(bestEnd)};
+    pairs.front().beginsStretch = false;
+    for (tRecordedPair& pair : pairs)
+        pair.elapsedNs -= startNs;
+}
+
 void requireCorrections(const tRecording& recording)
 {
     for (const tRecordedPair& pair : recording.pairs) {

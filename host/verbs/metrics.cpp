@@ -10,6 +10,7 @@
 #include <fmt/format.h>
 
 #include <memory>
+#include <stdexcept>
 
 namespace dravikHost {
 
@@ -18,22 +19,28 @@ namespace {
 struct tMetrics {
     tTraceOptions trace;
     tSelection selection;
-    std::optional<double> numbersIntervalNs; // then the file is plain numbers
-    bool frequency = false;
+    std::string unit; // "": not told
     bool removeSlope = false;
     bool json = false;
     std::vector<tAssertion> assertions;
     std::vector<std::string> masks;
 };
 
-tMeasured read(const tMetrics& options)
+struct tRead {
+    tRecording recording;
+    tMeasured measured;
+};
+
+tRead read(const tMetrics& options)
 {
-    tMeasured measured = options.numbersIntervalNs
-                             ? readNumbers(options.trace.file,
-                                           secondsOf(*options.numbersIntervalNs), options.frequency)
-                             : measure(readTrace(options.trace), options.selection);
-    if (options.removeSlope) measured.removeSlope();
-    return measured;
+    tTraceOptions trace = options.trace;
+    if (!options.unit.empty()) trace.read.unitNs = parseQuantity("1" + options.unit, kDuration);
+    tRead read{readWholeTrace(trace), {}};
+    if (read.recording.pairs.empty() && !options.masks.empty())
+        throw std::runtime_error("summaries cannot be held to a mask");
+    read.measured = measure(read.recording, options.selection);
+    if (options.removeSlope) read.measured.removeSlope();
+    return read;
 }
 
 std::string durationOf(double seconds) { return durationText(nsOf(seconds)); }
@@ -43,9 +50,12 @@ std::string summaryText(const tMetrics& options, const tMeasured& measured)
     std::string text = fmt::format("{}: {}, {} points from {:.3f} s to {:.3f} s\n",
                                    options.trace.file, measured.what, measured.errors.size(),
                                    measured.fromSeconds, measured.toSeconds);
+    const auto mean = measured.mean();
+    const auto peakToPeak = measured.peakToPeak();
     text += fmt::format("mean {}, RMS {}, peak {}, peak to peak {}\n",
-                        signedDurationText(nsOf(measured.mean())), durationOf(measured.rms()),
-                        durationOf(measured.peak()), durationOf(measured.peakToPeak()));
+                        mean ? signedDurationText(nsOf(*mean)) : "not known",
+                        durationOf(measured.rms()), durationOf(measured.peak()),
+                        peakToPeak ? durationOf(*peakToPeak) : "not known");
     if (measured.locksLost) {
         text += measured.timeToLock
                     ? fmt::format("locked after {}, lock lost {} times\n",
@@ -101,8 +111,10 @@ std::string stabilityJson(const tSeries& series)
 }
 
 // SI units; what is not known is null.
-std::string jsonText(const tMeasured& measured)
+std::string jsonText(const tRecording& recording, const tMeasured& measured)
 {
+    const auto interval =
+        measured.series.interval > 0 ? std::optional(measured.series.interval) : std::nullopt;
     const auto locksLost =
         measured.locksLost ? std::optional(static_cast<double>(*measured.locksLost)) : std::nullopt;
     return tJsonObject()
@@ -115,9 +127,13 @@ std::string jsonText(const tMeasured& measured)
                .add("peakToPeak", measured.peakToPeak())
                .add("timeToLock", measured.timeToLock)
                .add("locksLost", locksLost)
-               .add("interval", measured.series.interval)
+               .add("interval", interval)
                .add("stretch", std::to_string(measured.series.phase.size()))
                .add("stability", stabilityJson(measured.series))
+               .add("format", jsonQuoted(recording.format))
+               .add("source", jsonQuoted(recording.source))
+               .add("unread", std::to_string(recording.unreadLines))
+               .add("events", std::to_string(recording.events))
                .line() +
            "\n";
 }
@@ -143,11 +159,12 @@ std::string reportMasks(const tMetrics& options, const tMeasured& measured, tOut
 
 void run(const tMetrics& options)
 {
-    const tMeasured measured = read(options);
+    const tRead found = read(options);
+    const tMeasured& measured = found.measured;
     tOutputFile output("-");
     tOutputFile other = tOutputFile::standardError();
     if (options.json) {
-        output.write(jsonText(measured));
+        output.write(jsonText(found.recording, measured));
     } else {
         output.write(summaryText(options, measured) + tableText(measured));
     }
@@ -172,9 +189,16 @@ void addSelection(tOptionSet& options, tMetrics& metrics)
     options.flag("--measured", metrics.selection.measured,
                  "The measured error, even if the true one is\nknown");
     const tOption interval = options.quantity(
-        metrics.numbersIntervalNs, {"--interval", kDuration, "", "1ns", "438300h",
-                                    "The file is plain numbers, so far apart:\nphase in seconds"});
-    options.flag("--frequency", metrics.frequency, "They are fractional frequency").needs(interval);
+        metrics.trace.read.intervalNs,
+        {"--interval", kDuration, "", "1ns", "438300h",
+         "The file is plain numbers, phase in seconds, or\nlines without a time, so far apart"});
+    options
+        .flag("--frequency", metrics.trace.read.frequency, "The numbers are fractional frequency")
+        .needs(interval);
+    options
+        .text("--unit", "UNIT", metrics.unit,
+              "Of errors in columns whose header tells none:\nns, us, ms or s; else s")
+        .oneOf({"ns", "us", "ms", "s"});
     options.flag("--remove-slope", metrics.removeSlope,
                  "Without the line from the first point to the last");
 }

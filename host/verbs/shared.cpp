@@ -6,6 +6,7 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <cstdio>
 #include <stdexcept>
 
@@ -31,6 +32,11 @@ void addLater(std::vector<tLaterDocument>& later, const std::string& text)
     later.push_back(document);
 }
 
+std::string counted(int64_t count, const char* one, const char* many)
+{
+    return fmt::format("{} {}", count, count == 1 ? one : many);
+}
+
 void printUnread(const tRecording& recording)
 {
     if (recording.unreadLines == 0) return;
@@ -38,8 +44,35 @@ void printUnread(const tRecording& recording)
     for (const tUnreadLine& line : recording.firstUnread)
         examples += fmt::format("{}{} ({})", examples.empty() ? "" : ", ", line.number, line.why);
     const bool all = recording.unreadLines == static_cast<int64_t>(recording.firstUnread.size());
-    fmt::print(stderr, "dravik-host: {}: {} lines are not used, {} {}\n", recording.name,
-               recording.unreadLines, all ? "lines" : "the first are lines", examples);
+    fmt::print(stderr, "dravik-host: {}: {} not used, {} {}\n", recording.name,
+               counted(recording.unreadLines, "line is", "lines are"),
+               all ? "lines" : "the first are lines", examples);
+}
+
+// The setting that prints each measurement.
+std::string perMeasurement(const tRecording& recording)
+{
+    const auto isOf = [&recording](const char* program) {
+        return recording.source.find(program) != std::string::npos;
+    };
+    if (isOf("phc2sys")) return "phc2sys prints each measurement with -u 0";
+    if (isOf("dravik-host")) return "run prints each measurement with --status 0";
+    return "ptp4l prints each measurement with summary_interval -7 (phc2sys with -u 0)";
+}
+
+void printNotes(const tRecording& recording)
+{
+    const auto stretches =
+        1 + std::count_if(recording.pairs.begin(), recording.pairs.end(),
+                          [](const tRecordedPair& pair) { return pair.beginsStretch; });
+    if (stretches > 1) {
+        fmt::print(stderr,
+                   "dravik-host: {}: the time starts anew, as after a reboot, so there are {} "
+                   "stretches\n",
+                   recording.name, stretches);
+    }
+    for (const std::string& note : recording.notes)
+        fmt::print(stderr, "dravik-host: {}: {}\n", recording.name, note);
 }
 
 } // namespace
@@ -97,11 +130,10 @@ std::string tInitialError::text() const
 
 tOption addTraceOptions(tOptionSet& options, tTraceOptions& trace)
 {
-    options.text("--source", "NAME", trace.source,
+    options.text("--source", "NAME", trace.read.source,
                  "Which one, if the trace has several; a part of its name");
     return options.text("trace", "FILE", trace.file,
-                        "CSV, lines of ptp4l, phc2sys or ts2phc,\nor chrony's refclocks.log; - is "
-                        "stdin");
+                        "CSV, or a log of ptp4l, phc2sys, ts2phc,\nchronyd or ntpd; - is stdin");
 }
 
 void addFreeRunningOption(tOptionSet& options, tTraceOptions& trace)
@@ -110,13 +142,28 @@ void addFreeRunningOption(tOptionSet& options, tTraceOptions& trace)
                  "Where the trace tells no frequency and no\nsteps, the clock was given none");
 }
 
-tRecording readTrace(const tTraceOptions& options)
+tRecording readWholeTrace(const tTraceOptions& options)
 {
-    tRecording recording = readRecording(options.file, options.source);
+    tRecording recording = readRecording(options.file, options.read);
     printUnread(recording);
+    printNotes(recording);
     if (!options.freeRunning) return recording;
     for (tRecordedPair& pair : recording.pairs)
         pair.orderedPpb = pair.orderedPpb.value_or(0);
+    return recording;
+}
+
+tRecording readTrace(const tTraceOptions& options)
+{
+    tRecording recording = readWholeTrace(options);
+    if (recording.pairs.empty()) {
+        throw std::runtime_error(
+            fmt::format("{} has summaries only; {}", recording.name, perMeasurement(recording)));
+    }
+    const size_t before = recording.notes.size();
+    keepLongestStretch(recording);
+    for (size_t i = before; i < recording.notes.size(); ++i)
+        fmt::print(stderr, "dravik-host: {}: {}\n", recording.name, recording.notes[i]);
     return recording;
 }
 

@@ -29,7 +29,7 @@ void addInitialErrorOptions(tOptionSet& options, tInitialError& error, const cha
 // The trace that a verb reads.
 struct tTraceOptions {
     std::string file;
-    std::string source; // which one in it; "": the only one
+    tReadOptions read;
     bool freeRunning = false;
 };
 tOption addTraceOptions(tOptionSet& options, tTraceOptions& trace);
@@ -37,7 +37,11 @@ tOption addTraceOptions(tOptionSet& options, tTraceOptions& trace);
 // Also for those that look at the clock behind the corrections.
 void addFreeRunningOption(tOptionSet& options, tTraceOptions& trace);
 
-// Reads it, and says on stderr how many lines are not measurements.
+// Reads it whole, and says on stderr which lines are not read.
+tRecording readWholeTrace(const tTraceOptions& options);
+
+// For those who follow a clock from measurement to measurement: of a trace whose time goes back
+// the longest stretch. Throws std::runtime_error if it has summaries only.
 tRecording readTrace(const tTraceOptions& options);
 
 // A discipline in simulated or recorded time, with those who watch it. All are borrowed.

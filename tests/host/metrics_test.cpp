@@ -152,10 +152,10 @@ TEST(Measured, isWhatIsSelected)
         EXPECT_DOUBLE_EQ(row.to, found.toSeconds);
         EXPECT_EQ(row.points, found.errors.size());
         EXPECT_EQ(row.stretch, found.series.phase.size());
-        EXPECT_NEAR(row.meanNs, found.mean() * 1e9, 1e-9);
+        EXPECT_NEAR(row.meanNs, *found.mean() * 1e9, 1e-9);
         EXPECT_NEAR(std::sqrt(row.meanSquare), found.rms() * 1e9, 1e-6);
         EXPECT_NEAR(row.peakNs, found.peak() * 1e9, 1e-9);
-        EXPECT_NEAR(row.peakToPeakNs, found.peakToPeak() * 1e9, 1e-9);
+        EXPECT_NEAR(row.peakToPeakNs, *found.peakToPeak() * 1e9, 1e-9);
         EXPECT_DOUBLE_EQ(2, *found.timeToLock); // whatever was selected
         EXPECT_EQ(1, *found.locksLost);
     }
@@ -217,14 +217,21 @@ TEST(Measured, losesItsSlope)
 TEST(Numbers, areOneALine)
 {
     const tTestFile file("numbers", "# phase\n1e-9\n\n  -3e-9 \n2e-9");
-    const tMeasured phase = readNumbers(file.path, 0.5, false);
-    EXPECT_EQ((std::vector<double>{1e-9, -3e-9, 2e-9}), phase.errors);
+    const auto measureNumbers = [&file](double interval, bool frequency) {
+        tReadOptions options;
+        options.intervalNs = interval * 1e9;
+        options.frequency = frequency;
+        return measure(readRecording(file.path, options), {});
+    };
+    const tMeasured phase = measureNumbers(0.5, false);
+    ASSERT_EQ(3U, phase.errors.size());
+    EXPECT_DOUBLE_EQ(-3e-9, phase.errors[1]);
     EXPECT_EQ((std::vector<double>{0, 0.5, 1}), phase.times);
     EXPECT_EQ(1, phase.toSeconds);
-    EXPECT_DOUBLE_EQ(-1e-9, readNumbers(file.path, 0.5, true).errors[2]);
+    EXPECT_DOUBLE_EQ(-1e-9, measureNumbers(0.5, true).errors[2]);
     for (const char* const text : {"", "# none\n", "1\nx\n", "1 2\n", "nan\n"}) {
         writeText(file.path, text);
-        EXPECT_THROW(readNumbers(file.path, 1, false), std::runtime_error) << text;
+        EXPECT_THROW(measureNumbers(1, false), std::runtime_error) << text;
     }
 }
 

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <optional>
+#include <string>
+#include <string_view>
+#include <vector>
+
+namespace dravikHost {
+
+using tWords = std::vector<std::string_view>;
+
+// The words between blanks.
+tWords wordsOf(std::string_view line);
+
+// A number that is one: neither infinite nor NaN.
+std::optional<double> finiteIn(std::string_view text);
+
+// What the words of a line look like, a letter for each; behind each "|" the rest may be missing,
+// as older versions of a program did not print it.
+//
+//     D T  date, time of day          e    number with an exponent
+//     m    modified Julian date       f    number without one
+//     s    seconds of a day           x    number with an exponent or decimal point
+//     n    any word                   i    whole number
+//     b    zeros and ones             E I  as e and i, or "-"
+//     h H  8 and 1 to 8 hex digits    c    one character that is no letter or digit
+//     l    leap status                u    letters and digits, at most 4
+//     o    five characters of options
+//
+// Returns why the words do not fit, "" if they do.
+std::string misfit(const tWords& words, std::string_view shape);
+
+} // namespace dravikHost
