@@ -56,6 +56,7 @@ private:
     double timeUnitNs = 1e9;
     std::optional<double> errorUnitNs;
     std::string errorTitle = "the error";
+    std::string strangeHeader; // in front of the rows, without an error
     int64_t count = 0;
     double phaseNs = 0; // of a frequency
 };
@@ -93,8 +94,14 @@ bool tColumnsFormat::readComment(std::string_view line)
     const size_t start = line.find_first_not_of("#%!*/; \t");
     if (start == std::string_view::npos) return true;
     line.remove_prefix(start);
-    const size_t end = std::min(line.find_first_of(":= \t"), line.size());
+    const auto isNamed = [](unsigned char character) {
+        return std::isalnum(character) != 0 || character == '_' || character == '(' ||
+               character == ')';
+    };
+    const auto* const nameEnd = std::find_if_not(line.begin(), line.end(), isNamed);
+    const auto end = static_cast<size_t>(nameEnd - line.begin());
     if (end == line.size() || std::isalpha(static_cast<unsigned char>(line[0])) == 0) return false;
+    if (std::string_view(":= \t").find(line[end]) == std::string_view::npos) return false;
     const std::string name = lowerCase(std::string(line.substr(0, end)));
     const size_t valueAt = line.find_first_not_of(":= \t", end);
     const tWords words = wordsOf(valueAt == std::string_view::npos ? "" : line.substr(valueAt));
@@ -114,7 +121,8 @@ bool tColumnsFormat::readComment(std::string_view line)
     if (name == "unit" || name == "units") {
         errorUnitNs = unitNsOf(value);
         if (!errorUnitNs)
-            throw std::runtime_error(fmt::format("its unit '{}' is none of time", value));
+            throw std::runtime_error(
+                fmt::format("its unit '{}' is none of time", printable(value)));
     }
     return assigns;
 }
@@ -138,7 +146,12 @@ tLine tColumnsFormat::read(std::string_view line, tRecordingBuilder& builder)
             ? fields.size() == fieldCount && numberOf(fields[oneColumn ? 0 : errorAt], between)
             : fields.size() <= 2 && numberOf(fields.back(), between) &&
                   (numberOf(fields[0], between) || moments.ofIso(fields[0]));
-    if (!isData && !hasRows) return readComment(line) ? tLine{tLine::kFrame, ""} : readHeader(line);
+    if (!isData && fieldCount == 0)
+        return readComment(line) ? tLine{tLine::kFrame, ""} : readHeader(line);
+    if (!strangeHeader.empty()) {
+        throw std::runtime_error(
+            fmt::format("its header, '{}', names no time error that is known", strangeHeader));
+    }
     if (!isData && oneColumn)
         throw std::runtime_error(fmt::format("line {} is not one number", builder.lineNumber()));
     if (!isData) return tLine::unread(fields.size() < fieldCount ? "cut short" : "no numbers");
@@ -149,6 +162,7 @@ tLine tColumnsFormat::read(std::string_view line, tRecordingBuilder& builder)
 tLine tColumnsFormat::readHeader(std::string_view line)
 {
     constexpr size_t kMostTitles = 50;
+
     const char between = separatorOf(line);
     std::vector<tTitle> titles;
     for (const std::string& title : titlesOf(line, between))
@@ -157,7 +171,10 @@ tLine tColumnsFormat::readHeader(std::string_view line)
                        std::any_of(titles.begin(), titles.end(), [](const tTitle& title) {
                            return isOneOf(title.name, kErrorNames);
                        });
-    if (!known) return tLine::unread("in front of the first row");
+    const bool names = !isComment(line) || (!titles.empty() && isOneOf(titles[0].name, kTimeNames));
+    if (!known && titles.size() > 1 && strangeHeader.empty() && names)
+        strangeHeader = printable(line);
+    if (!known) return tLine::foreign("in front of the first row");
     chooseColumns(titles);
     separator = between;
     fieldCount = titles.size();
@@ -186,8 +203,8 @@ void tColumnsFormat::chooseColumns(const std::vector<tTitle>& titles)
     const auto unitOfTitle = [&titles](size_t i) {
         const auto unitNs = unitNsOf(titles[i].unit);
         if (!unitNs && !titles[i].unit.empty())
-            throw std::runtime_error(
-                fmt::format("the unit '{}' of its header is none of time", titles[i].unit));
+            throw std::runtime_error(fmt::format("the unit '{}' of its header is none of time",
+                                                 printable(titles[i].unit)));
         return unitNs;
     };
     errorUnitNs = unitOfTitle(errorAt);
@@ -230,19 +247,17 @@ tLine tColumnsFormat::readRow(const std::vector<std::string>& fields, char betwe
     const double errorNs = *numberOf(fields[errorAt], between) * unitOfError(builder);
     if (!momentNs) return tLine::unread("no time in the column of the time");
     if (!(std::fabs(errorNs) < kMostErrorNs)) return tLine::unread("an error of years");
-    const std::string why = builder.add("", pairOf(*momentNs, errorNs));
-    if (!why.empty()) return tLine::unread(why);
+
     if (first && !errorUnitNs && !options.unitNs)
         builder.addNote(errorTitle +
                         " does not tell its unit, so it is seconds; --unit tells another");
     hasRows = true;
-    return {tLine::kMeasurement, ""};
+    return tLine::added(builder.add("", pairOf(*momentNs, errorNs)));
 }
 
 tLine tColumnsFormat::readNumber(double value, tRecordingBuilder& builder)
 {
-    if (!intervalNs)
-        return tLine::unread("a number without a time; --interval tells how far apart they are");
+    if (!intervalNs) return tLine::unread("no time, and no --interval");
     builder.useInterval();
     const auto moment = [this] { return std::llround(static_cast<double>(count++) * *intervalNs); };
     if (frequency && count == 0) (void)builder.add("", pairOf(moment(), 0));

@@ -95,14 +95,18 @@ tLine tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
         return {tLine::kFrame, ""};
     if (columns.empty())
         return readHeader(line) ? tLine{tLine::kFrame, ""}
-                                : tLine::unread("no header with reference_ns and clock_ns");
+                                : tLine::foreign("no header with reference_ns and clock_ns");
     if (line == header) return {tLine::kFrame, ""};
     const auto fields = split(line);
-    if (!fields) return tLine::unread("not as many fields as the header has");
+    if (!fields || fields->at(kReference) == kTitles[kReference]) {
+        if (line.find(kTitles[kClock]) != std::string_view::npos)
+            throw std::runtime_error("a second header that differs from the first");
+        return tLine::unread("not as many fields as the header has");
+    }
     const std::string& kind = (*fields)[kKind];
     if (kind.empty() || kind == "pair") return readPair(*fields, builder);
     if (kind == "call" || kind == "held") return readCall(*fields, builder);
-    return tLine::unread(fmt::format("a row of the unknown kind '{}'", kind.substr(0, 20)));
+    return tLine::unread(fmt::format("a row of the unknown kind '{}'", printable(kind, 20)));
 }
 
 // Throws std::runtime_error if it is one, but cannot be told what it means.
@@ -188,8 +192,7 @@ tLine tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
     pair.trueErrorNs = *trueErrorNs;
     pair.stepNs = stepNs->value_or(0);
     pair.orderedPpb = *frequencyPpb ? *frequencyPpb : orderedPpb;
-    const std::string why = builder.add("", pair);
-    return why.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(why);
+    return tLine::added(builder.add("", pair));
 }
 
 // Calls in front of the first pair tell the limits of the clock.

@@ -165,8 +165,7 @@ tLine tDaemonLogFormat::readOffset(const tLogMessage& message, const tWords& wor
     pair.stepNs = state == kJump ? -std::llround(*offsetNs) : 0;
     pair.locked = state >= kLocked;
     head = message.text.substr(0, message.text.find("offset") + 6);
-    const std::string why = builder.add(source, pair, message.process);
-    return why.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(why);
+    return tLine::added(builder.add(source, pair, message.process));
 }
 
 tLine tDaemonLogFormat::readSummary(const tLogMessage& message, const tWords& words, size_t at,
@@ -182,9 +181,8 @@ tLine tDaemonLogFormat::readSummary(const tLogMessage& message, const tWords& wo
         !(*greatestNs < kMostErrorNs) || *rmsNs > *greatestNs + 1) {
         return tLine::unread("no numbers behind rms and max");
     }
-    const std::string why =
-        builder.add(source, tRecordedSummary{*momentNs, *rmsNs, *greatestNs}, message.process);
-    return why.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(why);
+    const tRecordedSummary summary{*momentNs, *rmsNs, *greatestNs};
+    return tLine::added(builder.add(source, summary, message.process));
 }
 
 // Other things happen; a line that breaks off before its number is none of them.
@@ -199,7 +197,7 @@ tLine tDaemonLogFormat::other(const tLogMessage& message, std::string_view line)
     if (breaksOff || openStamp) return tLine::unread("cut short");
     const bool said = !message.seconds.empty() || line.find(": ") != std::string_view::npos ||
                       line.substr(0, 3) == "-- ";
-    return said ? tLine{tLine::kEvent, ""} : tLine::unread("no measurement");
+    return said ? tLine{tLine::kEvent, ""} : tLine::foreign("no measurement");
 }
 
 } // namespace

@@ -12,12 +12,24 @@
 
 namespace dravikHost {
 
-// What a line turned out to be. The order tells how much it speaks for the format.
+// What a line turned out to be.
 struct tLine {
-    enum tKind { kUnread, kEvent, kFrame, kMeasurement } kind;
-    std::string why; // of what is unread
+    enum tKind {
+        kForeign,     // nothing that the format has
+        kUnread,      // like a measurement, but damaged
+        kEvent,       // what such a log tells beside measurements
+        kFrame,       // a header, a banner, a blank line
+        kMeasurement, // or a summary of several
+    } kind;
+    std::string why; // it is no measurement; may be "" of an event or a frame
 
+    static tLine foreign(std::string why) { return {kForeign, std::move(why)}; }
     static tLine unread(std::string why) { return {kUnread, std::move(why)}; }
+    // What a builder made of it: the reason why it cannot be used, "" if it can.
+    static tLine added(std::string why)
+    {
+        return {why.empty() ? kMeasurement : kUnread, std::move(why)};
+    }
 };
 
 // One way in which traces are written, line by line. Which one a file has shows in how many of its

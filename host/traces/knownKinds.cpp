@@ -45,7 +45,11 @@ bool beginsShaped(std::string_view line, std::string_view shape)
 bool isUnstamped(std::string_view line)
 {
     const tLogMessage message = messageIn(line);
-    if (!message.seconds.empty()) return false;
+    const size_t open = line.find_first_of("[.");
+    const bool damagedStamp =
+        open != std::string_view::npos && line[open] == '[' &&
+        line.substr(open, line.find(']', open) - open).find('.') < line.size();
+    if (!message.seconds.empty() || damagedStamp) return false;
     const tWords words = wordsOf(message.text);
     for (size_t i = 0; i + 4 < words.size(); ++i) {
         if (words[i] == "offset" && words[i + 3] == "freq" && finiteIn(words[i + 1])) return true;
@@ -110,7 +114,7 @@ constexpr std::array<tKind, 20> kKinds = {{
          return contains(line, "remote ") && contains(line, "refid ") && contains(line, "reach");
      },
      "what 'ntpq -p' prints: one moment, no series; give ntpd's peerstats"},
-    {[](std::string_view line) { return beginsShaped(line, "msnnffff"); },
+    {[](std::string_view line) { return beginsShaped(line, "msnnxxxx"); },
      "ntpd's rawstats: four times of each packet; give peerstats, which has the offsets"},
     {[](std::string_view line) { return beginsShaped(line, "msiiiiii"); },
      "ntpd's sysstats: counts of packets; give loopstats"},

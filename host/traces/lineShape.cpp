@@ -24,7 +24,7 @@ bool consistsOf(std::string_view word, const char* characters, size_t least, siz
 // "-1.303e-04": an exponent has two digits at least, so one that was cut short is none.
 bool isScientific(std::string_view word)
 {
-    const size_t e = word.find('e');
+    const size_t e = word.find_first_of("eE");
     return e != std::string_view::npos && word.size() - e >= 4 && finiteIn(word);
 }
 
@@ -93,6 +93,14 @@ tWords wordsOf(std::string_view line)
     return words;
 }
 
+std::string printable(std::string_view text, size_t most)
+{
+    std::string shown(text.substr(0, most));
+    for (char& character : shown)
+        if (character < ' ' || character == '\x7f') character = character == '\t' ? ' ' : '?';
+    return text.size() > most ? shown + "..." : shown;
+}
+
 std::optional<double> finiteIn(std::string_view text)
 {
     const auto number = numberIn<double>(text);
@@ -101,7 +109,7 @@ std::optional<double> finiteIn(std::string_view text)
 
 std::string misfit(const tWords& words, std::string_view shape)
 {
-    constexpr size_t kShown = 30;
+
     size_t count = 0;
     for (const char letter : shape) {
         if (letter == '|') {
@@ -111,7 +119,7 @@ std::string misfit(const tWords& words, std::string_view shape)
         if (count == words.size()) return "cut short";
         if (!fits(words[count], letter)) {
             const bool number = std::string_view("efxiEI").find(letter) != std::string_view::npos;
-            return fmt::format("field {}, '{}', is {}", count + 1, words[count].substr(0, kShown),
+            return fmt::format("field {}, '{}', is {}", count + 1, printable(words[count], 30),
                                number ? "not a number as it should be" : "not what it should be");
         }
         ++count;

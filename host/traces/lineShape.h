@@ -12,6 +12,9 @@ using tWords = std::vector<std::string_view>;
 // The words between blanks.
 tWords wordsOf(std::string_view line);
 
+// For people: its beginning, without what would do something to their terminal.
+std::string printable(std::string_view text, size_t most = 60);
+
 // A number that is one: neither infinite nor NaN.
 std::optional<double> finiteIn(std::string_view text);
 

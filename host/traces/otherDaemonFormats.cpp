@@ -16,8 +16,7 @@ tLine addTo(tRecordingBuilder& builder, std::string_view source, std::optional<i
     if (!momentNs) return tLine::unread("no date and time");
     if (!errorNs || !(std::fabs(*errorNs) < kMostErrorNs))
         return tLine::unread("the offset is no number");
-    const std::string why = builder.add(source, pairOf(*momentNs, *errorNs, 0));
-    return why.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(why);
+    return tLine::added(builder.add(source, pairOf(*momentNs, *errorNs, 0)));
 }
 
 std::string_view trimmed(std::string_view field)
@@ -46,7 +45,8 @@ public:
         const bool pair = open != std::string_view::npos && close != std::string_view::npos &&
                           line.substr(open, close - open).find("->") != std::string_view::npos;
         const auto momentNs = words.size() < 2 ? std::nullopt : moments.ofDate(words[0], words[1]);
-        if (!pair) return momentNs ? tLine{tLine::kEvent, ""} : tLine::unread("no measurement");
+        const bool event = momentNs && words.size() > 2 && words[2].back() == ':';
+        if (!pair) return event ? tLine{tLine::kEvent, ""} : tLine::foreign("no measurement");
         std::string_view rest = line.substr(close + 11);
         if (rest.find(',') == std::string_view::npos) return tLine::unread("cut short");
         return addTo(builder, line.substr(open + 1, close - open - 1), momentNs,
@@ -75,11 +75,11 @@ public:
         if (fields[0].substr(0, 1) == "#" || fields[0] == "Timestamp") {
             const bool ours =
                 fields.size() > kOffsetAt && fields[kOffsetAt] == "Offset From Master";
-            return ours ? tLine{tLine::kFrame, ""} : tLine::unread("no measurement");
+            return ours ? tLine{tLine::kFrame, ""} : tLine::foreign("no measurement");
         }
         const auto momentNs = moments.ofIso(fields[0]);
-        if (!momentNs || fields.size() < 3) return tLine::unread("no measurement");
-        if (fields[1] != "slv") return {tLine::kEvent, ""};
+        if (!momentNs || fields.size() < 3) return tLine::foreign("no measurement");
+        if (fields[1] != "slv") return {tLine::kEvent, "not in the state slv"};
         if (fields.size() <= kOffsetAt + 1) return tLine::unread("cut short");
         const auto seconds = finiteIn(fields[kOffsetAt]);
         return addTo(builder, "", momentNs, seconds ? std::optional(*seconds * 1e9) : std::nullopt);

@@ -1,11 +1,13 @@
 #include "text/words.h"
 #include "traces/iTraceFormat.h"
 #include "traces/knownKinds.h"
+#include "traces/lineShape.h"
 #include "traces/traceText.h"
 
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <cctype>
 #include <memory>
 #include <new>
 #include <stdexcept>
@@ -30,11 +32,13 @@ public:
         try {
             const tLine read = format->read(line, builder);
             if (read.kind == tLine::kMeasurement) ++measurements;
-            const bool decoration = line.empty() || line[0] == '#' || line[0] == '=';
-            if (read.kind == tLine::kFrame && !decoration) ++frames;
-            if (read.kind == tLine::kEvent) ++events;
-            if (read.kind != tLine::kUnread) return;
-            if (unread.size() < 3) unread.push_back({number, read.why});
+            const size_t start = line.find_first_not_of(" \t");
+            const bool says =
+                start != std::string_view::npos &&
+                (std::isalnum(static_cast<unsigned char>(line[start])) != 0 || line[start] == '"');
+            if (read.kind == tLine::kFrame && says) ++frames;
+            if (read.kind == tLine::kEvent || read.kind == tLine::kUnread) ++related;
+            if (!read.why.empty() && reasons.size() < 3) reasons.push_back({number, read.why});
         } catch (const std::runtime_error& error) {
             failure = error.what();
         }
@@ -44,9 +48,17 @@ public:
     tRecordingBuilder builder;
     int64_t measurements = 0;
     int64_t frames = 0;
-    int64_t events = 0;
-    std::vector<tUnreadLine> unread;
+    int64_t related = 0;
+    std::vector<tUnreadLine> reasons;
     std::string failure; // why the file cannot be read at all
+
+    // How much the lines are like those of the format, though none is a measurement.
+    int64_t likeness() const
+    {
+        constexpr int64_t kMost = 1'000'000; // lines
+        const int64_t rank = frames > 0 ? 2 : failure.empty() ? 0 : 1;
+        return rank * kMost + std::min(related, kMost - 1);
+    }
 };
 
 std::vector<tMakeFormat> allFormats()
@@ -91,16 +103,6 @@ void tryAll(std::vector<tTrial>& trials, std::string_view text)
     }
 }
 
-// For people: without what would do something to their terminal.
-std::string shown(std::string_view line)
-{
-    constexpr size_t kMost = 60;
-    std::string text(line.substr(0, kMost));
-    for (char& character : text)
-        if (static_cast<unsigned char>(character) < ' ' || character == '\x7f') character = ' ';
-    return line.size() > kMost ? text + "..." : text;
-}
-
 std::vector<std::string_view> firstLines(std::string_view text, size_t most)
 {
     std::vector<std::string_view> lines;
@@ -127,20 +129,18 @@ std::string refusalOf(std::string_view text, const std::vector<tTrial>& trials)
     if (lines.empty()) return "is empty";
     const std::string kind = knownKindOf(lines);
     if (!kind.empty()) return "is " + kind;
-    for (const tTrial& trial : trials)
-        if (!trial.failure.empty()) return "cannot be read: " + trial.failure;
-    const tTrial& closest = trials[bestOf(trials, [](const tTrial& trial) {
-        return 1000 * std::min<int64_t>(trial.frames, 1) + trial.events;
-    })];
+    const tTrial& closest =
+        trials[bestOf(trials, [](const tTrial& trial) { return trial.likeness(); })];
+    if (!closest.failure.empty()) return "cannot be read: " + closest.failure;
     std::string first;
     for (size_t i = 0; i < std::min(lines.size(), kShown); ++i)
-        first += fmt::format("{}'{}'", i == 0 ? "" : ", ", shown(lines[i]));
-    if (closest.frames + closest.events == 0)
+        first += fmt::format("{}'{}'", i == 0 ? "" : ", ", printable(lines[i]));
+    if (closest.likeness() == 0)
         return fmt::format("is no trace of a known kind; it begins with {}", first);
-    const std::string reasons = reasonsOf(closest.unread);
     return fmt::format("looks like {}, but has no measurement; {}", closest.format->name(),
-                       reasons.empty() ? "it begins with " + first
-                                       : "not read are lines " + reasons);
+                       closest.reasons.empty()
+                           ? "it begins with " + first
+                           : "not used are lines " + reasonsOf(closest.reasons));
 }
 
 struct tReading {
@@ -158,7 +158,7 @@ tReading readAll(const tMakeFormat& make, std::string_view text, const tReadOpti
         reading.builder.beginLine(number);
         const tLine read = reading.format->read(line, reading.builder);
         if (read.kind == tLine::kEvent) reading.builder.addEvent();
-        if (read.kind != tLine::kUnread) continue;
+        if (read.kind != tLine::kUnread && read.kind != tLine::kForeign) continue;
         reading.builder.setUnread(number, read.why);
         if (reading.unread.size() < kLinesLookedAt) reading.unread.push_back(line);
     }

@@ -21,7 +21,8 @@ constexpr size_t kNone = 0; // the first word is never one of these
 struct tShapedLog {
     const char* name;
     const char* shape;
-    size_t sourceAt; // kNone: one series, whoever its reference was
+    const char* banner; // a part of the line of titles; "": there is none
+    size_t sourceAt;    // kNone: one series, whoever its reference was
     size_t errorAt;
     double errorNs; // of one of it, positive if ahead
     size_t frequencyAt;
@@ -51,12 +52,14 @@ std::string_view failed(const tWords& words)
 }
 
 constexpr std::array<tShapedLog, 6> kLogs = {{
-    {"chrony's refclocks.log", "DTnIlIEee", 2, 7, -1e9, kNone, 0, false, filtered},
-    {"chrony's statistics.log", "DTneeeeeeiii|f", 2, 4, 1e9, kNone, 0, false, always},
-    {"chrony's measurements.log", "DTnlibbbiifeeeee|huuu", 2, 11, -1e9, kNone, 0, false, failed},
-    {"chrony's tracking.log", "DTniffe|li|ee|eee", kNone, 6, 1e9, 4, -1e3, true, unsynchronised},
-    {"ntpd's loopstats", "msxfxxi", kNone, 2, -1e9, 3, 1e3, false, always},
-    {"ntpd's peerstats", "msnHxxx|x", 2, 4, -1e9, kNone, 0, false, always},
+    {"chrony's refclocks.log", "DTnIlIEee", "Cooked offset", 2, 7, -1e9, kNone, 0, false, filtered},
+    {"chrony's statistics.log", "DTneeeeeeiii|f", "Est offset", 2, 4, 1e9, kNone, 0, false, always},
+    {"chrony's measurements.log", "DTnlibbbiifeeeee|huuu", "L St", 2, 11, -1e9, kNone, 0, false,
+     failed},
+    {"chrony's tracking.log", "DTniffe|li|ee|eee", "Freq ppm", kNone, 6, 1e9, 4, -1e3, true,
+     unsynchronised},
+    {"ntpd's loopstats", "msxfxxi", "", kNone, 2, -1e9, 3, 1e3, false, always},
+    {"ntpd's peerstats", "msnHxxx|x", "", 2, 4, -1e9, kNone, 0, false, always},
 }};
 // The loopstats of xntpd end with the time constant.
 constexpr std::string_view kOldLoopstats = "msxfi";
@@ -78,10 +81,9 @@ private:
     size_t mostWords = 0; // so far
 };
 
-bool isFrame(const tWords& words)
+bool isBanner(const tWords& words)
 {
-    return words.empty() || words[0].substr(0, 3) == "===" ||
-           (words.size() > 2 && words[0] == "Date" && words[1] == "(UTC)");
+    return words.size() > 2 && words[0] == "Date" && words[1] == "(UTC)";
 }
 
 std::string tShapedFormat::misfitOf(const tWords& words) const
@@ -101,7 +103,11 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
 {
     constexpr size_t kMostOfPrefix = 5; // words that a system log or ts put in front
     tWords words = wordsOf(line);
-    if (isFrame(words)) return {tLine::kFrame, ""};
+    if (words.empty() || words[0].substr(0, 3) == "===") return {tLine::kFrame, ""};
+    if (isBanner(words)) {
+        const bool own = line.find(log.banner) != std::string_view::npos;
+        return {own ? tLine::kFrame : tLine::kEvent, ""};
+    }
     std::string why = misfitOf(words);
     for (size_t cut = 1; !why.empty() && cut <= kMostOfPrefix && cut < words.size(); ++cut) {
         const tWords rest(words.begin() + static_cast<std::ptrdiff_t>(cut), words.end());
@@ -109,10 +115,11 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
         words = rest;
         why.clear();
     }
-    if (!why.empty()) return tLine::unread(why);
+    if (!why.empty())
+        return words.size() > 2 && momentOf(words) ? tLine::unread(why) : tLine::foreign(why);
     if (words.size() < mostWords) return tLine::unread("cut short");
     mostWords = words.size();
-    if (!log.event(words).empty()) return {tLine::kEvent, ""};
+    if (!log.event(words).empty()) return {tLine::kEvent, std::string(log.event(words))};
     const auto momentNs = momentOf(words);
     const double errorNs = *finiteIn(words[log.errorAt]) * log.errorNs;
     if (!momentNs || !(std::fabs(errorNs) < kMostErrorNs)) return tLine::unread("no measurement");
@@ -120,8 +127,7 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
     if (log.frequencyAt != kNone)
         pair.orderedPpb = *finiteIn(words[log.frequencyAt]) * log.orderedPpb;
     if (log.slewed) pair.stepNs = -std::llround(errorNs);
-    const std::string refused = builder.add(log.sourceAt == kNone ? "" : words[log.sourceAt], pair);
-    return refused.empty() ? tLine{tLine::kMeasurement, ""} : tLine::unread(refused);
+    return tLine::added(builder.add(log.sourceAt == kNone ? "" : words[log.sourceAt], pair));
 }
 
 } // namespace

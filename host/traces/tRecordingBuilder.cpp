@@ -1,5 +1,7 @@
 #include "traces/tRecordingBuilder.h"
 
+#include "traces/lineShape.h"
+
 #include <fmt/format.h>
 
 #include <algorithm>
@@ -21,7 +23,7 @@ std::string listOf(const std::vector<std::string>& names)
 {
     std::string list;
     for (size_t i = 0; i < std::min(names.size(), kNamesShown); ++i)
-        list += fmt::format("{}'{}'", i == 0 ? "" : ", ", names[i].substr(0, kMostOfName));
+        list += fmt::format("{}'{}'", i == 0 ? "" : ", ", printable(names[i], kMostOfName));
     if (names.size() > kNamesShown)
         list += fmt::format(" and {} others", names.size() - kNamesShown);
     return list;
@@ -233,10 +235,14 @@ tRecording tRecordingBuilder::finish(const std::string& name, const std::string&
     recording.source = source.name;
     recording.pairs = std::move(source.pairs.taken);
     recording.summaries = std::move(source.summaries.taken);
+    if (!recording.pairs.empty() && !recording.summaries.empty()) {
+        recording.notes.push_back(
+            fmt::format("{} summaries are left out", recording.summaries.size()));
+    }
     recording.unreadLines = unreadLines;
     recording.firstUnread = std::move(firstUnread);
     recording.events = events;
-    recording.notes = std::move(notes);
+    recording.notes.insert(recording.notes.end(), notes.begin(), notes.end());
     return recording;
 }
 

@@ -51,13 +51,14 @@ std::string lowerCase(std::string_view text)
     return lower;
 }
 
-// With a point for a comma that cannot separate.
+// With a point for a comma that does not separate. "1,234" between commas may be a thousand.
 std::string withPoint(const std::string& field, char separator)
 {
     std::string text = field;
     const size_t comma = text.find(',');
-    if (separator != ',' && comma != std::string::npos && text.find('.') == std::string::npos)
-        text[comma] = '.';
+    if (comma == std::string::npos || text.find('.') != std::string::npos) return text;
+    const bool thousands = separator == ',' && text.size() - comma == 4;
+    if (!thousands) text[comma] = '.';
     return text;
 }
 

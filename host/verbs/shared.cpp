@@ -32,11 +32,6 @@ void addLater(std::vector<tLaterDocument>& later, const std::string& text)
     later.push_back(document);
 }
 
-std::string counted(int64_t count, const char* one, const char* many)
-{
-    return fmt::format("{} {}", count, count == 1 ? one : many);
-}
-
 void printUnread(const tRecording& recording)
 {
     if (recording.unreadLines == 0) return;
@@ -44,9 +39,8 @@ void printUnread(const tRecording& recording)
     for (const tUnreadLine& line : recording.firstUnread)
         examples += fmt::format("{}{} ({})", examples.empty() ? "" : ", ", line.number, line.why);
     const bool all = recording.unreadLines == static_cast<int64_t>(recording.firstUnread.size());
-    fmt::print(stderr, "dravik-host: {}: {} not used, {} {}\n", recording.name,
-               counted(recording.unreadLines, "line is", "lines are"),
-               all ? "lines" : "the first are lines", examples);
+    fmt::print(stderr, "dravik-host: {}: {} lines are not used, {} {}\n", recording.name,
+               recording.unreadLines, all ? "lines" : "the first are lines", examples);
 }
 
 // The setting that prints each measurement.
