@@ -46,6 +46,7 @@ private:
     using tFields = std::array<std::string, kColumns>;
 
     static int columnOf(const std::string& title);
+    static bool isHeader(std::string_view line);
     bool readHeader(std::string_view line);
     std::optional<tFields> split(std::string_view line) const;
     tLine readPair(const tFields& fields, tRecordingBuilder& builder);
@@ -89,6 +90,14 @@ int tCsvFormat::columnOf(const std::string& title)
     return found == kTitles.end() ? -1 : static_cast<int>(found - kTitles.begin());
 }
 
+bool tCsvFormat::isHeader(std::string_view line)
+{
+    if (std::isalpha(static_cast<unsigned char>(line.front())) == 0) return false;
+    const std::vector<std::string> titles = fieldsOf(line, separatorOf(line));
+    return std::any_of(titles.begin(), titles.end(),
+                       [](const std::string& title) { return columnOf(title) == kClock; });
+}
+
 tLine tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
 {
     if (line.find_first_not_of(" \t,;") == std::string_view::npos || line.front() == '#')
@@ -98,11 +107,8 @@ tLine tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
                                 : tLine::foreign("no header with reference_ns and clock_ns");
     if (line == header) return {tLine::kFrame, ""};
     const auto fields = split(line);
-    if (!fields || fields->at(kReference) == kTitles[kReference]) {
-        if (line.find(kTitles[kClock]) != std::string_view::npos)
-            throw std::runtime_error("a second header that differs from the first");
-        return tLine::unread("not as many fields as the header has");
-    }
+    if (isHeader(line)) throw std::runtime_error("a second header differs from the first");
+    if (!fields) return tLine::unread("not as many fields as the header has");
     const std::string& kind = (*fields)[kKind];
     if (kind.empty() || kind == "pair") return readPair(*fields, builder);
     if (kind == "call" || kind == "held") return readCall(*fields, builder);

@@ -97,7 +97,7 @@ std::string printable(std::string_view text, size_t most)
 {
     std::string shown(text.substr(0, most));
     for (char& character : shown)
-        if (character < ' ' || character == '\x7f') character = character == '\t' ? ' ' : '?';
+        if (character < ' ' || character > '~') character = character == '\t' ? ' ' : '?';
     return text.size() > most ? shown + "..." : shown;
 }
 

@@ -232,7 +232,7 @@ tRecording tRecordingBuilder::finish(const std::string& name, const std::string&
     tRecording recording;
     recording.name = name;
     recording.format = format;
-    recording.source = source.name;
+    recording.source = printable(source.name, kMostOfName);
     recording.pairs = std::move(source.pairs.taken);
     recording.summaries = std::move(source.summaries.taken);
     if (!recording.pairs.empty() && !recording.summaries.empty()) {

@@ -1,0 +1,352 @@
+#include "metrics/tMeasured.h"
+#include "text/files.h"
+#include "text/quantity.h"
+#include "traces/moments.h"
+#include "traces/tRecording.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+#include <cstdlib>
+#include <stdexcept>
+#include <unistd.h>
+
+using namespace dravikHost;
+
+namespace {
+
+// A file in a folder of its own that goes with it.
+class tTraceFile
+{
+public:
+    explicit tTraceFile(const std::string& text)
+    {
+        char folder[] = "/tmp/traces_test.XXXXXX";
+        path = std::string(mkdtemp(folder)) + "/trace";
+        writeText(path, text);
+    }
+    ~tTraceFile()
+    {
+        (void)unlink(path.c_str());
+        (void)rmdir(path.substr(0, path.rfind('/')).c_str());
+    }
+
+    std::string path;
+};
+
+tRecording readTraceOf(const std::string& text, const tReadOptions& options = {})
+{
+    return readRecording(tTraceFile(text).path, options);
+}
+
+// Behind the name of the file; "" if it is read.
+std::string refusalOf(const std::string& text, const tReadOptions& options = {})
+{
+    const tTraceFile file(text);
+    try {
+        (void)readRecording(file.path, options);
+    } catch (const std::runtime_error& error) {
+        const std::string why = error.what();
+        const size_t at = why.find(file.path);
+        return at == std::string::npos ? why : why.substr(at + file.path.size());
+    }
+    return "";
+}
+
+struct tReadRow {
+    const char* name;
+    const char* text;
+    size_t count;
+    double firstNs; // the first error
+    double latestNs;
+    int64_t elapsedNs; // from the first to the last
+    const char* source;
+    int64_t unread;
+};
+
+// What is read, with the sign that is positive for a clock that is ahead.
+const tReadRow kRead[] = {
+    {"ptp4l",
+     "ptp4l[10.250]: master offset -23 s2 freq +5 path delay 500\n"
+     "ptp4l[11.250]: port 1: UNCALIBRATED to SLAVE\n"
+     "ptp4l[11.500]: master offset 7 s2 freq +5 path delay 500\n",
+     2, -23, 7, 1'250'000'000, "ptp4l", 0},
+    {"behind a date",
+     "2024-05-06 10:11:00.123 ptp4l[6.202]: selected /dev/ptp1 as PTP clock\n"
+     "2024-05-06 10:11:08.750 ptp4l[6.829]: master offset -4 s2 freq +0 path delay 1\n"
+     "2024-05-06 10:11:09.751 ptp4l[7.829]: master offset -5 s2 freq +0 path delay 1\n",
+     2, -4, -5, 1'000'000'000, "ptp4l", 0},
+    {"an instance", "ptp4l[1.0]: [ptp4l.1.config:6] master offset -1 s2 freq +0 path delay 1\r\n",
+     1, -1, -1, 0, "ptp4l ptp4l.1.config", 0},
+    {"a journal's own stamp",
+     "[ 24.066123] h phc2sys[716]: [23.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n"
+     "[ 25.066123] h phc2sys[716]: [24.5] CLOCK_REALTIME phc offset 5 s2 freq +1 delay 2\n",
+     2, 4, 5, 1'000'000'000, "phc2sys CLOCK_REALTIME", 0},
+    {"a journal without programs", "[24.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n", 1, 4,
+     4, 0, "phc2sys CLOCK_REALTIME", 0},
+    {"a journal in JSON",
+     "{\"MESSAGE\":\"[24.5] swp3 sys offset 4 s2 freq +1 delay "
+     "2\",\"SYSLOG_IDENTIFIER\":\"phc2sys\"}\n",
+     1, 4, 4, 0, "phc2sys swp3", 0},
+    {"ts2phc",
+     "ts2phc[27.133]: adding tstamp 21.94 to clock /dev/ptp3\n"
+     "ts2phc[27.133]: /dev/ptp3 offset 640 s2 freq +5112\n",
+     1, 640, 640, 0, "ts2phc /dev/ptp3", 0},
+    {"damaged lines",
+     "ptp4l[1.0]: master offset 1 s2 freq +5 path delay 5\n"
+     "ptp4l[2.0]: master offset 1 sX freq +5 path delay 5\n"
+     "ptp4l[3.0]: master offset 1x s2 freq +5 path delay 5\n"
+     "ptp4l[4.0]: master offset 1 s2 freq +\n"
+     "ptp4l[5.0]: master offset 1 s2 freq +5\n"
+     "ptp4l[6.0]: master off\n"
+     "ptp4l[7\n"
+     "ptp4l[0.5]: master offset 9 s2 freq +5 path delay 5\n"
+     "ptp4l[8.0]: master offset 2 s2 freq +5 path delay 5\n",
+     2, 1, 2, 7'000'000'000, "ptp4l", 7},
+    {"refclocks.log",
+     "   Date (UTC) Time         Refid  DP L P  Raw offset   Cooked offset      Disp.\n"
+     "2026-02-28 23:59:59.500000 PPS0    0 N 1  4.900000e-07  2.300000e-08  1.000e-06\n"
+     "2026-02-28 23:59:59.500000 PPS0    - N -       -       -6.741777e-07  1.000e-06\n"
+     "2026-02-30 00:00:00.500000 PPS0    1 N 1  4.900000e-07  1.500000e-08  1.000e-06\n"
+     "2026-03-01 00:00:00.750000 PPS0    1 N 1  4.900000e-07 -1.500000e-08  1.000e-06\n",
+     2, -23, 15, 1'250'000'000, "PPS0", 1},
+    {"statistics.log of two versions",
+     "2017-08-31 16:27:19 192.0.2.1 4.611e-06  3.391e-05  5.239e-06  9.759e-07  9.758e-04 4.9e-04 "
+     "3 0 3\n"
+     "2017-08-31 16:27:21 192.0.2.1 3.754e-06 -5.693e-06  2.461e-06 -4.123e-07  2.171e-05 1.4e-03 "
+     "4 0 3  0.00\n",
+     2, 33'910, -5'693, 2'000'000'000, "192.0.2.1", 0},
+    {"measurements.log",
+     "2019-09-05 06:34:59 2001:db8::1 N  2 111 111 1111 10 10 0.66 -3.572e-03  6.332e-02  "
+     "1.038e-06  3.204e-04  7.339e-03 C0000265 4B K K\n"
+     "2019-09-05 06:35:59 2001:db8::1 N  2 111 101 0000 10 10 0.66  0.000e+00  0.000e+00  "
+     "0.000e+00  3.204e-04  7.339e-03 C0000265 4B K K\n",
+     1, 3'572'000, 3'572'000, 0, "2001:db8::1", 0},
+    {"tracking.log over servers",
+     "2021-11-20 19:14:48 192.0.2.31 3 -764.414 0.056 -1.303e-04 N  1  2.088e-04  4.095e-05  "
+     "6.437e-03  1.208e-03  5.108e-03\n"
+     "2021-11-20 19:15:00 192.0.2.31 3 -764.414 0.056 -9.303e-04 ?  1  2.088e-04  4.095e-05  "
+     "6.437e-03  1.208e-03  5.108e-03\n"
+     "2021-11-20 19:31:53 192.0.2.32 3 -764.418 0.096 -4.869e-04 N  1  3.354e-04  7.768e-05  "
+     "9.840e-03  1.408e-03  5.689e-03\n"
+     "2021-11-20 19:32:53 192.0.2.32 3 -764.418 0.096 -4.869e-0\n",
+     2, -130'300, -486'900, 1'025'000'000'000, "", 1},
+    {"loopstats at midnight",
+     "50935 86390.031 0.000006019 13.778190 0.000351733 0.013380 6\n"
+     "50936 54.031 -0.000006319 13.778290 0.000351733 0.013380 6\n",
+     2, -6'019, 6'319, 64'000'000'000, "", 0},
+    {"loopstats of old", "50935 75440.031 0.000006019 13.778190 6\n", 1, -6'019, -6'019, 0, "", 0},
+    {"peerstats", "48773 10847.650 PPS(0) 961a -0.001605376 0.000000000 0.001424877 0.000958674\n",
+     1, 1'605'376, 1'605'376, 0, "PPS(0)", 0},
+    {"sfptpd",
+     "2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n",
+     1, 12.375, 12.375, 0, "ptp1->system(em1)", 0},
+    {"ptpd",
+     "# Timestamp, State, Clock ID, One Way Delay, Offset From Master, Slave to Master\n"
+     "2015-06-11 13:20:12.123456, lstn, , , , \n"
+     "2015-06-11 13:20:13.123456, slv, 0011/01,  0.000010234,  0.000000123,  0.000010000, S\n",
+     1, 123, 123, 0, "", 0},
+    {"CSV of spreadsheets",
+     "\xef\xbb\xbf"
+     "\"Reference_NS\" ; Clock_NS ; note\r\n"
+     "1700000000000000000 ; \"1700000000000000023\" ;\r\n"
+     "1700000001000000000;1700000000999999999,25;x;\r\n",
+     2, 23, -0.75, 1'000'000'000, "", 0},
+    {"TIE with units", "# time [ms]  TIE [us]\n0 1.5\n125 -2\n", 2, 1500, -2000, 125'000'000, "",
+     0},
+    {"TIE with decimal commas", "time (s);TIE (ns)\n0,000;11,5\n0,125;13\n0,250;\n", 2, 11.5, 13,
+     125'000'000, "", 1},
+    {"an offset with its unit",
+     "when,timestamp,offset_us\na,2024-05-06T10:00:00Z,12\nb,2024-05-06T10:00:01Z,-14\n", 2, 12'000,
+     -14'000, 1'000'000'000, "", 0},
+    {"phase with a header", "File: a.phd\nType: Phase\nTau: 0.5\n# Header End\n1.2e-9\n-0.9e-9\n",
+     2, 1.2, -0.9, 500'000'000, "", 0},
+};
+
+TEST(Trace, isReadByWhatItsLinesAre)
+{
+    for (const tReadRow& row : kRead) {
+        SCOPED_TRACE(row.name);
+        const tRecording recording = readTraceOf(row.text);
+        ASSERT_EQ(row.count, recording.pairs.size());
+        EXPECT_NEAR(row.firstNs, recording.pairs.front().errorNs, 1e-6);
+        EXPECT_NEAR(row.latestNs, recording.pairs.back().errorNs, 1e-6);
+        EXPECT_EQ(row.elapsedNs, recording.pairs.back().elapsedNs);
+        EXPECT_EQ(row.source, recording.source);
+        EXPECT_EQ(row.unread, recording.unreadLines);
+    }
+}
+
+struct tRefusedRow {
+    const char* text;
+    const char* why; // a part of it
+};
+const tRefusedRow kRefused[] = {
+    {"", " is empty"},
+    {"hello world\n", " is no trace of a known kind; it begins with 'hello world'"},
+    {"\x1f\x8b\x08", " is compressed"},
+    {"\xff\xfe"
+     "1",
+     " is text in UTF-16"},
+    {"2015-07-22 05:40:50 -0.037360 1 -0.037434 -37.948 12 5 120\n", " is chrony's rtc.log"},
+    {"2022-05-01 02:01:20 203.0.113.15 * ----- 377 1.00 4.228e+01 -1.575e-04 1.239e-04\n",
+     " is chrony's selection.log"},
+    {"2015-04-19 10:39:48  2.8000e+04  3.6600e-01\n", " is chrony's tempcomp.log"},
+    {"Reference ID    : C0000201 (host2.example)\nStratum : 3\n", "'chronyc tracking'"},
+    {"49213 525.624 127.127.4.1 93 226 00:08:29.606 D\n", " is ntpd's clockstats"},
+    {"50928 2132.543 192.0.2.1 192.0.2.20 3102453281.58 3102453281.58 3102453332.54 "
+     "3102453332.54\n",
+     " is ntpd's rawstats"},
+    {"sample NTP2 1490919281.1 1490919281.0 1490919281.0 0 -20\n", " is ntpshmmon's"},
+    {"source 0 - assert 1490919281.000001234, sequence: 5\n", " is ppstest's"},
+    {"phc_ctl[4117.187]: offset from CLOCK_REALTIME is -37000000251ns\n", " is phc_ctl's"},
+    {"CLOCK_REALTIME phc offset 65 s2 freq -45509 delay 351557\n", "without the time in front"},
+    {"reference_ns,clock_ns,clock_ns\n1,2,3\n", "the column clock_ns stands there 2 times"},
+    {"reference_ns,clock_ns\n1.7E+18,1.7E+18\n", "a spreadsheet has rounded away"},
+    {"reference_ns,clock_ns\nx,1\n", "not used are lines 2 (no number in reference_ns"},
+    {"reference_ns,clock_ns\n1,2\nclock_ns,reference_ns\n1,2\n", "a second header"},
+    {"time,offset\n0,1\n1,2\n", "the column 'offset' does not tell its unit"},
+    {"Time (s),Phase (rad)\n0,1\n1,2\n", "the unit 'rad' of its header is none of time"},
+    {"Time (s),Frequency (Hz)\n0,1\n1,2\n", "names no time error that is known"},
+    {"Time,TIE (ns),Phase (ns)\n0,1,2\n", "two columns may be the error"},
+    {"1\n2\n", "no time, and no --interval"},
+    {"Tau: 1\n1\n\n2,5\nx\n", "line 4 is not one number"},
+    {"2021-11-20 19:15:00 h 3 -1.4 0.056 -9.303e-04 ?  1 2.0e-04 4.0e-05\n", "(not synchronised)"},
+};
+
+TEST(Trace, isRefusedByWhatItIs)
+{
+    for (const tRefusedRow& row : kRefused) {
+        const std::string why = refusalOf(row.text);
+        EXPECT_NE(std::string::npos, why.find(row.why)) << row.text << why;
+    }
+    EXPECT_NE(std::string::npos,
+              refusalOf(std::string(3'000'000, '\0')).find("a line of more than"));
+}
+
+TEST(Trace, doesNotMixFormats)
+{
+    std::string text;
+    for (int i = 10; i < 14; ++i)
+        text += "2015-04-19 10:39:" + std::to_string(i) + " h 3 -1.4 0.056 -9.303e-04\n";
+    for (int i = 10; i < 14; ++i)
+        text += "ptp4l[" + std::to_string(i) + ".5]: master offset 1 s2 freq +1 path delay 1\n";
+    EXPECT_NE(std::string::npos, refusalOf(text).find(" mixes "));
+}
+
+TEST(Trace, tellsItsSourcesApart)
+{
+    const std::string line = " offset 1 s2 freq +1 delay 1\n";
+    const std::string both =
+        "h1 phc2sys[7]: [1.5] eth1 sys" + line + "h1 phc2sys[7]: [1.5] eth10 sys" + line;
+    EXPECT_NE(std::string::npos,
+              refusalOf(both).find("by --source: 'phc2sys eth1', 'phc2sys eth10'"));
+    tReadOptions options;
+    options.source = "phc2sys eth1"; // the one of that very name
+    EXPECT_EQ(1U, readTraceOf(both, options).pairs.size());
+    options.source = "eth2";
+    EXPECT_NE(std::string::npos, refusalOf(both, options).find(" has no source 'eth2', but"));
+
+    std::string many;
+    for (int i = 0; i < 20'000; ++i)
+        many += "phc2sys[1.5]: eth" + std::to_string(i) + " sys" + line;
+    const std::string why = refusalOf(many);
+    EXPECT_NE(std::string::npos, why.find("and 19990 others"));
+    EXPECT_LT(why.size(), 500U);
+}
+
+// Runs of a program one after the other are one source, side by side they are two.
+TEST(Trace, tellsRunsOfAProgramApart)
+{
+    const auto line = [](int process, int second) {
+        return "host phc2sys[" + std::to_string(process) + "]: [" + std::to_string(second) +
+               ".5] CLOCK_REALTIME phc offset " + std::to_string(second) + " s2 freq +1 delay 1\n";
+    };
+    const tRecording restarted = readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21));
+    ASSERT_EQ(4U, restarted.pairs.size());
+    EXPECT_EQ(11 * kSecondNs, restarted.pairs.back().elapsedNs);
+    EXPECT_FALSE(restarted.pairs[2].beginsStretch);
+    const std::string why = refusalOf(line(7, 10) + line(8, 10) + line(7, 11) + line(8, 11));
+    EXPECT_NE(std::string::npos, why.find("'phc2sys CLOCK_REALTIME (host 7)', "
+                                          "'phc2sys CLOCK_REALTIME (host 8)'"));
+}
+
+// Time that goes back for good begins a stretch, across which nothing is computed.
+TEST(Trace, beginsAStretchAfterAReboot)
+{
+    std::string text;
+    const auto add = [&text](int second, int offset) {
+        text += "ptp4l[" + std::to_string(second) + ".0]: master offset " + std::to_string(offset) +
+                " s2 freq +1 path delay 1\n";
+    };
+    for (int i = 0; i < 5; ++i)
+        add(1000 + i, 10);
+    for (int i = 0; i < 8; ++i)
+        add(50 + i, -10);
+    tRecording recording = readTraceOf(text);
+    ASSERT_EQ(13U, recording.pairs.size());
+    EXPECT_TRUE(recording.pairs[5].beginsStretch);
+    EXPECT_GT(recording.pairs[5].elapsedNs, recording.pairs[4].elapsedNs);
+    const tMeasured measured = measure(recording, {});
+    EXPECT_EQ(8U, measured.series.phase.size());
+    EXPECT_DOUBLE_EQ(1, measured.series.interval);
+    keepLongestStretch(recording);
+    ASSERT_EQ(8U, recording.pairs.size());
+    EXPECT_EQ(0, recording.pairs.front().elapsedNs);
+    EXPECT_EQ(-10, recording.pairs.front().errorNs);
+}
+
+TEST(Trace, readsSummariesAsWhatTheyAre)
+{
+    const tRecording recording =
+        readTraceOf("ptp4l[1.0]: rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
+                    "ptp4l[2.0]: rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n");
+    const tMeasured measured = measure(recording, {});
+    EXPECT_EQ(2U, measured.errors.size());
+    EXPECT_NEAR(std::sqrt((9 + 16) / 2.0) * 1e-9, measured.rms(), 1e-18);
+    EXPECT_DOUBLE_EQ(7e-9, measured.peak());
+    EXPECT_FALSE(measured.mean());
+    EXPECT_TRUE(measured.series.phase.empty());
+}
+
+TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
+{
+    tReadOptions options;
+    options.unitNs = 1;
+    const tRecording columns = readTraceOf("0 5\n1 6\n", options);
+    EXPECT_EQ(5, columns.pairs.front().errorNs);
+    EXPECT_EQ(" has a unit of its own; leave --unit out",
+              refusalOf("time (s),tie (us)\n0,5\n1,6\n", options));
+
+    options = {};
+    options.intervalNs = 2e9;
+    const tRecording lines =
+        readTraceOf("phc offset 65 s2 freq -4 delay 3\nphc offset 6x s2 freq -4 delay 3\n"
+                    "phc offset 67 s2 freq -4 delay 3\n",
+                    options);
+    ASSERT_EQ(2U, lines.pairs.size());
+    EXPECT_EQ(4 * kSecondNs, lines.pairs.back().elapsedNs); // that of the damaged line included
+    EXPECT_EQ(" has times of its own; leave --interval out", refusalOf("0 5\n1 6\n", options));
+    options.frequency = true;
+    const tRecording frequency = readTraceOf("1e-9\n-3e-9\n", options);
+    ASSERT_EQ(3U, frequency.pairs.size());
+    EXPECT_NEAR(-4, frequency.pairs.back().errorNs, 1e-9);
+}
+
+TEST(Moments, goOnEvenlyThroughALeapSecond)
+{
+    tMoments moments;
+    const auto before = moments.ofDate("2016-12-31", "23:59:59");
+    const auto leap = moments.ofDate("2016-12-31", "23:59:60.5");
+    const auto after = moments.ofDate("2017-01-01", "00:00:00");
+    ASSERT_TRUE(before && leap && after);
+    EXPECT_EQ(1'500'000'000, *leap - *before);
+    EXPECT_EQ(2'000'000'000, *after - *before);
+    for (const char* const date :
+         {"2026-02-30", "2026-13-01", "2025-02-29", "2026-00-10", "26-01-01"})
+        EXPECT_FALSE(moments.ofDate(date, "00:00:00")) << date;
+    for (const char* const time : {"24:00:00", "12:60:00", "12:00:60", "12:00", "12:00:61"})
+        EXPECT_FALSE(moments.ofDate("2026-02-28", time)) << time;
+}
+
+} // namespace
