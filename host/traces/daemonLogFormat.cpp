@@ -101,6 +101,14 @@ int stateIn(std::string_view word)
     return known ? word[1] - '0' : -1;
 }
 
+// Within "path delay 500" or "delay 500", its number not begun.
+bool breaksOffInDelay(const tWords& words)
+{
+    const std::string_view last = words.back();
+    return std::string_view("path").substr(0, last.size()) == last ||
+           std::string_view("delay").substr(0, last.size()) == last;
+}
+
 bool isFreq(std::string_view word) { return word == "freq" || word == "adj"; }
 
 tLine tDaemonLogFormat::read(std::string_view line, tRecordingBuilder& builder)
@@ -158,7 +166,7 @@ tLine tDaemonLogFormat::readOffset(const tLogMessage& message, const tWords& wor
     if (state < 0) return tLine::unread("an unknown state");
     if (!isFreq(words[at + 3]) || !freqPpb) return tLine::unread("the frequency is no number");
     const size_t delayAt = indexOf(words, "delay");
-    if (words.size() > at + 5 && delayAt + 1 >= words.size()) return tLine::unread("cut short");
+    if (words.size() > at + 5 && breaksOffInDelay(words)) return tLine::unread("cut short");
     if (isCutShort(message, delayAt < words.size())) return tLine::unread("cut short");
     tRecordedPair pair = pairOf(*momentNs, *offsetNs);
     pair.orderedPpb = -*freqPpb;

@@ -77,7 +77,9 @@ public:
                 fields.size() > kOffsetAt && fields[kOffsetAt] == "Offset From Master";
             return ours ? tLine{tLine::kFrame, ""} : tLine::foreign("no measurement");
         }
-        const auto momentNs = moments.ofIso(fields[0]);
+        auto momentNs = moments.ofIso(fields[0]);
+        if (!momentNs) momentNs = secondsIn(fields[0]);
+        if (fields.size() > 1 && secondsIn(fields[1])) fields.erase(fields.begin() + 1); // both
         if (!momentNs || fields.size() < 3) return tLine::foreign("no measurement");
         if (fields[1] != "slv") return {tLine::kEvent, "not in the state slv"};
         if (fields.size() <= kOffsetAt + 1) return tLine::unread("cut short");

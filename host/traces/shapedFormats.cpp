@@ -54,7 +54,7 @@ std::string_view failed(const tWords& words)
 constexpr std::array<tShapedLog, 6> kLogs = {{
     {"chrony's refclocks.log", "DTnIlIEee", "Cooked offset", 2, 7, -1e9, kNone, 0, false, filtered},
     {"chrony's statistics.log", "DTneeeeeeiii|f", "Est offset", 2, 4, 1e9, kNone, 0, false, always},
-    {"chrony's measurements.log", "DTnlibbbiifeeeee|huuu", "L St", 2, 11, -1e9, kNone, 0, false,
+    {"chrony's measurements.log", "DTnlibbbiifeeeee|h|u|u|u", "L St", 2, 11, -1e9, kNone, 0, false,
      failed},
     {"chrony's tracking.log", "DTniffe|li|ee|eee", "Freq ppm", kNone, 6, 1e9, 4, -1e3, true,
      unsynchronised},
@@ -73,6 +73,7 @@ public:
     tLine read(std::string_view line, tRecordingBuilder& builder) override;
 
 private:
+    bool beginsWith(std::string_view word) const; // a measurement
     std::string misfitOf(const tWords& words) const;
     std::optional<int64_t> momentOf(const tWords& words);
 
@@ -84,6 +85,12 @@ private:
 bool isBanner(const tWords& words)
 {
     return words.size() > 2 && words[0] == "Date" && words[1] == "(UTC)";
+}
+
+bool tShapedFormat::beginsWith(std::string_view word) const
+{
+    return log.shape[0] == 'm' ? numberIn<uint32_t>(word).has_value()
+                               : word.size() == 10 && word[4] == '-' && word[7] == '-';
 }
 
 std::string tShapedFormat::misfitOf(const tWords& words) const
@@ -108,15 +115,17 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
         const bool own = line.find(log.banner) != std::string_view::npos;
         return {own ? tLine::kFrame : tLine::kEvent, ""};
     }
-    std::string why = misfitOf(words);
-    for (size_t cut = 1; !why.empty() && cut <= kMostOfPrefix && cut < words.size(); ++cut) {
-        const tWords rest(words.begin() + static_cast<std::ptrdiff_t>(cut), words.end());
-        if (!misfitOf(rest).empty()) continue;
-        words = rest;
-        why.clear();
+    std::string why;
+    bool found = false;
+    for (size_t cut = 0; cut <= kMostOfPrefix && cut + 1 < words.size() && !found; ++cut) {
+        if (!beginsWith(words[cut])) continue;
+        tWords rest(words.begin() + static_cast<std::ptrdiff_t>(cut), words.end());
+        const std::string misfits = misfitOf(rest);
+        found = misfits.empty();
+        if (found) words = std::move(rest);
+        if (why.empty()) why = misfits;
     }
-    if (!why.empty())
-        return words.size() > 2 && momentOf(words) ? tLine::unread(why) : tLine::foreign(why);
+    if (!found) return why.empty() ? tLine::foreign("no date") : tLine::unread(why);
     if (words.size() < mostWords) return tLine::unread("cut short");
     mostWords = words.size();
     if (!log.event(words).empty()) return {tLine::kEvent, std::string(log.event(words))};
