@@ -57,6 +57,7 @@ private:
     std::optional<double> errorUnitNs;
     std::string errorTitle = "the error";
     std::string strangeHeader; // in front of the rows, without an error
+    size_t strangeTitles = 0;
     int64_t count = 0;
     double phaseNs = 0; // of a frequency
 };
@@ -77,7 +78,7 @@ bool isOneOf(const std::string& name, const std::array<std::string_view, size>& 
 
 bool isComment(std::string_view line)
 {
-    return line.empty() || std::string_view("#%!*/").find(line.front()) != std::string_view::npos;
+    return line.empty() || std::string_view("#%!*/;").find(line.front()) != std::string_view::npos;
 }
 
 std::string lowerCase(std::string text)
@@ -148,7 +149,7 @@ tLine tColumnsFormat::read(std::string_view line, tRecordingBuilder& builder)
                   (numberOf(fields[0], between) || moments.ofIso(fields[0]));
     if (!isData && fieldCount == 0)
         return readComment(line) ? tLine{tLine::kFrame, ""} : readHeader(line);
-    if (!strangeHeader.empty()) {
+    if (!strangeHeader.empty() && strangeTitles == fields.size()) {
         throw std::runtime_error(
             fmt::format("its header, '{}', names no time error that is known", strangeHeader));
     }
@@ -172,8 +173,10 @@ tLine tColumnsFormat::readHeader(std::string_view line)
                            return isOneOf(title.name, kErrorNames);
                        });
     const bool names = !isComment(line) || (!titles.empty() && isOneOf(titles[0].name, kTimeNames));
-    if (!known && titles.size() > 1 && strangeHeader.empty() && names)
+    if (!known && strangeHeader.empty() && names) {
         strangeHeader = printable(line);
+        strangeTitles = titles.size();
+    }
     if (!known) return tLine::foreign("in front of the first row");
     chooseColumns(titles);
     separator = between;

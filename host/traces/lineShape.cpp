@@ -107,24 +107,33 @@ std::optional<double> finiteIn(std::string_view text)
     return number && std::isfinite(*number) ? number : std::nullopt;
 }
 
-std::string misfit(const tWords& words, std::string_view shape)
+size_t fittingWords(const tWords& words, std::string_view shape)
 {
-
     size_t count = 0;
     for (const char letter : shape) {
-        if (letter == '|') {
-            if (count == words.size()) return "";
-            continue;
-        }
-        if (count == words.size()) return "cut short";
-        if (!fits(words[count], letter)) {
-            const bool number = std::string_view("efxiEI").find(letter) != std::string_view::npos;
-            return fmt::format("field {}, '{}', is {}", count + 1, printable(words[count], 30),
-                               number ? "not a number as it should be" : "not what it should be");
-        }
+        if (letter == '|') continue;
+        if (count == words.size() || !fits(words[count], letter)) break;
         ++count;
     }
-    return count == words.size() ? "" : "more fields than there should be";
+    return count;
+}
+
+std::string misfit(const tWords& words, std::string_view shape)
+{
+    const size_t count = fittingWords(words, shape);
+    size_t letters = 0;
+    char expected = '\0'; // of the first word that does not fit
+    bool mayEnd = false;
+    for (const char letter : shape) {
+        mayEnd = mayEnd || (letter == '|' && letters == count);
+        if (letter == '|') continue;
+        if (letters++ == count) expected = letter;
+    }
+    if (count == words.size()) return count == letters || mayEnd ? "" : "cut short";
+    if (count == letters) return "more fields than there should be";
+    const bool number = std::string_view("efxiEI").find(expected) != std::string_view::npos;
+    return fmt::format("field {}, '{}', is {}", count + 1, printable(words[count], 30),
+                       number ? "not a number as it should be" : "not what it should be");
 }
 
 } // namespace dravikHost

@@ -33,4 +33,7 @@ std::optional<double> finiteIn(std::string_view text);
 // Returns why the words do not fit, "" if they do.
 std::string misfit(const tWords& words, std::string_view shape);
 
+// How many of them fit before the first that does not.
+size_t fittingWords(const tWords& words, std::string_view shape);
+
 } // namespace dravikHost

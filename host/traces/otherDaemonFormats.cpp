@@ -47,10 +47,11 @@ public:
         const auto momentNs = words.size() < 2 ? std::nullopt : moments.ofDate(words[0], words[1]);
         const bool event = momentNs && words.size() > 2 && words[2].back() == ':';
         if (!pair) return event ? tLine{tLine::kEvent, ""} : tLine::foreign("no measurement");
-        std::string_view rest = line.substr(close + 11);
-        if (rest.find(',') == std::string_view::npos) return tLine::unread("cut short");
+        const std::string_view rest = line.substr(close + 11);
+        const size_t end = rest.find(", ");
+        if (end == std::string_view::npos) return tLine::unread("cut short");
         return addTo(builder, line.substr(open + 1, close - open - 1), momentNs,
-                     finiteIn(trimmed(takeField(rest))));
+                     finiteIn(trimmed(rest.substr(0, end))));
     }
 
 private:
@@ -83,7 +84,9 @@ public:
         if (!momentNs || fields.size() < 3) return tLine::foreign("no measurement");
         if (fields[1] != "slv") return {tLine::kEvent, "not in the state slv"};
         if (fields.size() <= kOffsetAt + 1) return tLine::unread("cut short");
-        const auto seconds = finiteIn(fields[kOffsetAt]);
+        const bool whole =
+            fields[kOffsetAt].find('.') == std::string_view::npos; // commas for points
+        const auto seconds = whole ? std::nullopt : finiteIn(fields[kOffsetAt]);
         return addTo(builder, "", momentNs, seconds ? std::optional(*seconds * 1e9) : std::nullopt);
     }
 

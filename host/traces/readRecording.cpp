@@ -37,8 +37,8 @@ public:
                 start != std::string_view::npos &&
                 (std::isalnum(static_cast<unsigned char>(line[start])) != 0 || line[start] == '"');
             if (read.kind == tLine::kFrame && says) ++frames;
-            if (read.kind == tLine::kEvent) related += 2;
-            if (read.kind == tLine::kUnread) ++related;
+            if (read.kind == tLine::kEvent) related += read.why.empty() ? 1 : 3;
+            if (read.kind == tLine::kUnread) related += 2;
             if (!read.why.empty() && reasons.size() < 3) reasons.push_back({number, read.why});
         } catch (const std::runtime_error& error) {
             failure = error.what();

@@ -75,6 +75,7 @@ public:
 private:
     bool beginsWith(std::string_view word) const; // a measurement
     std::string misfitOf(const tWords& words) const;
+    tLine withoutPrefix(tWords& words) const;
     std::optional<int64_t> momentOf(const tWords& words);
 
     const tShapedLog& log;
@@ -106,26 +107,38 @@ std::optional<int64_t> tShapedFormat::momentOf(const tWords& words)
                                : moments.ofDate(words[0], words[1]);
 }
 
+// Takes away what a system log or ts put in front of a measurement.
+tLine tShapedFormat::withoutPrefix(tWords& words) const
+{
+    constexpr size_t kMostOfPrefix = 5; // words
+    constexpr size_t kTelling = 4;      // words that other logs do not have like this
+    std::string why;
+    bool damaged = false;
+    for (size_t cut = 0; cut <= kMostOfPrefix && cut + 1 < words.size(); ++cut) {
+        if (!beginsWith(words[cut])) continue;
+        tWords rest(words.begin() + static_cast<std::ptrdiff_t>(cut), words.end());
+        const std::string misfits = misfitOf(rest);
+        if (misfits.empty()) {
+            words = std::move(rest);
+            return {tLine::kMeasurement, ""};
+        }
+        damaged = damaged || fittingWords(rest, log.shape) >= kTelling;
+        if (why.empty()) why = misfits;
+    }
+    if (damaged) return tLine::unread(why);
+    return tLine::foreign(why.empty() ? "no date" : why);
+}
+
 tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
 {
-    constexpr size_t kMostOfPrefix = 5; // words that a system log or ts put in front
     tWords words = wordsOf(line);
     if (words.empty() || words[0].substr(0, 3) == "===") return {tLine::kFrame, ""};
     if (isBanner(words)) {
         const bool own = line.find(log.banner) != std::string_view::npos;
         return {own ? tLine::kFrame : tLine::kEvent, ""};
     }
-    std::string why;
-    bool found = false;
-    for (size_t cut = 0; cut <= kMostOfPrefix && cut + 1 < words.size() && !found; ++cut) {
-        if (!beginsWith(words[cut])) continue;
-        tWords rest(words.begin() + static_cast<std::ptrdiff_t>(cut), words.end());
-        const std::string misfits = misfitOf(rest);
-        found = misfits.empty();
-        if (found) words = std::move(rest);
-        if (why.empty()) why = misfits;
-    }
-    if (!found) return why.empty() ? tLine::foreign("no date") : tLine::unread(why);
+    const tLine shaped = withoutPrefix(words);
+    if (shaped.kind != tLine::kMeasurement) return shaped;
     if (words.size() < mostWords) return tLine::unread("cut short");
     mostWords = words.size();
     if (!log.event(words).empty()) return {tLine::kEvent, std::string(log.event(words))};

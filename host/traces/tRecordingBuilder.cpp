@@ -81,6 +81,7 @@ std::string tRecordingBuilder::append(tTrack<Measurement>& track, Measurement me
     if (track.taken.empty()) {
         track.firstNs = timeNs;
         track.shiftNs = -timeNs;
+        track.firstGeneration = generation;
         track.generation = generation;
     } else if (track.generation != generation) {
         dropWaiting(track);
@@ -158,7 +159,8 @@ void tRecordingBuilder::join(tTrack<Measurement>& earlier, tTrack<Measurement>&&
         earlier = std::move(later);
         return;
     }
-    const bool back = later.firstNs <= earlier.latestNs;
+    const bool back =
+        later.firstNs <= earlier.latestNs || later.firstGeneration != earlier.generation;
     const int64_t laterByNs =
         back ? earlier.taken.back().elapsedNs + 1 : later.firstNs + earlier.shiftNs;
     later.taken.front().beginsStretch = back;
@@ -168,6 +170,7 @@ void tRecordingBuilder::join(tTrack<Measurement>& earlier, tTrack<Measurement>&&
     }
     earlier.shiftNs = later.shiftNs + laterByNs;
     earlier.latestNs = later.latestNs;
+    earlier.generation = later.generation;
 }
 
 // A program that was started again goes on; programs that ran side by side get names of their own.

@@ -69,6 +69,7 @@ private:
         int64_t firstNs = 0; // of the log
         int64_t shiftNs = 0; // from the time of the log to the elapsed one
         int64_t latestNs = 0;
+        int64_t firstGeneration = 0;
         int64_t generation = 0;
         std::optional<Measurement> waiting; // went back
         int64_t waitingLine = 0;

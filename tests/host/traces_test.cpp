@@ -205,6 +205,8 @@ const tRefusedRow kRefused[] = {
     {"reference_ns,clock_ns\n1.7E+18,1.7E+18\n", "a spreadsheet has rounded away"},
     {"reference_ns,clock_ns\nx,1\n", "not used are lines 2 (no number in reference_ns"},
     {"reference_ns,clock_ns\n1,2\nclock_ns,reference_ns\n1,2\n", "a second header"},
+    {"Frequency\n1\n2\n", "names no time error that is known"},
+    {"2016-03-03 10:04:41.4 [a->b], offset: 12,375, freq-adj: 1,5\n", "the offset is no number"},
     {"time,offset\n0,1\n1,2\n", "the column 'offset' does not tell its unit"},
     {"Time (s),Phase (rad)\n0,1\n1,2\n", "the unit 'rad' of its header is none of time"},
     {"Time (s),Frequency (Hz)\n0,1\n1,2\n", "names no time error that is known"},
