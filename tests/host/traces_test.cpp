@@ -80,7 +80,7 @@ const tReadRow kRead[] = {
      1, -1, -1, 0, "ptp4l ptp4l.1.config", 0},
     {"a journal's own stamp",
      "[ 24.066123] h phc2sys[716]: [23.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n"
-     "[ 25.066123] h phc2sys[716]: [24.5] CLOCK_REALTIME phc offset 5 s2 freq +1 delay 2\n",
+     "[ 25.266123] h phc2sys[716]: [24.5] CLOCK_REALTIME phc offset 5 s2 freq +1 delay 2\n",
      2, 4, 5, 1'000'000'000, "phc2sys CLOCK_REALTIME", 0},
     {"a journal without programs", "[24.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n", 1, 4,
      4, 0, "phc2sys CLOCK_REALTIME", 0},
@@ -175,6 +175,20 @@ TEST(Trace, isReadByWhatItsLinesAre)
         EXPECT_EQ(row.source, recording.source);
         EXPECT_EQ(row.unread, recording.unreadLines);
     }
+}
+
+// The rate that was given to the clock, and the steps.
+TEST(Trace, tellsTheCorrections)
+{
+    const auto first = [](const char* text) { return readTraceOf(text).pairs.front(); };
+    const tRecordedPair ptp4l = first("ptp4l[1.0]: master offset -23 s1 freq +5 path delay 1\n");
+    EXPECT_EQ(-5, ptp4l.orderedPpb);
+    EXPECT_EQ(23, ptp4l.stepNs);
+    const tRecordedPair tracking = first("2021-11-20 19:14:48 h 3 -764.414 0.056 -1.303e-04\n");
+    EXPECT_NEAR(764'414, *tracking.orderedPpb, 1e-6);
+    EXPECT_EQ(130'300, tracking.stepNs); // slewed away before the next line
+    const tRecordedPair loopstats = first("50935 75440.031 0.000006019 13.778190 6\n");
+    EXPECT_NEAR(13'778.19, *loopstats.orderedPpb, 1e-6);
 }
 
 struct tRefusedRow {
