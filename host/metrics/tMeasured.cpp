@@ -50,9 +50,10 @@ int64_t medianSpacingNs(const std::vector<const Measurement*>& selected)
 {
     std::vector<int64_t> spacings;
     spacings.reserve(selected.size());
-    for (size_t i = 1; i < selected.size(); ++i)
-        if (!selected[i]->beginsStretch)
-            spacings.push_back(selected[i]->elapsedNs - selected[i - 1]->elapsedNs);
+    for (size_t i = 1; i < selected.size(); ++i) {
+        if (selected[i]->beginsStretch) continue;
+        spacings.push_back(selected[i]->elapsedNs - selected[i - 1]->elapsedNs);
+    }
     return spacings.empty() ? 0 : median(std::move(spacings));
 }
 

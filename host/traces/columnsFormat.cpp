@@ -112,18 +112,20 @@ bool tColumnsFormat::readComment(std::string_view line)
     if (name == "tau" || name == "tau0") {
         const auto seconds = numberOf(value, kBlanks);
         if (!seconds || !(*seconds > 0)) return false;
-        if (intervalNs && std::fabs(*intervalNs - *seconds * 1e9) > *intervalNs * 1e-6)
+        if (intervalNs && std::fabs(*intervalNs - *seconds * 1e9) > *intervalNs * 1e-6) {
             throw std::runtime_error(
                 fmt::format("its Tau of {} s is not the interval given", value));
+        }
         intervalNs = *seconds * 1e9;
         return true;
     }
     if (name == "type" && lowerCase(value).substr(0, 4) == "freq") frequency = true;
     if (name == "unit" || name == "units") {
         errorUnitNs = unitNsOf(value);
-        if (!errorUnitNs)
+        if (!errorUnitNs) {
             throw std::runtime_error(
                 fmt::format("its unit '{}' is none of time", printable(value)));
+        }
     }
     return assigns;
 }
@@ -205,9 +207,10 @@ void tColumnsFormat::chooseColumns(const std::vector<tTitle>& titles)
     errorTitle = fmt::format("the column '{}'", titles[errorAt].name);
     const auto unitOfTitle = [&titles](size_t i) {
         const auto unitNs = unitNsOf(titles[i].unit);
-        if (!unitNs && !titles[i].unit.empty())
+        if (!unitNs && !titles[i].unit.empty()) {
             throw std::runtime_error(fmt::format("the unit '{}' of its header is none of time",
                                                  printable(titles[i].unit)));
+        }
         return unitNs;
     };
     errorUnitNs = unitOfTitle(errorAt);
@@ -251,9 +254,10 @@ tLine tColumnsFormat::readRow(const std::vector<std::string>& fields, char betwe
     if (!momentNs) return tLine::unread("no time in the column of the time");
     if (!(std::fabs(errorNs) < kMostErrorNs)) return tLine::unread("an error of years");
 
-    if (first && !errorUnitNs && !options.unitNs)
+    if (first && !errorUnitNs && !options.unitNs) {
         builder.addNote(errorTitle +
                         " does not tell its unit, so it is seconds; --unit tells another");
+    }
     hasRows = true;
     return tLine::added(builder.add("", pairOf(*momentNs, errorNs)));
 }

@@ -102,9 +102,10 @@ tLine tCsvFormat::read(std::string_view line, tRecordingBuilder& builder)
 {
     if (line.find_first_not_of(" \t,;") == std::string_view::npos || line.front() == '#')
         return {tLine::kFrame, ""};
-    if (columns.empty())
+    if (columns.empty()) {
         return readHeader(line) ? tLine{tLine::kFrame, ""}
                                 : tLine::foreign("no header with reference_ns and clock_ns");
+    }
     if (line == header) return {tLine::kFrame, ""};
     const auto fields = split(line);
     if (isHeader(line)) throw std::runtime_error("a second header differs from the first");
@@ -129,10 +130,12 @@ bool tCsvFormat::readHeader(std::string_view line)
         columns.clear();
         return false;
     }
-    for (size_t i = 0; i < kColumns; ++i)
-        if (counts[i] > 1)
+    for (size_t i = 0; i < kColumns; ++i) {
+        if (counts[i] > 1) {
             throw std::runtime_error(
                 fmt::format("the column {} stands there {} times", kTitles[i], counts[i]));
+        }
+    }
     header = line;
     return true;
 }
@@ -171,9 +174,10 @@ tLine tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
         if (field.find_first_of("eE-") != std::string::npos) return std::nullopt;
         return exactNsOf(field, separator, 1);
     };
-    for (const tColumn column : {kReference, kClock})
+    for (const tColumn column : {kReference, kClock}) {
         if (fields[column].find_first_of("eE") != std::string::npos && finiteIn(fields[column]))
             return tLine::unread("a time whose last digits a spreadsheet has rounded away");
+    }
     const auto reference = readsTime(fields[kReference]);
     const auto clock = readsTime(fields[kClock]);
     if (!reference || !clock) return tLine::unread("no number in reference_ns or in clock_ns");

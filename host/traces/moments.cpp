@@ -48,7 +48,8 @@ std::optional<int64_t> tMoments::ofDate(std::string_view date, std::string_view 
     if (second.size() > 2 && second[2] != '.') return std::nullopt;
     const bool leaps = *hour == 23 && *minute == 59 && *secondNs >= 60 * kSecondNs;
     if (*secondNs >= (leaps ? 61 : 60) * kSecondNs) return std::nullopt;
-    int64_t momentNs = (*days * kDaySeconds + *hour * 3600 + *minute * 60) * kSecondNs + *secondNs;
+    const int64_t minutes = int64_t{*hour} * 60 + *minute;
+    int64_t momentNs = (*days * kDaySeconds + minutes * 60) * kSecondNs + *secondNs;
     if (leaps) {
         leapNs = (*days + 1) * kDaySeconds * kSecondNs;
     } else if (leapNs && momentNs >= *leapNs) {

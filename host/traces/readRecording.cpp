@@ -76,6 +76,7 @@ std::vector<tMakeFormat> allFormats()
 std::vector<tTrial> trialsOf(const std::vector<tMakeFormat>& formats, const tReadOptions& options)
 {
     std::vector<tTrial> trials;
+    trials.reserve(formats.size());
     for (const tMakeFormat& make : formats)
         trials.emplace_back(make, options);
     return trials;
@@ -174,9 +175,10 @@ std::string mixtureIn(const tReading& reading, size_t chosen,
     constexpr int64_t kChance = 3;
     if (reading.unread.empty()) return "";
     std::vector<tTrial> trials = trialsOf(formats, options);
-    for (size_t i = 0; i < trials.size(); ++i)
+    for (size_t i = 0; i < trials.size(); ++i) {
         for (const std::string_view line : reading.unread)
             if (i != chosen) trials[i].read(line, 1);
+    }
     const tTrial& other = trials[bestOf(trials, measurementsOf)];
     if (other.measurements >= kChance) {
         return fmt::format("mixes {} with {}; give one of them", reading.format->name(),

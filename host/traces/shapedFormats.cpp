@@ -137,7 +137,7 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
         const bool own = line.find(log.banner) != std::string_view::npos;
         return {own ? tLine::kFrame : tLine::kEvent, ""};
     }
-    const tLine shaped = withoutPrefix(words);
+    tLine shaped = withoutPrefix(words);
     if (shaped.kind != tLine::kMeasurement) return shaped;
     if (words.size() < mostWords) return tLine::unread("cut short");
     mostWords = words.size();
@@ -156,9 +156,10 @@ tLine tShapedFormat::read(std::string_view line, tRecordingBuilder& builder)
 
 void addShapedFormats(std::vector<tMakeFormat>& formats)
 {
-    for (const tShapedLog& log : kLogs)
+    for (const tShapedLog& log : kLogs) {
         formats.emplace_back(
             [&log](const tReadOptions&) { return std::make_unique<tShapedFormat>(log); });
+    }
 }
 
 } // namespace dravikHost

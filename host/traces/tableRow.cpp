@@ -25,9 +25,10 @@ std::string_view trimmed(std::string_view text)
 std::string unquoted(std::string_view field)
 {
     field = trimmed(field);
-    for (const char quote : {'"', '\''})
+    for (const char quote : {'"', '\''}) {
         if (field.size() >= 2 && field.front() == quote && field.back() == quote)
             field = trimmed(field.substr(1, field.size() - 2));
+    }
     return std::string(field);
 }
 

@@ -14,7 +14,7 @@ namespace dravikHost {
 
 namespace {
 
-constexpr size_t kMebibyte = 1024 * 1024;
+constexpr size_t kMebibyte = 1'048'576;
 constexpr size_t kMostText = 512 * kMebibyte; // months of a log
 constexpr size_t kMostOfLine = kMebibyte;
 
@@ -41,9 +41,10 @@ constexpr std::string_view kByteOrderMark = "\xef\xbb\xbf";
 
 void refuseNoText(const std::string& text, const std::string& name)
 {
-    for (const tBeginning& beginning : kNoText)
+    for (const tBeginning& beginning : kNoText) {
         if (text.compare(0, beginning.bytes.size(), beginning.bytes) == 0)
             throw std::runtime_error(fmt::format("{} {}", name, beginning.what));
+    }
 }
 
 std::string readBounded(std::FILE* file, const std::string& name)
