@@ -41,7 +41,6 @@ void perform(tHostOperation operation, zverr_Status* status, Action action) noex
         current->failure = std::current_exception();
         setFailure(status, kClockFailed, failure.what());
     } catch (...) {
-        current->failure = std::current_exception();
         setFailure(status, kClockFailed, "unknown failure of the clock");
     }
 }

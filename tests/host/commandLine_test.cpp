@@ -103,10 +103,11 @@ TEST(CommandLine, refusesWhatIsWrong)
     } kRows[] = {
         {0, "", {"probe", "a", "--time", "1us", "--whole", "-1s", "--share", "0"}}, // the bounds
         {0, "", {"probe", "a", "--time", "1ms", "--whole", "1s", "--share", "99%"}},
-        {2, "A verb, such as simulate or run, is required", {}},
-        {2, "The following argument was not expected: proba", {"proba"}},
+        {2, "unknown verb proba; did you mean probe?", {"proba"}},
+        {2, "unknown verb nothing like it", {"nothing like it"}},
+        {2, "unknown option --tim; did you mean --time?", {"probe", "a", "--tim", "1us"}},
         {2, "files is required", {"probe"}},
-        {2, "The following argument was not expected: --none", {"probe", "a", "--none"}},
+        {2, "unknown option --none", {"probe", "a", "--none"}},
         {2, "--time: '999ns' is not within 1us to 1ms", {"probe", "a", "--time", "999ns"}},
         {2, "--time: '1.1ms' is not within 1us to 1ms", {"probe", "a", "--time", "1.1ms"}},
         {2, "--time: '5' has no unit; use ns, us, ms, s, min or h", {"probe", "a", "--time", "5"}},
@@ -136,6 +137,9 @@ TEST(CommandLine, helps)
     const tOutcome version = runWith({"--version"});
     EXPECT_EQ(0, version.status);
     EXPECT_EQ("dravik-host ", version.out.substr(0, 12));
+    const tOutcome bare = runWith({});
+    EXPECT_EQ(2, bare.status);
+    EXPECT_NE(std::string::npos, bare.err.find("probe   "));
     const tOutcome help = runWith({"probe", "--help"});
     EXPECT_EQ(0, help.status);
     EXPECT_FALSE(given.ran);

@@ -1,4 +1,5 @@
 #include "clocks/tSteeredClock.h"
+#include "host/scene.h"
 #include "host/stepFixture.h"
 #include "loop/tDiscipline.h"
 #include "loop/tHoldoverEstimate.h"
@@ -106,41 +107,6 @@ TEST(LaterDocuments, areAppliedInALockAndGoWithIt)
 }
 
 // A clock that counts its orders, and fails at one of them; the first is 1.
-class tFailingClock : public tSteeredClock
-{
-public:
-    using tSteeredClock::tSteeredClock;
-    void step(int64_t deltaNs) override { order(), tSteeredClock::step(deltaNs); }
-    void setOffsetPpb(int32_t ppb) override { order(), tSteeredClock::setOffsetPpb(ppb); }
-
-    int orders = 0;
-    int failsAt = 0;
-
-private:
-    void order()
-    {
-        if (++orders == failsAt) throw std::runtime_error("the clock is gone");
-    }
-};
-
-// A clock 3 ms ahead, 20 ppm fast and steered within 100 ppm, beside a perfect reference.
-struct tScene {
-    tFailingClock clock{kStartNs + 3'000'000, 20'000, 100'000};
-    tPair pair{0, kStartNs, kStartNs + 3'000'000, {}};
-
-    // A second passes, in which the clock is left alone or moved.
-    const tPair& second(char what = '.')
-    {
-        clock.pass(kSecondNs);
-        if (what == 'u') clock.tSteeredClock::step(2000); // which ends a lock
-        if (what == 'm') clock.tSteeredClock::step(1'000'000);
-        pair.elapsedNs += kSecondNs;
-        pair.referenceNs += kSecondNs;
-        pair.clockNs = clock.timeNs();
-        return pair;
-    }
-};
-
 struct tStepRow {
     char what;
     tLockEvent event;

@@ -124,12 +124,15 @@ TEST(MetricsFile, exportsEveryFigureOnceASecond)
                                        const char* pairs) {
         EXPECT_EQ(std::string("offset_seconds ") + offset +
                       "\nfrequency_offset -3.5e-06\nlocked 1\nholdover_seconds " + holdover +
-                      "\npairs_total " + pairs + "\nlocks_lost_total 3\nsteps_total 5\n",
+                      "\npairs_total " + pairs +
+                      "\nlocks_lost_total 3\nsteps_total 5\nsamples_out_of_date_total 2\n"
+                      "samples_unusable_total 7\n",
                   std::regex_replace(readText(file.path), std::regex("#.*\n|dravik_"), ""));
     };
     tStep step = stepAt(1, -4000000, true, -3500);
     step.steps = 5;
     step.locksLost = 3;
+    step.leftOut = {2, 7};
     metrics.see(step);
     expectSamples("-0.004", "0\nestimated_error_seconds 0", "1");
     metrics.see(held(step)); // is not handed to the servo
@@ -137,13 +140,14 @@ TEST(MetricsFile, exportsEveryFigureOnceASecond)
     metrics.see(step);
     metrics.see(failed(stepAt(2, 9, false, 0)));
     expectSamples("-0.004", "0\nestimated_error_seconds 0", "1"); // too soon for more
-    metrics.see(tSilence{nsOfSeconds(2), {}, {}});
+    metrics.see(tSilence{nsOfSeconds(2), {}, {}, {2, 7}});
     expectSamples("2.5e-07", "0\nestimated_error_seconds 0", "2");
-    metrics.see(tSilence{nsOfSeconds(14), nsOfSeconds(12), 340.0});
+    metrics.see(tSilence{nsOfSeconds(14), nsOfSeconds(12), 340.0, {2, 7}});
     expectSamples("2.5e-07", "12\nestimated_error_seconds 3.4e-07", "2");
-    metrics.see(tSilence{nsOfSeconds(15), nsOfSeconds(13), {}});
-    expectSamples("2.5e-07", "13\nestimated_error_seconds nan", "2");
-    metrics.see(stepAt(17, 0, false, 0));
+    metrics.see(tSilence{nsOfSeconds(15), nsOfSeconds(13), {}, {2, 7}});
+    expectSamples("2.5e-07", "13\nestimated_error_seconds NaN", "2");
+    metrics.see(stepAt(15.5, 0, false, 0)); // too soon, but the last
+    metrics.end("");
     EXPECT_NE(std::string::npos, readText(file.path).find("locked 0\n"));
 }
 
@@ -174,6 +178,11 @@ TEST(MetricsFile, failsAtTheFirstFileOnly)
     EXPECT_EQ("     2.000" + reason + "     6.000" + reason, text);
 }
 
+std::string untilAdvice(const std::string& text)
+{
+    return text.substr(0, text.find("            Compare"));
+}
+
 TEST(Summary, countsWhatHappened)
 {
     const auto watch = [](std::optional<double> trueErrorNs) {
@@ -181,10 +190,10 @@ TEST(Summary, countsWhatHappened)
             tSummary summary(console);
             summary.begin("", {{kGetMaxFrequencyOffset, 5}, {kSetFrequency, 1000}});
             summary.see(withEvent(stepAt(0, 900, false, 0), kNothingNew, {{kGetTime, 1}}));
-            summary.see(held(stepAt(1, 800, true, 0)));
-            summary.see(withEvent(stepAt(2, 0, false, 0), kNothingNew, {{kSetFrequency, -9000}}));
+            summary.see(held(stepAt(1, 800, false, 0)));
+            summary.see(withEvent(stepAt(2, 0, false, 0), kLockMissed, {{kSetFrequency, -9000}}));
             double atS = 3.5;
-            for (const int64_t errorNs : {30, -50, 10, 9000}) { // out of the lock in the end
+            for (const int64_t errorNs : {30, -50, 10, 9000, -10}) { // out of the lock once
                 tStep step = stepAt(atS++, errorNs, errorNs != 9000, 0);
                 if (step.locked) step.calls = {{kGetFrequency, 0}, {kSetFrequency, 30 * errorNs}};
                 step.pair.trueErrorNs = trueErrorNs;
@@ -194,18 +203,39 @@ TEST(Summary, countsWhatHappened)
             summary.end("");
         });
     };
-    EXPECT_EQ("pairs       7 in 6.500 s; 1 held back\n"
-              "lock        after 3.500 s, lost 2 times; 3 pairs locked\n"
-              "error       RMS 34.16 ns, peak 50 ns, last +10 ns\n"
-              "            (of the clock against the reference as measured, while locked)\n"
-              "frequency   ordered -9.000 ppm to +1.000 ppm, last +0.300 ppm\n"
-              "host calls  getTime 1, stepTime 0, getFrequency 3, setFrequency 5,\n"
-              "            getMaxFrequencyOffset 1, getMinFrequencyOffset 0\n",
-              watch({}));
+    EXPECT_EQ("pairs       8 in 7.500 s; 1 held back\n"
+              "lock        after 3.500 s, lost 2 times, missed 1 time; 4 of 5 pairs locked since\n"
+              "error       RMS 4.025 us, peak 9 us, last -10 ns\n"
+              "            while locked: RMS 30 ns, peak 50 ns\n"
+              "            (of the clock against the reference as measured, all pairs since the "
+              "first lock)\n"
+              "frequency   ordered -9.000 ppm to +1.000 ppm, last -0.300 ppm\n"
+              "host calls  getTime 1, stepTime 0, getFrequency 4, setFrequency 6,\n"
+              "            getMaxFrequencyOffset 1, getMinFrequencyOffset 0\n"
+              "WARNING     the lock did not hold: lost 2 times, 25 % of the time without it\n",
+              untilAdvice(watch({})));
     EXPECT_NE(std::string::npos,
-              watch(-2.5).find("lost 1 time; 3 pairs locked\n"
-                               "error       RMS 2.5 ns, peak 2.5 ns, last -2.5 ns\n"
-                               "            (of the clock against the true time, while locked)\n"));
+              watch(-2.5).find("error       RMS 2.5 ns, peak 2.5 ns, last -2.5 ns\n"
+                               "            while locked: RMS 2.5 ns, peak 2.5 ns\n"
+                               "            (of the clock against the true time, "));
+}
+
+TEST(Summary, saysOfADryRunWhatWouldBe)
+{
+    const std::string text = shownBy([](tConsole& console) {
+        tSummary summary(console);
+        tStep step = withEvent(stepAt(1, 5, false, 0), kNothingNew,
+                               {{kGetFrequency, 0}, {kSetFrequency, 2000}, {kStepTime, 9}});
+        step.dryRun = true;
+        summary.see(step);
+        summary.end("");
+    });
+    EXPECT_EQ("pairs       1 in 1.000 s\n"
+              "lock        never; missed 0 times\n"
+              "frequency   would be ordered +2.000 ppm to +2.000 ppm, last +2.000 ppm\n"
+              "host calls  getTime 0, stepTime 0, getFrequency 1, setFrequency 0,\n"
+              "            getMaxFrequencyOffset 0, getMinFrequencyOffset 0\n",
+              text);
 }
 
 TEST(TraceFile, holdsPairsAndCallsInOrder)
