@@ -33,7 +33,7 @@ void tMetricsFile::see(const tSilence& silence) { write(silence); }
 // What happened last is to be seen, however soon after the file before.
 void tMetricsFile::end(const std::string& /*remarks*/)
 {
-    if (!path.empty() && writtenNs) put(last);
+    if (wasWritten && !failing) put(last);
 }
 
 void tMetricsFile::write(const tSilence& now)
@@ -46,13 +46,13 @@ void tMetricsFile::write(const tSilence& now)
 
 void tMetricsFile::put(const tSilence& now)
 {
-    const bool isFirst = !writtenNs;
     writtenNs = now.elapsedNs;
     try {
         replaceText(path, text(now));
         failing = false;
+        wasWritten = true;
     } catch (const std::runtime_error& failure) {
-        if (isFirst) throw;
+        if (!wasWritten) throw;
         if (!failing) console.note(now.elapsedNs, failure.what());
         failing = true;
     }

@@ -33,6 +33,7 @@ private:
     tSilence last{};   // moment, of a pair or of silence
     int64_t pairs = 0; // handed to the servo
     std::optional<int64_t> writtenNs;
+    bool wasWritten = false;
     bool failing = false;
 };
 
