@@ -84,7 +84,7 @@ exit 1
 precious
 == realtime from ptp | system frequency=100ppm;ptp ptp frequency=-150ppm offset=1000000000s;trace trace | --reference phc:ptp --clock realtime --config calm.json --interval 1s --duration 6s | sed -n 's/.*,//p' trace
      1.000 s  frequency measured: +249.976 ppm off, now steered by -249.976 ppm
-     2.000 s  stepped by +1e+09 s
+     2.000 s  stepped by +1000000000 s
      3.000 s  locked, error -1 ns
 event
 frequency

@@ -43,10 +43,23 @@ double takeNumber(std::string_view& rest)
     return number;
 }
 
+// Less is a rounding of sums: no clock is compared to that.
+constexpr double kTinyNs = 1e-7;
+constexpr double kPicosecondNs = 1e-3;
+constexpr double kWholeSecondsNs = 9999.5e9; // from here on four digits would cut seconds
+constexpr double kManySecondsNs = 1e24;
+
 std::string inFittingUnit(double ns, bool withSign)
 {
+    if (!std::isfinite(ns)) return "out of range";
+    const double size = std::fabs(ns);
+    if (size < kTinyNs) return withSign ? "+0 ns" : "0 ns";
+    if (size < kPicosecondNs)
+        return fmt::format(withSign ? "{:+.4g} ps" : "{:.4g} ps", ns / kPicosecondNs);
+    if (size >= kWholeSecondsNs && size < kManySecondsNs)
+        return fmt::format(withSign ? "{:+.0f} s" : "{:.0f} s", secondsOf(ns));
     const tUnit* unit = kDuration.units;
-    while (unit[1].size <= kSecondNs && std::fabs(ns) >= unit[1].size) // up to seconds
+    while (unit[1].size <= kSecondNs && size >= unit[1].size) // up to seconds
         ++unit;
     return fmt::format(withSign ? "{:+.4g} {}" : "{:.4g} {}", ns / unit->size, unit->name);
 }
@@ -68,7 +81,13 @@ std::string durationText(double ns) { return inFittingUnit(ns, false); }
 
 std::string signedDurationText(double ns) { return inFittingUnit(ns, true); }
 
-std::string offsetText(double offsetPpb) { return fmt::format("{:+.3f} ppm", offsetPpb / 1e3); }
+std::string offsetText(double offsetPpb)
+{
+    if (!std::isfinite(offsetPpb)) return "out of range";
+    constexpr double kHalfDigitPpb = 0.5;
+    const double shown = std::fabs(offsetPpb) < kHalfDigitPpb ? 0 : offsetPpb;
+    return fmt::format("{:+.3f} ppm", shown / 1e3);
+}
 
 std::string secondsText(int64_t ns, int digits)
 {

@@ -33,7 +33,8 @@ extern const tQuantityKind kRatio;     // base unit: 1
 // stand alone. Throws std::invalid_argument that tells what is wrong.
 double parseQuantity(std::string_view text, const tQuantityKind& kind);
 
-// For people: "1.012 ms", "+11.980 ppm", "2.125" (seconds).
+// For people: "1.012 ms", "+11.980 ppm", "2.125" (seconds). What rounds to zero is "0 ns" or
+// "+0 ns", never -0; what is no number or infinite is "out of range".
 std::string durationText(double ns);
 std::string signedDurationText(double ns);
 inline std::string durationText(int64_t ns) { return durationText(static_cast<double>(ns)); }

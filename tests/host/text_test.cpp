@@ -4,6 +4,7 @@
 #include "text/quantity.h"
 #include "text/words.h"
 
+#include <cmath>
 #include <fcntl.h>
 #include <sys/stat.h>
 
@@ -52,19 +53,33 @@ TEST(Quantity, isWrittenForPeople)
         double ns;
         const char *text, *withSign;
     } kDurations[] = {
-        {0, "0 ns", "+0 ns"},   {-0.5, "-0.5 ns", "-0.5 ns"},  {999.4, "999.4 ns", "+999.4 ns"},
-        {1e3, "1 us", "+1 us"}, {-1500, "-1.5 us", "-1.5 us"}, {1012345, "1.012 ms", "+1.012 ms"},
-        {1e9, "1 s", "+1 s"},   {7200e9, "7200 s", "+7200 s"}, {999999, "1000 us", "+1000 us"},
+        {0, "0 ns", "+0 ns"},
+        {-0.5, "-0.5 ns", "-0.5 ns"},
+        {999.4, "999.4 ns", "+999.4 ns"},
+        {1e3, "1 us", "+1 us"},
+        {-1500, "-1.5 us", "-1.5 us"},
+        {1012345, "1.012 ms", "+1.012 ms"},
+        {1e9, "1 s", "+1 s"},
+        {7200e9, "7200 s", "+7200 s"},
+        {999999, "1000 us", "+1000 us"},
         {-1e9, "-1 s", "-1 s"},
+        {86400e9, "86400 s", "+86400 s"},
     };
     for (const auto& row : kDurations) {
         EXPECT_EQ(row.text, durationText(row.ns));
         EXPECT_EQ(row.withSign, signedDurationText(row.ns));
     }
+    EXPECT_EQ("0 ns", durationText(-0.0));
+    EXPECT_EQ("+0 ns", signedDurationText(-9.191e-17));
+    EXPECT_EQ("0.005578 ps", durationText(5.578e-6));
+    EXPECT_EQ("out of range", signedDurationText(-INFINITY));
+    EXPECT_EQ("out of range", durationText(NAN));
     EXPECT_EQ("-1.5 us", durationText(int64_t{-1500}));
     EXPECT_EQ("+2 ms", signedDurationText(int64_t{2'000'000}));
     EXPECT_EQ("+11.980 ppm", offsetText(11980));
     EXPECT_EQ("-0.001 ppm", offsetText(-1));
+    EXPECT_EQ("+0.000 ppm", offsetText(-0.4));
+    EXPECT_EQ("out of range", offsetText(INFINITY));
     EXPECT_EQ("2.125", secondsText(2'125'999'999, 3));
     EXPECT_EQ("0.000000007", secondsText(7, 9));
     EXPECT_EQ("1000000000.0", secondsText(1'000'000'000'000'000'000, 1));
