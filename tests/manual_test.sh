@@ -52,7 +52,8 @@ dravik-host s|simulate show
 dravik-host --v|--version
 dravik-host run --hold|--holdover-after
 dravik-host run --clock |soft realtime phc:
-dravik-host metrics --mask g8273.2-c|g8273.2-c
+dravik-host metrics --mask g8273.2-|g8273.2-a g8273.2-b g8273.2-c g8273.2-d
+dravik-host plot --mask g|g8273.2-a g8273.2-b g8273.2-c g8273.3-a g8273.3-b
 dravik-host check config/dravik_tr_ptp4l_t|config/dravik_tr_ptp4l_tab.json
 END
 

@@ -22,6 +22,11 @@ awk 'BEGIN { print "kind,elapsed_s,reference_ns,clock_ns,call,value"
         if (i == 9) print "call,9,,,stepTime,-5000"
     } }' > trace.csv
 printf '1e-9\n-1e-9\n1e-9\n' > numbers
+printf '%s\n' -0 1e-25 -0 -0 > zeros
+sed 's/1e-25/-0/' zeros > negative
+printf '1e200\n0\n' > large
+yes 0 | head -n 1000 > long
+head -n 999 long > few
 check() { # NAME STATUS PATTERN OPTIONS...
     local name=$1 status=$2 pattern=$3 found=0
     shift 3
@@ -52,11 +57,18 @@ nothing selected  |1|^dravik-host: trace.csv has no measurement in that time$|tr
 no numbers        |1|^dravik-host: trace.csv has times of its own; leave --interval out$|trace.csv --interval 1s
 no figure         |2|'rmse' is none of rms, peak, |trace.csv --assert rmse<1ns
 frequency of what |2|--frequency requires --interval|trace.csv --frequency
+tiny and negative |0|^mean \+0 ns, RMS 0 ns, peak 0 ns, peak to peak 0 ns$|zeros --interval 1s
+no negative zero  |0|"peak": 0, |negative --interval 1s --json
+out of range      |1|^dravik-host: large: an error of 1e\+200 s is out of range|large --interval 1s
 no such mask      |2|--mask|trace.csv --mask g8273.2-e
-mask held in part |3|^mask 802.1as +max .TE. 1000 ns +held +40 ns$|trace.csv --mask 802.1as
+mask and edition  |3|^mask g8273.2-c: ITU-T G.8273.2, second edition of October 2020 with amendments 1 .* and 2 .*class C$|trace.csv --mask g8273.2-c
+mask of a TC      |3|^mask g8273.3-b: ITU-T G.8273.3, second edition of October 2020; class B$|trace.csv --mask g8273.3-b
+mask held         |0|^mask g8273.2-d +max .TE_L. 5 ns +held +0 ns$|long --interval 1s --mask g8273.2-d
+free-running      |3|^mask 802.1as +TDEV 5 ns per s of tau up to 10 s, free-running clock +broken +35.12 ns at 1 s$|trace.csv --mask 802.1as
 mask broken       |3|^mask g8273.2-c +max .TE. 30 ns +broken +40 ns$|trace.csv --mask g8273.2-c
-not checked       |3|^mask g8273.2-a +constant TE 50 ns +not checked +less than 1000 s$|trace.csv --mask g8273.2-a
-what of them      |3|^dravik-host: limits of masks broken: 4$|trace.csv --mask g8273.2-c --mask 802.1as
+not judged        |3|^mask g8273.2-a +cTE 50 ns, mean over 1000 s +not judged +2.712 ns; needs 1000 s of data, has 59 s$|trace.csv --mask g8273.2-a
+not judged, status|3|^dravik-host: limits of masks not judged: 1$|few --interval 1s --mask g8273.2-d
+what of them      |3|^dravik-host: limits of masks broken: 6, not judged: 1$|trace.csv --mask g8273.2-c --mask 802.1as
 END
 
 echo "$checks checks, $failures failures"

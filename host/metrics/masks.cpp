@@ -17,25 +17,40 @@ namespace {
 // the high-passed one of what that takes away.
 struct tMask {
     const char* name;
+    const char* document;
+    const char* clock; // that it binds
     double largestError;
     double constantError; // mean over 1000 s
     double lowPassedError;
-    double lowPassedMtie; // up to 1000 s
+    double lowPassedMtie; // up to 1000 s, and at variable temperature up to 10,000 s
     double lowPassedTdev; // up to 1000 s
     double highPassedPeakToPeak;
     double tdevPerSecond; // of tau, from 0.05 s to 10 s
+    double seconds;       // that the largest errors and the peak to peak are over
 };
+constexpr const char* kG82732 = "ITU-T G.8273.2, second edition of October 2020 with amendments 1 "
+                                "(February 2022) and 2 (November 2022)";
+constexpr const char* kG82733 = "ITU-T G.8273.3, second edition of October 2020";
+constexpr const char* k8021as = "IEEE 802.1AS";
 constexpr tMask kMasks[] = {
-    {"g8273.2-a", 100, 50, 0, 40, 4, 70, 0}, {"g8273.2-b", 70, 20, 0, 40, 4, 70, 0},
-    {"g8273.2-c", 30, 10, 0, 10, 2, 0, 0},   {"g8273.2-d", 0, 0, 5, 0, 0, 0, 0},
-    {"802.1as", 1000, 0, 0, 0, 0, 0, 5},
+    {"g8273.2-a", kG82732, "class A", 100, 50, 0, 40, 4, 70, 0, 1000},
+    {"g8273.2-b", kG82732, "class B", 70, 20, 0, 40, 4, 70, 0, 1000},
+    {"g8273.2-c", kG82732, "class C", 30, 10, 0, 10, 2, 30, 0, 1000},
+    {"g8273.2-d", kG82732, "class D", 0, 0, 5, 0, 0, 0, 0, 1000},
+    {"g8273.3-a", kG82733, "class A", 100, 50, 0, 40, 4, 70, 0, 1000},
+    {"g8273.3-b", kG82733, "class B", 70, 20, 0, 40, 4, 70, 0, 1000},
+    {"802.1as", k8021as,
+     "its TDEV (clause B.1.3.2) binds a free-running local clock, not a disciplined one", 1000, 0,
+     0, 0, 0, 0, 5, 0},
 };
 
-constexpr double kCorner = 0.1;        // Hz
-constexpr double kLongestInterval = 1; // s; a filter of that corner needs some points in its time
-constexpr double kLongestTau = 1000;   // s
+constexpr double kCorner = 0.1;            // Hz
+constexpr double kLongestInterval = 1.005; // s; one point a second, as moments may be rounded
+constexpr double kLongestTau = 1000;       // s
+constexpr double kLongestTauVariable = 10'000;
 constexpr double kShortestTau = 0.05;
 constexpr double kSlopeUpTo = 10; // s; of the limit that grows with tau
+constexpr double kTausInTdev = 3; // the data that a TDEV needs
 
 const tMask& maskOf(const std::string& name)
 {
@@ -43,10 +58,35 @@ const tMask& maskOf(const std::string& name)
                          [&name](const tMask& m) { return name == m.name; });
 }
 
-tMaskLine compared(std::string limit, double foundNs, double limitNs)
+// What was found for a limit.
+struct tFound {
+    std::string text;
+    bool within;
+};
+
+tFound compared(double foundNs, double limitNs)
 {
-    return {std::move(limit), durationText(foundNs),
-            foundNs <= limitNs ? tMaskLine::kHeld : tMaskLine::kBroken};
+    return {durationText(foundNs), foundNs <= limitNs};
+}
+
+// Whole intervals, as moments may be rounded; 0 if there is none.
+size_t pointsIn(double seconds, double interval)
+{
+    const double points = std::min(seconds / interval, 1e9);
+    return static_cast<size_t>(points + std::min(1e-3 * points, 0.25));
+}
+
+// Too little data can break a limit, but not hold it.
+tMaskLine judged(const std::string& limit, const tFound& found, size_t points, double interval,
+                 double neededSeconds)
+{
+    if (!found.within) return {limit, found.text, tMaskLine::kBroken};
+    if (points >= pointsIn(neededSeconds, interval)) return {limit, found.text, tMaskLine::kHeld};
+    return {limit,
+            fmt::format("{}; needs {} of data, has {}", found.text,
+                        durationText(nsOf(neededSeconds)),
+                        durationText(nsOf(static_cast<double>(points) * interval))),
+            tMaskLine::kNotJudged};
 }
 
 double largestNs(const std::vector<double>& errors)
@@ -63,23 +103,22 @@ double peakToPeakNs(const std::vector<double>& errors)
     return nsOf(*extremes.second - *extremes.first);
 }
 
-// Octaves, and the longest tau up to the mask's end that a figure may be told for.
-std::vector<size_t> averagingsUpTo(const tSeries& series, double longestTau)
+// Octaves, and the longest tau up to the mask's end that there is a TDEV for. MTIE never falls with
+// tau, and the longest one tells.
+std::vector<size_t> averagings(const tSeries& series, std::optional<double> tStability::*figure,
+                               size_t longest)
 {
-    std::vector<size_t> list = octaves(series);
     const size_t points = series.phase.size();
-    const auto last = static_cast<size_t>(std::min(longestTau / series.interval, 1e9) + 1e-6);
-    for (const size_t n : {points / 3, points - 1})
-        list.push_back(std::min(n, last));
+    if (figure == &tStability::mtie) return {std::min(points - 1, longest)};
+    std::vector<size_t> list = octaves(series);
+    list.push_back(std::min(points / 3, longest));
     return list;
 }
 
-// The largest mean over so many seconds; nothing if the series is shorter.
-std::optional<double> largestMeanNs(const tSeries& series, double seconds)
+// The largest mean over so many points, or over all if they are fewer.
+double largestMeanNs(const tSeries& series, size_t points)
 {
-    const double wanted = std::ceil(seconds / series.interval);
-    if (static_cast<double>(series.phase.size()) < wanted) return std::nullopt;
-    const auto n = static_cast<size_t>(wanted);
+    const size_t n = std::min(points, series.phase.size());
     std::vector<double> sums(series.phase.size() + 1, 0);
     std::partial_sum(series.phase.begin(), series.phase.end(), sums.begin() + 1);
     double largest = 0;
@@ -98,11 +137,11 @@ template <typename Limit>
 std::optional<tWorst> worstOf(const tSeries& series, std::optional<double> tStability::*figure,
                               double longestTau, Limit limitNs)
 {
+    const size_t longest = pointsIn(longestTau, series.interval);
     std::optional<tWorst> worst;
-    if (series.phase.size() < 2) return worst;
-    for (const size_t n : averagingsUpTo(series, longestTau)) {
+    for (const size_t n : averagings(series, figure, longest)) {
         const double tau = static_cast<double>(n) * series.interval;
-        if (n < 1 || tau < kShortestTau || tau > longestTau) continue;
+        if (n < 1 || tau < kShortestTau || n > longest) continue;
         const auto found = stabilityAt(series, n).*figure;
         if (!found) continue;
         const tWorst here = {tau, nsOf(*found), limitNs(tau)};
@@ -111,33 +150,40 @@ std::optional<tWorst> worstOf(const tSeries& series, std::optional<double> tStab
     return worst;
 }
 
-tMaskLine comparedWorst(const std::string& limit, const std::optional<tWorst>& worst)
+tMaskLine judgedWorst(const std::string& limit, const std::optional<tWorst>& worst,
+                      const tSeries& series, double neededSeconds)
 {
-    if (!worst) return {limit, "too few points", tMaskLine::kNotChecked};
-    const bool held = worst->foundNs <= worst->limitNs;
-    return {limit,
-            fmt::format("{} at {}", durationText(worst->foundNs), durationText(nsOf(worst->tau))),
-            held ? tMaskLine::kHeld : tMaskLine::kBroken};
+    if (!worst) return {limit, "too few points", tMaskLine::kNotJudged};
+    const tFound found = {
+        fmt::format("{} at {}", durationText(worst->foundNs), durationText(nsOf(worst->tau))),
+        worst->foundNs <= worst->limitNs};
+    return judged(limit, found, series.phase.size(), series.interval, neededSeconds);
 }
 
 // Those of the error as it is.
 void addUnfiltered(std::vector<tMaskLine>& lines, const tMask& mask, const tMeasured& measured)
 {
+    const tSeries& series = measured.series;
     if (mask.largestError > 0) {
-        lines.push_back(compared(fmt::format("max |TE| {} ns", mask.largestError),
-                                 largestNs(measured.errors), mask.largestError));
+        lines.push_back(judged(fmt::format("max |TE| {} ns", mask.largestError),
+                               compared(largestNs(measured.errors), mask.largestError),
+                               measured.errors.size(), series.interval, mask.seconds));
     }
     if (mask.constantError > 0) {
-        const std::string limit = fmt::format("constant TE {} ns", mask.constantError);
-        const auto mean = largestMeanNs(measured.series, kLongestTau);
-        lines.push_back(mean ? compared(limit, *mean, mask.constantError)
-                             : tMaskLine{limit, "less than 1000 s", tMaskLine::kNotChecked});
+        const size_t wanted = std::max(pointsIn(kLongestTau, series.interval), size_t{1});
+        tFound found = compared(largestMeanNs(series, wanted), mask.constantError);
+        // A mean over less tells nothing of the one over all.
+        found.within = found.within || series.phase.size() < wanted;
+        lines.push_back(judged(fmt::format("cTE {} ns, mean over 1000 s", mask.constantError),
+                               found, series.phase.size(), series.interval, kLongestTau));
     }
     if (mask.tdevPerSecond > 0) {
         const auto limitNs = [&mask](double tau) { return mask.tdevPerSecond * tau; };
         lines.push_back(
-            comparedWorst(fmt::format("TDEV {} ns per s of tau up to 10 s", mask.tdevPerSecond),
-                          worstOf(measured.series, &tStability::tdev, kSlopeUpTo, limitNs)));
+            judgedWorst(fmt::format("TDEV {} ns per s of tau up to 10 s, free-running clock",
+                                    mask.tdevPerSecond),
+                        worstOf(series, &tStability::tdev, kSlopeUpTo, limitNs), series,
+                        kTausInTdev * kSlopeUpTo));
     }
 }
 
@@ -145,31 +191,36 @@ void addFiltered(std::vector<tMaskLine>& lines, const tMask& mask, const tSeries
 {
     const bool canFilter = series.interval <= kLongestInterval;
     const tSeries low = lowPass(series, kCorner);
-    const auto add = [&](double limitNs, const char* title, auto compare) {
+    const auto add = [&](const char* title, double limitNs, const char* condition, auto judge) {
         if (limitNs <= 0) return;
-        const std::string limit = fmt::format("{} {} ns", title, limitNs);
-        lines.push_back(canFilter ? compare(limit)
+        const std::string limit = fmt::format("{} {} ns{}", title, limitNs, condition);
+        lines.push_back(canFilter ? judge(limit, limitNs)
                                   : tMaskLine{limit, "pairs too far apart for a filter of 0.1 Hz",
-                                              tMaskLine::kNotChecked});
+                                              tMaskLine::kNotJudged});
     };
-    const auto constant = [](double limitNs) {
-        return [limitNs](double /*tau*/) { return limitNs; };
+    const auto single = [&](double foundNs) {
+        return [&, foundNs](const std::string& limit, double limitNs) {
+            return judged(limit, compared(foundNs, limitNs), series.phase.size(), series.interval,
+                          mask.seconds);
+        };
     };
-    add(mask.lowPassedError, "max |TEL|", [&](const std::string& limit) {
-        return compared(limit, largestNs(low.phase), mask.lowPassedError);
-    });
-    add(mask.lowPassedMtie, "dTEL MTIE up to 1000 s", [&](const std::string& limit) {
-        return comparedWorst(
-            limit, worstOf(low, &tStability::mtie, kLongestTau, constant(mask.lowPassedMtie)));
-    });
-    add(mask.lowPassedTdev, "dTEL TDEV up to 1000 s", [&](const std::string& limit) {
-        return comparedWorst(
-            limit, worstOf(low, &tStability::tdev, kLongestTau, constant(mask.lowPassedTdev)));
-    });
-    add(mask.highPassedPeakToPeak, "dTEH peak to peak", [&](const std::string& limit) {
-        return compared(limit, peakToPeakNs(highPass(series, kCorner).phase),
-                        mask.highPassedPeakToPeak);
-    });
+    const auto overTau = [&](std::optional<double> tStability::*figure, double longestTau,
+                             double neededSeconds) {
+        return [=, &low](const std::string& limit, double limitNs) {
+            const auto worst =
+                worstOf(low, figure, longestTau, [limitNs](double /*tau*/) { return limitNs; });
+            return judgedWorst(limit, worst, low, neededSeconds);
+        };
+    };
+    add("max |TE_L|", mask.lowPassedError, "", single(largestNs(low.phase)));
+    add("dTE_L MTIE up to 1000 s", mask.lowPassedMtie, ", constant temperature",
+        overTau(&tStability::mtie, kLongestTau, kLongestTau));
+    add("dTE_L MTIE up to 10000 s", mask.lowPassedMtie, ", variable temperature",
+        overTau(&tStability::mtie, kLongestTauVariable, kLongestTauVariable));
+    add("dTE_L TDEV up to 1000 s", mask.lowPassedTdev, ", constant temperature",
+        overTau(&tStability::tdev, kLongestTau, kTausInTdev * kLongestTau));
+    add("dTE_H peak to peak", mask.highPassedPeakToPeak, ", constant temperature",
+        single(peakToPeakNs(highPass(series, kCorner).phase)));
 }
 
 } // namespace
@@ -185,12 +236,18 @@ const std::vector<std::string>& maskNames()
     return names;
 }
 
+std::string maskTitle(const std::string& name)
+{
+    const tMask& mask = maskOf(name);
+    return fmt::format("{}; {}", mask.document, mask.clock);
+}
+
 std::vector<tMaskCurve> maskCurves(const std::string& name)
 {
     const tMask& mask = maskOf(name);
     std::vector<tMaskCurve> curves;
     if (mask.lowPassedMtie > 0) {
-        curves.push_back({"MTIE", &tStability::mtie, true, kShortestTau, kLongestTau,
+        curves.push_back({"MTIE", &tStability::mtie, true, kShortestTau, kLongestTauVariable,
                           mask.lowPassedMtie, mask.lowPassedMtie});
     }
     if (mask.lowPassedTdev > 0) {
@@ -198,8 +255,9 @@ std::vector<tMaskCurve> maskCurves(const std::string& name)
                           mask.lowPassedTdev, mask.lowPassedTdev});
     }
     if (mask.tdevPerSecond > 0) {
-        curves.push_back({"TDEV", &tStability::tdev, false, kShortestTau, kSlopeUpTo,
-                          mask.tdevPerSecond * kShortestTau, mask.tdevPerSecond * kSlopeUpTo});
+        curves.push_back({"TDEV, free-running clock", &tStability::tdev, false, kShortestTau,
+                          kSlopeUpTo, mask.tdevPerSecond * kShortestTau,
+                          mask.tdevPerSecond * kSlopeUpTo});
     }
     return curves;
 }
@@ -215,12 +273,10 @@ std::vector<tMaskLine> checkMask(const std::string& name, const tMeasured& measu
 {
     const tMask& mask = maskOf(name);
     std::vector<tMaskLine> lines;
+    if (measured.series.phase.size() < 2)
+        return {{"all limits", "too few points", tMaskLine::kNotJudged}};
     addUnfiltered(lines, mask, measured);
-    if (measured.series.phase.size() > 1) {
-        addFiltered(lines, mask, measured.series);
-    } else {
-        lines.push_back({"all over time", "too few points", tMaskLine::kNotChecked});
-    }
+    addFiltered(lines, mask, measured.series);
     return lines;
 }
 

@@ -1,7 +1,9 @@
 #include "metrics/stability.h"
 
+#include <algorithm>
 #include <cmath>
 #include <deque>
+#include <numeric>
 
 namespace dravikHost {
 
@@ -25,11 +27,26 @@ tSeries withoutSlope(const tSeries& series)
     return result;
 }
 
+namespace {
+
+// Of its points within the first second, both ends included.
+double meanOfFirstSecond(const tSeries& series)
+{
+    const auto& x = series.phase;
+    constexpr double kRounded = 0.01; // of the moments
+    const double wanted = std::floor(1 / series.interval + kRounded) + 1;
+    const auto last = std::min(static_cast<double>(x.size()), wanted);
+    return std::accumulate(x.begin(), x.begin() + static_cast<std::ptrdiff_t>(last), 0.0) / last;
+}
+
+} // namespace
+
 tSeries lowPass(const tSeries& series, double corner)
 {
     constexpr double kTwoPi = 6.283185307179586;
     const double share = 1 - std::exp(-kTwoPi * corner * series.interval);
     tSeries result = series;
+    if (!series.phase.empty()) result.phase.front() = meanOfFirstSecond(series);
     for (size_t i = 1; i < result.phase.size(); ++i)
         result.phase[i] = result.phase[i - 1] + share * (series.phase[i] - result.phase[i - 1]);
     return result;

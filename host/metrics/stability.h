@@ -17,7 +17,8 @@ tSeries phaseOf(const tSeries& frequency);
 // Without the straight line from the first point to the last.
 tSeries withoutSlope(const tSeries& series);
 
-// Through a first-order filter of that corner, in Hz, that starts at the first point.
+// Through a first-order filter of that corner, in Hz. It starts settled on the mean of the first
+// second, so that no single point is taken for what was before.
 tSeries lowPass(const tSeries& series, double corner);
 
 // What that takes away.

@@ -9,6 +9,7 @@
 
 #include <fmt/format.h>
 
+#include <cmath>
 #include <memory>
 #include <stdexcept>
 
@@ -26,6 +27,17 @@ struct tMetrics {
     std::vector<std::string> masks;
 };
 
+// Squares and sums of larger errors would have no figures.
+void requireInRange(const std::string& file, const std::vector<double>& errors)
+{
+    constexpr double kLargest = 1e100; // s
+    for (const double error : errors) {
+        if (std::fabs(error) <= kLargest) continue;
+        throw std::runtime_error(fmt::format(
+            "{}: an error of {:.4g} s is out of range, so there are no figures", file, error));
+    }
+}
+
 struct tRead {
     tRecording recording;
     tMeasured measured;
@@ -39,6 +51,7 @@ tRead read(const tMetrics& options)
     if (read.recording.pairs.empty() && !options.masks.empty())
         throw std::runtime_error("summaries cannot be held to a mask");
     read.measured = measure(read.recording, options.selection);
+    requireInRange(options.trace.file, read.measured.errors);
     if (options.removeSlope) read.measured.removeSlope();
     return read;
 }
@@ -123,7 +136,7 @@ std::string jsonText(const tRecording& recording, const tMeasured& measured)
                .add("to", measured.toSeconds)
                .add("mean", measured.mean())
                .add("rms", measured.rms())
-               .add("peak", measured.peak())
+               .add("peak", measured.peak() + 0.0) // no -0
                .add("peakToPeak", measured.peakToPeak())
                .add("timeToLock", measured.timeToLock)
                .add("locksLost", locksLost)
@@ -143,18 +156,21 @@ std::string reportMasks(const tMetrics& options, const tMeasured& measured, tOut
 {
     int counts[3] = {};
     for (const std::string& name : options.masks) {
+        output.write(fmt::format("mask {}: {}\n", name, maskTitle(name)));
         for (const tMaskLine& line : checkMask(name, measured)) {
-            constexpr const char* kVerdicts[] = {"held", "broken", "not checked"};
-            output.write(fmt::format("mask {:<10} {:<34} {:<12} {}\n", name, line.limit,
+            constexpr const char* kVerdicts[] = {"held", "broken", "not judged"};
+            output.write(fmt::format("mask {:<10} {:<53} {:<11} {}\n", name, line.limit,
                                      kVerdicts[line.verdict], line.found));
             ++counts[line.verdict];
         }
     }
-    if (counts[tMaskLine::kBroken] > 0)
-        return fmt::format("limits of masks broken: {}", counts[tMaskLine::kBroken]);
-    if (counts[tMaskLine::kNotChecked] > 0)
-        return fmt::format("limits of masks not checked: {}", counts[tMaskLine::kNotChecked]);
-    return "";
+    const int broken = counts[tMaskLine::kBroken];
+    const int notJudged = counts[tMaskLine::kNotJudged];
+    std::string failures;
+    if (broken > 0) failures = fmt::format("broken: {}", broken);
+    if (notJudged > 0)
+        failures += fmt::format("{}not judged: {}", broken > 0 ? ", " : "", notJudged);
+    return failures.empty() ? "" : "limits of masks " + failures;
 }
 
 void run(const tMetrics& options)
@@ -219,7 +235,7 @@ std::function<void()> addMetrics(tOptionSet& options)
         .repeatable(
             "--mask", "NAME",
             [metrics](const std::string& name) { metrics->masks.push_back(name); },
-            "g8273.2-a, -b, -c, -d or 802.1as; repeatable")
+            "g8273.2-a, -b, -c, -d, g8273.3-a, -b or\n802.1as; repeatable")
         .oneOf(maskNames());
     return [metrics] { run(*metrics); };
 }

@@ -2,12 +2,10 @@
 
 #include "host/stepFixture.h"
 #include "metrics/figures.h"
-#include "metrics/masks.h"
 #include "metrics/stability.h"
 #include "metrics/tMeasured.h"
 
 #include <cmath>
-#include <functional>
 #include <stdexcept>
 
 using namespace dravikHost;
@@ -81,23 +79,11 @@ TEST(Stability, endsWithTheSeries)
     EXPECT_EQ(0U, largestAveraging({}));
 }
 
-TEST(Series, areFilteredAndFlattened)
+TEST(Series, areSummedAndFlattened)
 {
     EXPECT_EQ((std::vector<double>{0, 1, 0, 4}), phaseOf({0.5, {2, -2, 8}}).phase);
     EXPECT_EQ((std::vector<double>{1, 3, -1, 1}), withoutSlope({1, {1, 5, 3, 7}}).phase);
     EXPECT_EQ((std::vector<double>{3}), withoutSlope({1, {3}}).phase);
-    const tSeries step{0.5, {0, 1, 1, 1}}; // a step answers with an exponential
-    const tSeries sloped{0.5, {2, 2, 2}};
-    for (size_t i = 0; i < 4; ++i) {
-        const double passed = 1 - std::exp(-2 * M_PI * 0.2 * 0.5 * static_cast<double>(i));
-        EXPECT_NEAR(passed, lowPass(step, 0.2).phase[i], 1e-12);
-        EXPECT_NEAR(step.phase[i] - passed, highPass(step, 0.2).phase[i], 1e-12);
-        EXPECT_NEAR(1 - std::exp(-2 * M_PI * 0.1 * 0.5 * static_cast<double>(i)),
-                    behindMaskFilter(step).phase[i], 1e-12);
-    }
-    EXPECT_EQ(sloped.phase, lowPass(sloped, 0.2).phase);
-    EXPECT_NO_THROW(behindMaskFilter({1, {1}}));
-    EXPECT_THROW(behindMaskFilter({1.01, {1}}), std::runtime_error);
 }
 
 struct tPoint {
@@ -301,141 +287,6 @@ TEST(Assertions, holdOrTellWhatWasFound)
                   tAssertion(text).failure(measured));
     for (const char* const text : {"rms", "rms<20", "rms<", "rmse<1ns", "adev(1s)<1ns", "=1"})
         EXPECT_THROW(tAssertion{text}, std::invalid_argument) << text;
-}
-
-// Phase errors whose figure, that a limit is for, is so many ns.
-tMeasured shaped(double interval, size_t points, const std::function<double(double)>& phaseNs)
-{
-    tMeasured measured;
-    measured.series.interval = interval;
-    for (size_t i = 0; i < points; ++i)
-        measured.series.phase.push_back(phaseNs(static_cast<double>(i)) * 1e-9);
-    measured.errors = measured.series.phase;
-    return measured;
-}
-tMeasured constant(double ns)
-{
-    return shaped(1, 1001, [ns](double) { return -ns; });
-}
-tMeasured oneSpike(double ns)
-{
-    return shaped(1, 9, [ns](double i) { return i == 4 ? -ns : 0; });
-}
-tMeasured ramp(double ns) // in 1000 s
-{
-    return shaped(1, 1201, [ns](double i) { return ns * i / 1000; });
-}
-// The TDEV of x = a i^2 over n intervals is a n^2 sqrt(2/3).
-tMeasured square(double ns, double n, size_t points)
-{
-    return shaped(1, points, [=](double i) { return ns * i * i / (n * n * std::sqrt(2 / 3.0)); });
-}
-tMeasured bent(double ns) { return square(ns, 1000, 3601); } // up to tau of 1000 s
-tMeasured drifting(double nsPerSecond) { return square(nsPerSecond * 10, 10, 100); }
-tMeasured alternating(double peakToPeakNs) // as good as not filtered
-{
-    return shaped(0.01, 300, [=](double i) {
-        return i == 0 ? 0 : std::fmod(i, 2) < 1 ? peakToPeakNs / 2 : -peakToPeakNs / 2;
-    });
-}
-
-struct tLimitRow {
-    const char* mask;
-    const char* limit;
-    double limitNs;
-    tMeasured (*shape)(double ns);
-    const char* at = "";
-};
-const tLimitRow kLimits[] = {
-    {"g8273.2-a", "max |TE| 100 ns", 100, oneSpike},
-    {"g8273.2-a", "constant TE 50 ns", 50, constant},
-    {"g8273.2-a", "dTEL MTIE up to 1000 s 40 ns", 40, ramp, " at 1000 s"},
-    {"g8273.2-a", "dTEL TDEV up to 1000 s 4 ns", 4, bent, " at 1000 s"},
-    {"g8273.2-a", "dTEH peak to peak 70 ns", 70, alternating},
-    {"g8273.2-b", "max |TE| 70 ns", 70, oneSpike},
-    {"g8273.2-b", "constant TE 20 ns", 20, constant},
-    {"g8273.2-b", "dTEL MTIE up to 1000 s 40 ns", 40, ramp, " at 1000 s"},
-    {"g8273.2-b", "dTEL TDEV up to 1000 s 4 ns", 4, bent, " at 1000 s"},
-    {"g8273.2-b", "dTEH peak to peak 70 ns", 70, alternating},
-    {"g8273.2-c", "max |TE| 30 ns", 30, oneSpike},
-    {"g8273.2-c", "constant TE 10 ns", 10, constant},
-    {"g8273.2-c", "dTEL MTIE up to 1000 s 10 ns", 10, ramp, " at 1000 s"},
-    {"g8273.2-c", "dTEL TDEV up to 1000 s 2 ns", 2, bent, " at 1000 s"},
-    {"g8273.2-d", "max |TEL| 5 ns", 5, constant},
-    {"802.1as", "max |TE| 1000 ns", 1000, oneSpike},
-    {"802.1as", "TDEV 5 ns per s of tau up to 10 s", 5, drifting, " at 10 s"},
-};
-
-const tMaskLine& lineOf(const std::vector<tMaskLine>& lines, const std::string& limit)
-{
-    for (const tMaskLine& line : lines)
-        if (line.limit == limit) return line;
-    throw std::runtime_error("no line of " + limit);
-}
-
-TEST(Masks, holdJustInsideAndBreakJustOutside)
-{
-    for (const tLimitRow& row : kLimits) {
-        SCOPED_TRACE(std::string(row.mask) + " " + row.limit);
-        const auto inside = checkMask(row.mask, row.shape(0.99 * row.limitNs));
-        const auto outside = checkMask(row.mask, row.shape(1.01 * row.limitNs));
-        EXPECT_EQ(tMaskLine::kHeld, lineOf(inside, row.limit).verdict);
-        EXPECT_EQ(tMaskLine::kBroken, lineOf(outside, row.limit).verdict);
-        const std::string found = lineOf(outside, row.limit).found;
-        EXPECT_NE(std::string::npos, found.find(std::string("s") + row.at)) << found;
-        const auto rows = std::count_if(std::begin(kLimits), std::end(kLimits), [&row](auto& r) {
-            return r.mask == std::string(row.mask);
-        });
-        EXPECT_EQ(static_cast<size_t>(rows), inside.size()); // and there are no others
-    }
-    EXPECT_EQ(
-        (std::vector<std::string>{"g8273.2-a", "g8273.2-b", "g8273.2-c", "g8273.2-d", "802.1as"}),
-        maskNames());
-}
-
-TEST(Masks, areFilteredAndLimitTausWithinReason)
-{
-    const auto flat = [](double interval, size_t points) {
-        return shaped(interval, points, [](double) { return 1; });
-    };
-    const auto flip = [](double interval, double ns) { // a TDEV of 1.633 ns over one interval
-        return shaped(interval, 204, [=](double i) { return std::fmod(i, 2) < 1 ? ns : -ns; });
-    };
-    const auto late = [](double i) { return i < 1000 ? 0 : 11; };
-    const auto bentFlip = [](double i) {
-        return (std::fmod(i, 2) < 1 ? 0.17 : -0.17) + 40 * i * i / (200 * 200);
-    };
-    const char* const slope = "TDEV 5 ns per s of tau up to 10 s";
-    const char* const mtie = "dTEL MTIE up to 1000 s 40 ns";
-    const char* const high = "dTEH peak to peak 70 ns";
-    const struct {
-        const char *mask, *limit;
-        tMeasured measured;
-        int verdict;
-    } kRows[] = {
-        {"g8273.2-d", "max |TEL| 5 ns", alternating(60), tMaskLine::kHeld},
-        {"g8273.2-a", high, constant(999), tMaskLine::kHeld},
-        {"g8273.2-a", high, ramp(200), tMaskLine::kHeld},
-        {"g8273.2-a", mtie, alternating(60), tMaskLine::kHeld},
-        {"g8273.2-a", "dTEL TDEV up to 1000 s 4 ns", flip(0.05, 5), tMaskLine::kHeld},
-        // At a third of the points, which is no octave.
-        {"g8273.2-c", "dTEL TDEV up to 1000 s 2 ns", square(2.1, 200, 601), tMaskLine::kBroken},
-        // At 0.05 s, though it is much larger, but allowed, at 10 s.
-        {"802.1as", slope, shaped(0.05, 600, bentFlip), tMaskLine::kBroken},
-        {"g8273.2-d", "max |TEL| 5 ns", flat(1, 40), tMaskLine::kHeld},
-        {"g8273.2-d", "max |TEL| 5 ns", flat(1.01, 40), tMaskLine::kNotChecked},
-        {"802.1as", slope, flip(0.05, 0.15), tMaskLine::kHeld},
-        {"802.1as", slope, flip(0.05, 0.16), tMaskLine::kBroken},
-        {"802.1as", slope, flip(0.049, 100), tMaskLine::kHeld},
-        {"802.1as", slope, flat(1, 2), tMaskLine::kNotChecked},
-        {"g8273.2-c", "constant TE 10 ns", flat(1, 1000), tMaskLine::kHeld},
-        {"g8273.2-c", "constant TE 10 ns", flat(1, 999), tMaskLine::kNotChecked},
-        {"g8273.2-c", "constant TE 10 ns", shaped(1, 2000, late), tMaskLine::kBroken},
-        {"g8273.2-d", "all over time", flat(1, 1), tMaskLine::kNotChecked},
-    };
-    for (const auto& row : kRows)
-        EXPECT_EQ(row.verdict, lineOf(checkMask(row.mask, row.measured), row.limit).verdict)
-            << row.mask << " " << row.limit << " row " << &row - kRows;
 }
 
 } // namespace

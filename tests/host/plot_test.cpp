@@ -82,7 +82,7 @@ TEST(Plot, hasAllItsPanels)
          "'' using 1:3",
          "title 'MTIE'",
          "[0.05:10] 0.25*(x/0.05)**1 with lines",
-         "'limit of TDEV'",
+         "'limit of TDEV, free-running clock'",
          "set origin 0.5,0.000\nset size 0.5,0.333\n",
          "'Stability of the frequency'",
          "plot $stability using 1:4",
@@ -119,7 +119,7 @@ TEST(Plot, showsTheLimitsOfTheFilteredError)
                  {"$stability << END\n1 0.2357 1 4.082e-10 4.082e-10\n2 nan 1 3.536e-10 nan\nEND\n",
                   "$filtered << END\n1 0.11 0.4665 ", "set origin 0,0.250\nset size 0.5,0.500\n",
                   "title 'MTIE', \\\n    $filtered using 1:3 ", "'filtered MTIE'",
-                  "[0.05:1000] 40*(x/0.05)**0 with", "'limit of MTIE'", "$filtered using 1:2 ",
+                  "[0.05:10000] 40*(x/0.05)**0 with", "'limit of MTIE'", "$filtered using 1:2 ",
                   "'filtered TDEV'", "[0.05:1000] 4*(x/0.05)**0 with", "'limit of TDEV'",
                   "set origin 0.5,0.250\n"},
                  2);
