@@ -22,6 +22,7 @@ for verb in $verbs; do
     simulate | replay | run) told+=$'\n'$(sed -n '/^# DISCIPLINING/,/^##/p' "$page" | options) ;;
     esac
     has=$(host "$verb" --help | options | grep -vx -e --help)
+    expect "$verb: columns of its help" "" "$(host "$verb" --help | grep -E '.{81}|^  -.{30}[^ ]')"
     expect "$verb: options not told" "" "$(comm -23 <(echo "$has") <(sort -u <<< "$told"))"
     all+=$has$'\n'
 done

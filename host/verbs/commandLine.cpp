@@ -1,6 +1,7 @@
 #include "verbs/commandLine.h"
 
 #include "text/words.h"
+#include "verbs/tHelpLines.h"
 #include "verbs/verbs.h"
 
 #include <CLI/CLI.hpp>
@@ -8,6 +9,7 @@
 
 #include <cstdio>
 #include <exception>
+#include <memory>
 #include <stdexcept>
 
 namespace dravikHost {
@@ -59,7 +61,7 @@ int misspelt(const CLI::App& app, const std::vector<tVerb>& verbs)
 int parseAndRun(int argc, char** argv, const std::vector<tVerb>& verbs)
 {
     CLI::App app("Reference host of the clock servo plug-in", "dravik-host");
-    app.get_formatter()->column_width(40);
+    app.formatter(std::make_shared<tHelpLines>());
     app.set_version_flag("--version", "dravik-host " DRAVIK_VERSION, "Print the version and exit");
     app.require_subcommand(0, 1);
     app.failure_message(errorLine);
