@@ -62,6 +62,15 @@ std::string halfText(int half, const tPanelRow& row)
                        row.height);
 }
 
+// From a decade on, and up to another one at least, for there are no labels between.
+std::string tauRange(const tSeries& series)
+{
+    const double lowest = std::pow(10, std::floor(std::log10(series.interval)));
+    const double highest = static_cast<double>(octaves(series).back()) * series.interval;
+    return fmt::format("set xrange [{:.3g}:{:.6g}]\n", lowest / 1.1,
+                       std::max(1.1 * highest, 10 * lowest));
+}
+
 } // namespace
 
 bool hasStability(const tSeries& series)
@@ -74,13 +83,13 @@ std::string stabilityPanels(const tSeries& series, const std::string& mask, cons
     const auto curves = mask.empty() ? std::vector<tMaskCurve>() : maskCurves(mask);
     std::string text = rowsOf("stability", series);
     if (hasFilteredLimit(curves)) text += rowsOf("filtered", behindMaskFilter(series));
-    text +=
-        fmt::format("set logscale xy\nset key top right maxrows 3\nset xlabel 'tau, s'\nset xrange "
-                    "[{:g}:{:g}]\n",
-                    series.interval, static_cast<double>(octaves(series).back()) * series.interval);
+    text += "set logscale xy\nset title offset 0,0\n"
+            "set key default bmargin center horizontal samplen 3 width 2\n"
+            "set xlabel 'averaging time tau, s' offset 0,0.6\n";
+    text += tauRange(series);
     text += halfText(0, row);
-    text += fmt::format("set title 'Stability of the phase{}'\nset ylabel 'ns'\n"
-                        "stats $stability using 3 nooutput\nset yrange [*:100*STATS_max]\n"
+    text += fmt::format("set title 'Stability of the phase{}'\nset ylabel 'TDEV and MTIE, ns'\n"
+                        "set format y '%g'\n"
                         "plot $stability using 1:2 with linespoints pt 7 ps 0.4 lc rgb '{}' title "
                         "'TDEV', \\\n    '' using 1:3 with linespoints pt 7 ps 0.4 lc rgb '{}' "
                         "title 'MTIE'",
@@ -88,8 +97,8 @@ std::string stabilityPanels(const tSeries& series, const std::string& mask, cons
     for (const tMaskCurve& curve : curves)
         text += limitText(curve);
     text += "\n" + halfText(1, row);
-    return text + "set title 'Stability of the frequency'\nset ylabel 'fraction'\n"
-                  "set yrange [*:*]\nset format y '%.0e'\n"
+    return text + "set title 'Stability of the frequency'\nset ylabel 'fractional frequency, s/s'\n"
+                  "set format y '%.0e'\n"
                   "plot $stability using 1:4 with linespoints pt 7 ps 0.4 lc rgb '#d1242f' title "
                   "'ADEV', \\\n    '' using 1:5 with linespoints pt 7 ps 0.4 lc rgb '#9a6700' "
                   "title 'MDEV'\n";

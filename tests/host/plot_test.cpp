@@ -7,6 +7,7 @@
 #include <cmath>
 #include <sstream>
 #include <stdexcept>
+#include <utility>
 
 using namespace dravikHost;
 
@@ -56,25 +57,29 @@ TEST(Plot, hasAllItsPanels)
         {"set terminal svg dynamic size 1100,1000 ",
          "set output 'it''s.svg'\n",
          "$pairs << END\n"
-         "0 5000 -500 1\n1 30 3 0\n2 -40 -4 0\n3 20 2 0\n4 -10 -1 0\n5 50 nan 0\nEND\n",
+         "0 5000 -500000 1\n1 30 3000 0\n2 -40 -4000 0\n3 20 2000 0\n4 -10 -1000 0\n5 50 nan 0\n"
+         "END\n",
+         "set y2range [0:1]",
          "set multiplot\nset size 1,0.333\nset origin 0,0.667\n",
-         "set title 'Phase error, it''s.csv'",
-         "set nonlinear y via asinh(y/40) inverse 40*sinh(y)",
-         "set ytics (\"0\" 0, \"100 ns\" 1e2, \"-100 ns\" -1e2, \"1 µs\" 1e3, \"-1 µs\" -1e3, ",
-         "\"-100 s\" -1e11)",
-         "using 1:4 axes x1y2 with fillsteps lc rgb shade title 'not locked'",
-         "'' using 1:2 with lines",
-         "'clock - reference, as measured'\nunset nonlinear y",
+         "set ylabel 'phase error, ns'\nset yrange [-49:59]\n",
+         "'cut off: 1 of 6 points, at 0 s, up to 5 µs' at graph",
+         "set xlabel 'time, s'\nset title 'Phase error, it''s.csv'\n",
+         "plot $pairs using 1:4 axes x1y2 with fillsteps ",
+         "title 'not locked', \\\n    '' using 1:($2/1) with lines",
+         "'clock - reference, as measured'\nunset nonlinear y\nset yrange [*:*]",
          "set origin 0,0.333\n",
-         "set yrange [-4.7:3.7]\nset title 'Frequency'",
+         "set yrange [-4.7:3.7]\n",
+         "'cut off: 1 of 6 points, at 0 s, down to -500 ppm' at graph",
+         "set title 'Frequency'",
+         "ppm'",
          "plot $pairs using 1:4 axes x1y2 with fillsteps",
-         "'' using 1:3 with steps",
+         "'' using 1:($3/1000) with steps",
          "'offset ordered'\nset yrange [*:*]",
          "$stability << END\n1 ",
          "2 ",
          "END\n",
          "set logscale xy",
-         "set xrange [1:2]",
+         "set xrange [0.909:10]",
          "set origin 0,0.000\nset size 0.5,0.333\n",
          "'Stability of the phase, mask 802.1as'",
          "plot $stability using 1:2",
@@ -92,6 +97,56 @@ TEST(Plot, hasAllItsPanels)
         4);
 }
 
+// What an axis of errors is like; the first error is that of the start.
+TEST(Plot, fitsTheAxisToWhatComesAfterTheStart)
+{
+    const std::string wide =
+        "set nonlinear y via asinh(y/20) inverse 20*sinh(y)\nset ytics (\"0\" 0";
+    const struct {
+        const char* name;
+        std::vector<double> errorsNs;
+        std::string axis;
+    } kRows[] = {
+        {"noise alone", {20, -20, 20, -20}, "set ylabel 'phase error, ns'\nset yrange [-24:24]\n"},
+        {"far from zero",
+         {3.7e10, 3.7e10 + 4},
+         "phase error, s'\nset yrange [36.9999999996:37.0000000044]"},
+        {"two decades",
+         {-1e6, 20, 20, 20, -900, 20},
+         wide + ", \"20 ns\" 20, \"-20 ns\" -20, \"50 ns\" 50, \"-50 ns\" -50, \"100 ns\" 100, "
+                "\"-100 ns\" -100, "
+                "\"200 ns\" 200, \"-200 ns\" -200, \"500 ns\" 500, \"-500 ns\" -500, \"1 µs\" "
+                "1000, \"-1 µs\" -1000)\n"
+                "set ylabel \"phase error, linear\\nwithin ±20 ns\"\nset yrange [-1000:1000]\n"
+                "set label 1 'cut off: 1 of 6 points, at 0 s, down to -1 ms'"},
+        {"more decades",
+         {1e6, 1e5, 20, 20, 20, 20, 20, 20, 20, -9e4},
+         wide +
+             ", \"100 ns\" 100, \"-100 ns\" -100, \"1 µs\" 1000, \"-1 µs\" -1000, \"10 µs\" 10000, "
+             "\"-10 µs\" -10000, \"100 µs\" 100000, \"-100 µs\" -100000)\n"},
+        {"cut off twice",
+         {1e6, 1e5, 20, 20, 20, 20, 20, 20, 20, 20},
+         "'cut off: 2 of 10 points, from 0 s to 1 s, up to 1 ms'"},
+        {"a start of half the trace",
+         {1e6, 1e5, 20, 20, 20},
+         "set yrange [-1000000:1000000]\nset label 1 ''"},
+    };
+    for (const auto& row : kRows) {
+        const std::string script = plotScript(recordingOf(row.errorsNs), {"a.png", ""});
+        EXPECT_NE(std::string::npos, script.find(row.axis)) << row.name << "\n" << script;
+    }
+}
+
+TEST(Plot, measuresLongTracesInHoursAndDays)
+{
+    for (const auto& [seconds, axis] :
+         {std::pair(17'999, "'time, s'"), {18'000, "'time, h'"}, {432'000, "'time, d'"}}) {
+        tRecording recording = recordingOf({1, 2});
+        recording.pairs.back().elapsedNs = int64_t{seconds} * 1'000'000'000;
+        EXPECT_NE(std::string::npos, plotScript(recording, {"a.png", ""}).find(axis));
+    }
+}
+
 TEST(Plot, leavesOutWhatTheTraceDoesNotTell)
 {
     tRecording still = recordingOf({7, 7, 7, 7});
@@ -104,7 +159,8 @@ TEST(Plot, leavesOutWhatTheTraceDoesNotTell)
     still.pairs.front().trueErrorNs = 3;
     expectScript(plotScript(still, {"a.png", ""}),
                  {"1100,700 ", "set size 1,0.500\nset origin 0,0.500", "'clock - true time'",
-                  "set origin 0,0.000\nset title 'Frequency'", "unset multiplot"},
+                  "set origin 0,0.000\nset yrange [-1:1]\n",
+                  "set title 'Frequency'\nset ylabel 'offset ordered, ppb'", "unset multiplot"},
                  2);
     EXPECT_FALSE(hasStability({1, {0, 1}}));
     EXPECT_FALSE(hasStability({1, {1, 1, 1}}));
