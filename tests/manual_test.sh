@@ -43,20 +43,42 @@ chmod +x "$scratch/bin/dravik-host"
 PATH=$scratch/bin:$PATH
 cd "$root" || exit 1
 while IFS='|' read -r line wanted; do
-    read -ra COMP_WORDS <<< "$line"
-    [[ $line != *' ' ]] || COMP_WORDS+=('')
+    mapfile -t COMP_WORDS < <(grep -oE "\"[^\"]*|(\\\\.|[^ :=])+|[:=]" <<< "$line")
+    [[ $line != *' ' || $line == *'"'* ]] || COMP_WORDS+=('')
     COMP_CWORD=$((${#COMP_WORDS[@]} - 1))
     _dravik_host
-    expect "completion of '$line'" "$wanted" "${COMPREPLY[*]}"
+    expect "completion of '$line'" "$wanted" "$(IFS=,; echo "${COMPREPLY[*]}")"
 done << 'END'
-dravik-host s|simulate show
+dravik-host s|simulate,show
 dravik-host --v|--version
 dravik-host run --hold|--holdover-after
-dravik-host run --clock |soft realtime phc:
-dravik-host metrics --mask g8273.2-|g8273.2-a g8273.2-b g8273.2-c g8273.2-d
-dravik-host plot --mask g|g8273.2-a g8273.2-b g8273.2-c g8273.3-a g8273.3-b
+dravik-host run --clock |soft,realtime,phc:
+dravik-host run --clock=r|realtime
+dravik-host run --reference |realtime,phc:,shm:,sock:
+dravik-host run --reference s|shm:,sock:
+dravik-host run --reference phc:/dev/nul|/dev/null
+dravik-host run --reference shm:|0,1,2,3
+dravik-host run --reference sock:config/RE|config/README.md
+dravik-host run --then |60s=
+dravik-host run --then 2min|2min=
+dravik-host run --then 60s=config/dravik_tr_ptp4l_t|config/dravik_tr_ptp4l_tab.json
+dravik-host run --duration c|
+dravik-host run --dry-run --csv CHANGE|CHANGELOG.md
+dravik-host show --reference-type |IEEE\ 802.1AS-2011\ TAB,IEEE\ 1588-2008\ BC
+dravik-host show --reference-type IEEE\ 1|IEEE\ 1588-2008\ BC
+dravik-host show --reference-type "IEEE 8|IEEE 802.1AS-2011 TAB
+dravik-host plot trace.csv -o CHANGE|CHANGELOG.md
+dravik-host metrics --mask g8273.2-c|g8273.2-c
+dravik-host metrics CHANGE|CHANGELOG.md
+dravik-host doctor /dev/nul|/dev/null
 dravik-host check config/dravik_tr_ptp4l_t|config/dravik_tr_ptp4l_tab.json
 END
+for verb in metrics plot; do
+    masks=$(host "$verb" --mask none x 2>&1 | sed -E 's/.*\{(.*)\}.*/\1/')
+    COMP_WORDS=(dravik-host "$verb" --mask '') COMP_CWORD=3
+    _dravik_host
+    expect "masks of $verb" "$masks" "$(IFS=,; echo "${COMPREPLY[*]}")"
+done
 
 # The unit: its options are understood, though there may be no such clock; and it has one capability.
 unit=$root/examples/dravik-host.service
