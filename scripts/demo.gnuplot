@@ -32,7 +32,7 @@ do for [run in "simulate run"] {
 }
 do for [run in "simulate run"] {
     set title run eq "run" ? "Live: frequency" : "Simulated oscillator: frequency"
-    set ylabel "offset ordered, ppm"
+    set ylabel "frequency, ppm"
     set yrange [*:*]
     stats frequencies(run) using ($2 > locked(run) ? $8 / 1000.0 : NaN) nooutput
     @fit

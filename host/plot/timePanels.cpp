@@ -274,7 +274,7 @@ std::string frequencyPanel(const tPairs& pairs)
     const double unit = isSmall ? 1 : 1000;
     return rangeText(span, unit) + noteText(cutOffText(pairs, span, ordered, ppmText)) +
            fmt::format("set title 'Frequency'\n"
-                       "set ylabel 'offset ordered, {}'\n"
+                       "set ylabel 'frequency, {}'\n"
                        "set format y '%.9g'\n"
                        "{}"
                        " using 1:($3/{}) with steps lc rgb '#d1242f' title 'offset ordered'\n"

@@ -160,7 +160,7 @@ TEST(Plot, leavesOutWhatTheTraceDoesNotTell)
     expectScript(plotScript(still, {"a.png", ""}),
                  {"1100,700 ", "set size 1,0.500\nset origin 0,0.500", "'clock - true time'",
                   "set origin 0,0.000\nset yrange [-1:1]\n",
-                  "set title 'Frequency'\nset ylabel 'offset ordered, ppb'", "unset multiplot"},
+                  "set title 'Frequency'\nset ylabel 'frequency, ppb'", "unset multiplot"},
                  2);
     EXPECT_FALSE(hasStability({1, {0, 1}}));
     EXPECT_FALSE(hasStability({1, {1, 1, 1}}));
