@@ -27,17 +27,6 @@ struct tMetrics {
     std::vector<std::string> masks;
 };
 
-// Squares and sums of larger errors would have no figures.
-void requireInRange(const std::string& file, const std::vector<double>& errors)
-{
-    constexpr double kLargest = 1e100; // s
-    for (const double error : errors) {
-        if (std::fabs(error) <= kLargest) continue;
-        throw std::runtime_error(fmt::format(
-            "{}: an error of {:.4g} s is out of range, so there are no figures", file, error));
-    }
-}
-
 struct tRead {
     tRecording recording;
     tMeasured measured;
@@ -51,7 +40,6 @@ tRead read(const tMetrics& options)
     if (read.recording.pairs.empty() && !options.masks.empty())
         throw std::runtime_error("summaries cannot be held to a mask");
     read.measured = measure(read.recording, options.selection);
-    requireInRange(options.trace.file, read.measured.errors);
     if (options.removeSlope) read.measured.removeSlope();
     return read;
 }
