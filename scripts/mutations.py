@@ -11,7 +11,7 @@ KIND_OF = {token: kind for kind, tokens in KINDS.items() for token in tokens.spl
 TOKEN = re.compile(r"(?<= )(?:[<>=!]=|[-+]=|&&|\|\||[-+*/<>])(?= )|\+\+|--|\btrue\b|\bfalse\b"
                    r"|(?<![\w.])(?:0x[0-9A-F]+|\d+)")
 DECLARATION = re.compile(r"((const|constexpr|static) )*[\w:]+(<.*>)?[*&]?( const)? \w+( =|[;({])")
-LITERAL = r"\"(\\.|[^\"\\])*\"|'(\\.|[^'\\])*'"
+LITERAL = r"\"(\\.|[^\"\\])*\"|(?<!\w)'(\\.|[^'\\\n])+'"  # not the ' between digits
 BARE = re.compile(r"(const )?[\w:]+(<.*>)? \w+;$")  # a declaration that reads nothing
 LIMITS = re.compile(r"if \(\w+ [<>]=? (?:static_cast<double>\((.+)\)|(.+))\) return (?:\1|\2);$")  # at it, both ways give it
 LEAVES = re.compile(r"(return|break|continue|throw)\b")
