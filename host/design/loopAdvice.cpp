@@ -1,12 +1,13 @@
 #include "design/loopAdvice.h"
 
-#include "design/designDocuments.h"
 #include "design/tLoopAnalysis.h"
+#include "design/tLoopForecast.h"
 #include "design/tLoopGains.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
 
+#include <algorithm>
 #include <cmath>
 
 namespace dravikHost {
@@ -14,6 +15,13 @@ namespace dravikHost {
 namespace {
 
 std::string secondsAsText(double seconds) { return durationText(nsOf(seconds)); }
+
+// As options take it.
+std::string optionText(int64_t ns)
+{
+    return ns % kSecondNs == 0 ? fmt::format("{}s", ns / kSecondNs)
+                               : fmt::format("{}ms", static_cast<double>(ns) / 1e6);
+}
 
 std::string gainsText(const tServoParameters& parameters)
 {
@@ -30,8 +38,12 @@ std::string gainsText(const tServoParameters& parameters)
                        c, secondsAsText(1e-6 * (1 - c) / std::fabs(gains.ki)));
 }
 
-std::string stabilityText(const tLoopAnalysis& loop)
+std::string stabilityText(const tServoParameters& parameters, const tLoopAnalysis& loop)
 {
+    if (loop.marginal)
+        return fmt::format("! marginal: with A = B no frequency is learnt once locked; each ppb "
+                           "that the oscillator changes keeps the clock {} off\n",
+                           secondsAsText(1e-9 / tLoopGains::of(parameters).kp));
     if (loop.stable) {
         return loop.stableBelow > 0
                    ? fmt::format("  stable below {}\n", secondsAsText(loop.stableBelow))
@@ -54,33 +66,106 @@ std::string dynamicsText(const tLoopAnalysis& loop)
                        *loop.damping, settling);
 }
 
-std::string noiseText(const tLoopAnalysis& loop, std::optional<double> noiseNs)
+std::string bandwidthText(const tLoopAnalysis& loop)
 {
-    const std::string share = fmt::format("{:.0f} % of the noise", loop.noiseGain * 100);
-    if (!noiseNs) return fmt::format("  passes {} on to the clock\n", share);
-    return fmt::format("  passes {} on to the clock, {}\n", share,
-                       durationText(loop.noiseGain * *noiseNs));
+    const std::string bandwidth = loop.bandwidth > 0 ? fmt::format("{:.3g} Hz", loop.bandwidth)
+                                                     : "above half the rate of pairs";
+    return fmt::format("  3 dB bandwidth {}, gain peaking {:.2f} dB (G.8273.2: 0.05 to 0.1 Hz, at "
+                       "most 0.1 dB)\n",
+                       bandwidth, loop.peaking);
 }
 
-// Each measurement is compared with the threshold, with its noise and that of the clock. A lost
-// lock takes three pairs to come back to the next comparison.
-std::string thresholdText(const tServoParameters& parameters, const tLoopAnalysis& loop,
-                          double interval, double noiseNs)
+// Weighs the whole rate that was measured, so each lock begins with its distance from 1.
+std::string frequencyLockText(const tServoParameters& parameters, const tLoopAnalysis& loop,
+                              double interval)
 {
-    constexpr double kPairsToLock = 3;
-    constexpr double kSeldom = 1e-3; // per hour
-    const double seenNs = noiseNs * std::hypot(1, loop.noiseGain);
-    const double deviations = nsOf(parameters.snapTimeThreshold) / seenNs;
-    const double chance = std::erfc(deviations / std::sqrt(2.0));
-    const double perHour = 3600 / interval / (kPairsToLock + 1 / chance);
+    constexpr double kUsualLimit = 500e-6; // of a clock's frequency offset
+    const double gain = parameters.frequencyLockGain;
+    const double off = std::fabs(gain - 1);
+    if (off == 0) return "";
+    const double astray = off * std::max(loop.takeUp, interval);
+    const std::string text = fmt::format("frequencyLockGain {:.10g} sets the frequency {} off",
+                                         gain, offsetText(off * 1e9));
+    if (off > kUsualLimit)
+        return fmt::format("! {}, beyond most clocks' limit of 500 ppm: never locks; better 1\n",
+                           text);
+    if (astray < parameters.snapTimeThreshold)
+        return fmt::format("  {}: each lock begins with an error of up to {}\n", text,
+                           secondsAsText(astray));
+    return fmt::format("! {}: the error goes to {}, beyond snapTimeThreshold, {}: {}; better 1\n",
+                       text, secondsAsText(astray), secondsAsText(parameters.snapTimeThreshold),
+                       off * interval < parameters.snapTimeThreshold ? "the lock never holds"
+                                                                     : "never locks");
+}
+
+// Orders are whole parts per billion, from which the law starts again: half of one is lost.
+std::string actionText(const tServoParameters& parameters)
+{
+    constexpr double kLeastChange = 0.5e-9;
+    const double g = parameters.phaseLockGain;
+    const double a = parameters.phaseLockCoefficientA;
+    const double b = parameters.phaseLockCoefficientB;
+    const double threshold = parameters.snapTimeThreshold;
+    const double stays = kLeastChange / (g * (a - b));
+    if (g * (std::fabs(a) + std::fabs(b)) * threshold < kLeastChange)
+        return fmt::format("! gain too small to act: no error below snapTimeThreshold, {}, makes "
+                           "half of 1 ppb, the least that is ordered\n",
+                           secondsAsText(threshold));
+    if (stays >= threshold)
+        return fmt::format(
+            "! gain too small to correct the frequency: a lasting error has to reach "
+            "{} to make half of 1 ppb, the least that is ordered; snapTimeThreshold "
+            "is {}\n",
+            secondsAsText(stays), secondsAsText(threshold));
+    return fmt::format("  orders are whole ppb: without noise the error may stay within {}\n",
+                       secondsAsText(stays));
+}
+
+std::string noiseText(const tLoopAnalysis& loop, const std::optional<tLoopForecast>& forecast)
+{
+    constexpr double kMuchMore = 1.25;
+    const std::string share = fmt::format("{:.0f} % of the noise", loop.noiseGain * 100);
+    if (!forecast) return fmt::format("  passes {} on to the clock\n", share);
+    const std::string passed = fmt::format("  passes {} on to the clock, {}\n", share,
+                                           durationText(loop.noiseGain * forecast->noiseNs));
+    if (forecast->roundedNs < kMuchMore * forecast->linearNs) return passed;
+    return passed + fmt::format("! orders in whole ppb, from which the law starts again, raise its "
+                                "error to {} RMS; a larger gain suffers less\n",
+                                durationText(forecast->roundedNs));
+}
+
+// What would hold locks that are lost.
+std::string remedyText(const tServoParameters& parameters, const tLoopForecast& forecast)
+{
+    constexpr double kHardlyMore = 1.1;
+    if (forecast.measureOverNs)
+        return fmt::format(
+            "! the frequency is measured over one pair, through the noise, and {:.2g} "
+            "% of starts fail: use --measure-over {}\n",
+            forecast.failing * 100, optionText(*forecast.measureOverNs));
+    if (forecast.withoutFilter)
+        return "! these locks are lost by the spike filter, which lets the error go\n";
+    const double better = forecast.betterThreshold;
+    if (better < kHardlyMore * parameters.snapTimeThreshold) return "";
+    return fmt::format("! better a snapTimeThreshold of {}, {:.2g} in the document\n",
+                       secondsAsText(better), better);
+}
+
+std::string lockText(const tServoParameters& parameters, const tLoopForecast& forecast)
+{
+    constexpr double kSeldom = 1e-3;     // locks lost per hour
+    constexpr double kFewFailing = 0.01; // of starts
+    const double threshold = parameters.snapTimeThreshold;
     const std::string text =
         fmt::format("snapTimeThreshold, {}, is {:.1f} deviations of what it is compared with",
-                    secondsAsText(parameters.snapTimeThreshold), deviations);
-    if (chance == 0 || perHour < kSeldom) return fmt::format("  {}\n", text);
-    tNoiseModel seen;
-    seen.noiseNs = seenNs;
-    return fmt::format("! {}: the lock is lost about {:.3g} times an hour; better {:.2g}\n", text,
-                       perHour, snapThresholdFor(seen));
+                    secondsAsText(threshold), nsOf(threshold) / forecast.seenNs);
+    if (forecast.lostPerHour < kSeldom && forecast.failing < kFewFailing)
+        return fmt::format("  {}\n", text);
+    if (!forecast.locks)
+        return fmt::format("! {}: never locks\n", text) + remedyText(parameters, forecast);
+    return fmt::format("! {}: the lock is lost about {:.3g} times an hour\n", text,
+                       forecast.lostPerHour) +
+           remedyText(parameters, forecast);
 }
 
 std::string filterText(const tServoParameters& parameters, double interval, double noiseNs)
@@ -93,24 +178,28 @@ std::string filterText(const tServoParameters& parameters, double interval, doub
     const double limit = std::max(std::min(growth * meanRate, parameters.spikeFilterMaxThreshold),
                                   parameters.spikeFilterMinThreshold);
     const double steps = limit / meanRate;
-    return fmt::format("{} spike filter limits to {:.1f} mean steps of the noise{}\n",
-                       steps < kTight ? "!" : " ", steps,
+    return fmt::format("{} spike filter limits to {:.1f} mean steps of the noise, {} per pair{}\n",
+                       steps < kTight ? "!" : " ", steps, secondsAsText(limit * interval),
                        steps < kTight ? ", which it cuts into: the loop is slowed" : "");
 }
 
 } // namespace
 
-std::string loopAdvice(const tServoParameters& parameters, double interval,
-                       std::optional<double> noiseNs)
+std::string loopAdvice(const tServoLibrary& library, const tServoParameters& parameters,
+                       double interval, std::optional<double> noiseNs)
 {
     const tLoopAnalysis loop(parameters, interval);
+    const bool rounds = parameters.phaseLockCoefficientC == 1;
     std::string text = fmt::format("at one pair every {}:\n", secondsAsText(interval)) +
-                       gainsText(parameters) + stabilityText(loop);
+                       gainsText(parameters) + frequencyLockText(parameters, loop, interval) +
+                       stabilityText(parameters, loop);
     if (!loop.stable) return text;
-    text += dynamicsText(loop) + noiseText(loop, noiseNs);
-    if (!noiseNs) return text;
-    return text + thresholdText(parameters, loop, interval, *noiseNs) +
-           filterText(parameters, interval, *noiseNs);
+    std::optional<tLoopForecast> forecast;
+    if (noiseNs) forecast = forecastLoop(library, parameters, interval, *noiseNs);
+    text += dynamicsText(loop) + bandwidthText(loop) + (rounds ? actionText(parameters) : "") +
+            noiseText(loop, forecast);
+    if (!forecast) return text;
+    return text + lockText(parameters, *forecast) + filterText(parameters, interval, *noiseNs);
 }
 
 } // namespace dravikHost

@@ -4,10 +4,13 @@
 #include <cmath>
 #include <complex>
 #include <cstdint>
+#include <limits>
 
 namespace dravikHost {
 
 namespace {
+
+constexpr double kTurn = 6.283185307179586; // rad
 
 using tPole = std::complex<double>;
 
@@ -35,8 +38,9 @@ std::optional<double> dampingOf(const tPoles& poles)
 class tLoop
 {
 public:
-    tLoop(const tServoParameters& parameters, double interval, double firstPhase)
-        : law(parameters), t(interval), x(firstPhase)
+    tLoop(const tServoParameters& parameters, double interval, double firstPhase,
+          double firstFrequency = 0)
+        : law(parameters), t(interval), x(firstPhase), u(firstFrequency)
     {}
 
     // The phase as it is, before the law sees it with that much noise.
@@ -55,8 +59,58 @@ private:
     const tServoParameters& law;
     double t;
     double x;
-    double u = 0;
+    double u;
     double last = 0;
+};
+
+// With y = 1 - cos w, w the angle between pairs, the power that passes is a ratio of polynomials
+//
+//     (k^2 + n y) / (k^2 + d y + e y^2)        k = a - b,  a = g A T,  b = g B T
+//
+// whose terms stay exact for the slowest of loops, where those in z cancel out.
+class tTransfer
+{
+public:
+    tTransfer(const tServoParameters& law, double interval)
+    {
+        const double a = law.phaseLockGain * law.phaseLockCoefficientA * interval;
+        const double b = law.phaseLockGain * law.phaseLockCoefficientB * interval;
+        const double c = law.phaseLockCoefficientC;
+        kk = (a - b) * (a - b);
+        n = 2 * a * b;
+        d = 2 * (1 - c) * (1 - c) - 2 * (1 + c) * (a + b) + 2 * a * b + 8 * b;
+        e = 4 * (c - b);
+    }
+
+    // The angle of half the power, 0 if it is beyond half a turn.
+    double halfPowerAngle() const
+    {
+        const double y = firstRoot(e, d - 2 * n, -kk);
+        return y <= kHalfTurn ? 2 * std::asin(std::sqrt(y / 2)) : 0;
+    }
+
+    double largestPower() const
+    {
+        const double top = firstRoot(n * e, 2 * e * kk, -kk * (n - d));
+        return std::max({1.0, power(kHalfTurn), top <= kHalfTurn ? power(top) : 1.0});
+    }
+
+private:
+    static constexpr double kHalfTurn = 2; // y at half the rate of pairs
+
+    double power(double y) const { return (kk + n * y) / (kk + y * (d + e * y)); }
+
+    // The least positive root of p y^2 + q y + r; infinity if there is none.
+    static double firstRoot(double p, double q, double r)
+    {
+        double least = std::numeric_limits<double>::infinity();
+        const double half = -(q + std::copysign(std::sqrt(q * q - 4 * p * r), q)) / 2;
+        for (const double root : {half / p, r / half})
+            if (root > 0 && root < least) least = root;
+        return least;
+    }
+
+    double kk, n, d, e;
 };
 
 } // namespace
@@ -76,6 +130,8 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     stable = std::fabs(product) < 1 && std::fabs(sum) < 1 + product;
     if (c == 1 && a > b && a + b > 0)
         stableBelow = b > 0 ? std::min(4 / (g * (a + b)), 2 / (g * b)) : 0;
+    marginal = c == 1 && a == b && product > -1 && product < 1;
+    if (marginal) stable = false; // whatever the last digit of its sum
     if (!stable) return;
 
     const tPoles poles = polesOf(sum, product);
@@ -85,14 +141,27 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     settling = pairs * interval;
     tLoop step(parameters, interval, 1);
     tLoop impulse(parameters, interval, 0);
+    tLoop frequency(parameters, interval, interval, 1);
     double squares = 0;
+    double phaseSquares = 0;
+    double frequencySquares = 0;
     const auto enough = static_cast<int64_t>(4 * pairs) + 2;
     for (int64_t pair = 0; pair < enough; ++pair) { // to a part in 10^8
-        overshoot = std::max(overshoot, -step.next(0));
+        const double stepped = step.next(0);
+        const double astray = frequency.next(0);
+        overshoot = std::max(overshoot, -stepped);
+        takeUp = std::max(takeUp, std::fabs(astray));
+        phaseSquares += stepped * stepped;
+        frequencySquares += astray * astray;
         const double phase = impulse.next(pair == 0 ? 1 : 0);
         squares += phase * phase;
     }
     noiseGain = std::sqrt(squares);
+    phaseWalkGain = std::sqrt(phaseSquares);
+    frequencyWalkGain = std::sqrt(frequencySquares);
+    const tTransfer transfer(parameters, interval);
+    bandwidth = transfer.halfPowerAngle() / (kTurn * interval);
+    peaking = 10 * std::log10(transfer.largestPower());
 }
 
 } // namespace dravikHost

@@ -17,13 +17,23 @@ struct tLoopAnalysis {
     tLoopAnalysis(const tServoParameters& parameters, double interval);
 
     bool stable;
-    double stableBelow; // s; the interval from which on it is not; 0: at none, or C is not 1
+    bool marginal = false; // a pole at 1, the other one inside: no integral part
+    double stableBelow;    // s; the interval from which on it is not; 0: at none, or C is not 1
 
     // Of a stable loop.
     std::optional<double> damping; // none if its poles are no decaying oscillation or slope
     double settling = 0;           // s, to one per cent
     double overshoot = 0;          // of a step in phase: share by which it goes beyond
     double noiseGain = 0;          // deviation of the clock per deviation of white measurements
+    double takeUp = 0;             // s; how far a wrong frequency at the lock leads it astray
+
+    // Of the clock, for a walk in steps per pair: of its phase, and of its frequency.
+    double phaseWalkGain = 0;     // ns per ns
+    double frequencyWalkGain = 0; // s; ns per ppb
+
+    // From the phase of the reference to that of the clock.
+    double bandwidth = 0; // Hz, where it is down by 3 dB; 0: nowhere below half the rate of pairs
+    double peaking = 0;   // dB
 };
 
 } // namespace dravikHost

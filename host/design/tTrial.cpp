@@ -1,6 +1,7 @@
 #include "design/tTrial.h"
 
 #include "clocks/tSteeredClock.h"
+#include "loop/tMeasureSpacing.h"
 #include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
 #include "sources/tSimulatedSource.h"
@@ -15,9 +16,9 @@ namespace {
 constexpr int32_t kMaxOffsetPpb = 500'000;
 constexpr uint64_t kFirstSeed = 1000;
 
-tOscillatorModel oscillatorOf(const tNoiseModel& model)
+tOscillatorModel oscillatorOf(const tNoiseModel& model, double errorPpb)
 {
-    return {0, model.frequencyNoisePpb, model.wanderPpb};
+    return {errorPpb, model.frequencyNoisePpb, model.wanderPpb};
 }
 
 tMeasurementModel measurementOf(const tNoiseModel& model)
@@ -29,14 +30,23 @@ tMeasurementModel measurementOf(const tNoiseModel& model)
     return measurement;
 }
 
+struct tFirstPairs {
+    bool noisy = false;
+    uint64_t offsetNs = 0; // of the clock
+    int64_t measureOverNs = 0;
+};
+
 class tRun
 {
 public:
     tRun(const tServoLibrary& library, const std::string& document, const tNoiseModel& model,
-         uint64_t seed)
+         uint64_t seed, const tFirstPairs& first = {})
         : intervalNs(model.intervalNs), measurement(measurementOf(model)), noise(seed),
-          clock(tSimulatedSource::kStartNs, oscillatorOf(model), kMaxOffsetPpb, noise),
-          host(library, clock), observer(-kMaxOffsetPpb, kMaxOffsetPpb)
+          clock(tSimulatedSource::kStartNs + first.offsetNs,
+                oscillatorOf(model, first.noisy ? kFrequencyPpb + noise.uniform() : 0),
+                kMaxOffsetPpb, noise),
+          host(library, clock), observer(-kMaxOffsetPpb, kMaxOffsetPpb),
+          spacing(first.measureOverNs), noisy(first.noisy)
     {
         host.writeConfig(document);
     }
@@ -47,25 +57,39 @@ public:
         clock.advance(intervalNs);
         trueNs += static_cast<uint64_t>(intervalNs);
         const double errorNs = clock.aheadOfNs(trueNs);
-        const double seenNs = acquired ? measurementErrorNs(measurement, noise) : 0;
+        const double seenNs = noisy ? measurementErrorNs(measurement, noise) : 0;
+        elapsedNs += intervalNs;
+        if (spacing.holdsBack(elapsedNs)) return errorNs;
         host.adjustTime(trueNs + static_cast<uint64_t>(static_cast<int64_t>(std::floor(seenNs))),
                         clock.timeNs());
-        lost += observer.observe(host.calls()) == kLockLost ? 1 : 0;
-        acquired = acquired || observer.locked();
+        const tLockEvent event = observer.observe(host.calls());
+        spacing.given(elapsedNs, event, observer.measuring());
+        lost += event == kLockLost ? 1 : 0;
+        missed = missed || event == kLockMissed;
+        wasLocked = wasLocked || observer.locked();
+        noisy = noisy || wasLocked;
         return errorNs;
     }
 
     int64_t locksLost() const { return lost; }
+    bool failed() const { return lost > 0 || missed; }
+    bool everLocked() const { return wasLocked; }
 
 private:
+    static constexpr double kFrequencyPpb = 12'000; // and a fraction, of a clock to be measured
+
     int64_t intervalNs;
     tMeasurementModel measurement;
     tNoise noise;
     tSimulatedClock clock;
     tServoHost host;
     tLockObserver observer;
-    bool acquired = false; // the first lock
+    tMeasureSpacing spacing;
+    bool noisy; // the measurements
+    bool wasLocked = false;
     int64_t lost = 0;
+    bool missed = false;
+    int64_t elapsedNs = 0;
     uint64_t trueNs = tSimulatedSource::kStartNs;
 };
 
@@ -97,6 +121,33 @@ tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
     result.tailNs = std::pow(eighths / (counted * seeds), 0.125);
     result.rmsNs = std::sqrt(squares / (counted * seeds));
     result.lostPerHour = static_cast<double>(lost) * 3600 / (all * seeds * model.interval());
+    return result;
+}
+
+tStartResult runStarts(const tServoLibrary& library, const std::string& document,
+                       const tNoiseModel& model, const tStartOptions& options)
+{
+    constexpr uint64_t kOffsetNs = 1'000'000;
+    tStartResult result;
+    double squares = 0;
+    const int64_t half = options.pairs / 2;
+    for (uint64_t i = 0; i < options.starts; ++i) {
+        tRun run(library, document, model, kFirstSeed + i,
+                 {true, kOffsetNs, options.measureOverNs});
+        for (int64_t pair = 0; pair < half; ++pair)
+            run.takePair();
+        const int64_t early = run.locksLost();
+        result.failed += run.failed() ? 1 : 0;
+        for (int64_t pair = 0; pair < half; ++pair) {
+            const double errorNs = run.takePair();
+            squares += errorNs * errorNs;
+        }
+        result.neverLocked += run.everLocked() ? 0 : 1;
+        result.lostEarly += early;
+        result.lostLate += run.locksLost() - early;
+    }
+    const auto counted = static_cast<double>(half) * static_cast<double>(options.starts);
+    result.rmsNs = std::sqrt(squares / counted);
     return result;
 }
 

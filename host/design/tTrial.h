@@ -28,6 +28,25 @@ struct tTrialResult {
 tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
                       const tNoiseModel& model, const tTrialOptions& options);
 
+// Starts with the noise in them, frequency and step measured through it as a host that comes up
+// does it; the clock is 1 ms and 12 ppm off.
+struct tStartOptions {
+    int64_t pairs; // of each start
+    uint64_t starts;
+    int64_t measureOverNs = 0;
+};
+
+struct tStartResult {
+    int64_t neverLocked = 0; // starts, of all
+    int64_t failed = 0;      // starts that missed the lock, or lost it in their first half
+    int64_t lostEarly = 0;   // locks, in the first half of the pairs
+    int64_t lostLate = 0;    // in the second half
+    double rmsNs = 0;        // of the true error, in the second half
+};
+
+tStartResult runStarts(const tServoLibrary& library, const std::string& document,
+                       const tNoiseModel& model, const tStartOptions& options);
+
 // Enough pairs for a loop of such gains to settle and to show its error.
 tTrialOptions trialFor(const tLoopGains& gains, const tNoiseModel& model);
 

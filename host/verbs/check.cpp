@@ -34,7 +34,8 @@ void run(const tCheck& options)
         fmt::print(stderr, "dravik-host: {}\n", note);
     if (options.intervalNs == 0) return;
     const auto inForce = tServoParameters::of(host.readConfig());
-    fmt::print(stderr, "{}", loopAdvice(inForce, secondsOf(options.intervalNs), options.noiseNs));
+    fmt::print(stderr, "{}",
+               loopAdvice(library, inForce, secondsOf(options.intervalNs), options.noiseNs));
 }
 
 } // namespace
