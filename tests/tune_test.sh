@@ -27,6 +27,7 @@ between "wander" 0.6 1.4 "$(sed -nE 's/^oscillator .* and ([0-9.]+) ppb of wande
 between "kp" 0.17 0.20 "$(key phaseLockGain tuned.json)"
 between "error" 23 25 "$(sed -nE 's/^error, RMS .* ([0-9.]+) ns$/\1/p' out)"
 between "theory" 23.7 23.9 "$(sed -nE 's/^theory: .* ([0-9.]+) ns$/\1/p' out)"
+expect "a start with it alone" 1 "$(grep -cE '^starts that fail, alone +0 of 30 +[0-9]+ of 30$' out)"
 expect "all keys are taken" 11 "$("${host[@]}" check tuned.json | grep -c '":')"
 "${host[@]}" tune --noise 50ns --wander 1ppb --interval 1s > other.json 2> report
 expect "to the standard output" "" "$(cmp tuned.json other.json; diff <(sed s/DOCUMENT/tuned.json/ report) out)"
@@ -64,6 +65,8 @@ done << 'END'
 1|no document can have kp 60 and ki 50 per second|--from-pi 60,50
 1|cannot read none|none
 END
+expect "a model of years" 1 "$("${host[@]}" tune --noise 1s --wander 0 --interval 24h 2>&1 |
+    grep -c 'would average over 568 pairs, 568 days')"
 head -n 40 trace.csv > short.csv
 expect "too short" 1 "$("${host[@]}" tune short.csv 2>&1 | grep -c 'measurements, too few to tell')"
 

@@ -3,20 +3,24 @@
 #include "design/tLoopGains.h"
 #include "maths/patternSearch.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <stdexcept>
 
 namespace dravikHost {
 
 namespace {
 
-// What rounding adds: timestamps to whole nanoseconds, and orders to parts per billion, from which
+// What rounding adds: timestamps to their steps, and orders to parts per billion, from which
 // the law starts again, so that their errors add up as a walk of the frequency does.
 tNoiseModel withRounding(const tNoiseModel& model)
 {
     tNoiseModel sum = model;
-    sum.noiseNs = std::hypot(model.noiseNs, 1 / std::sqrt(6.0));
+    sum.noiseNs =
+        std::hypot(model.noiseNs, static_cast<double>(model.granularityNs) / std::sqrt(6.0));
     sum.wanderPpb = std::hypot(model.wanderPpb, 1 / std::sqrt(12.0 * model.interval()));
     return sum;
 }
@@ -56,10 +60,29 @@ tServoParameters parametersAt(const std::vector<double>& place, const tNoiseMode
     return parameters;
 }
 
+// Coarse stamps tell small errors by the share of pairs that flip, as a much larger gain would: the
+// best gains may lie far below those of theory.
+std::vector<double> bestOf(const std::function<double(const std::vector<double>&)>& cost,
+                           const std::vector<double>& theory)
+{
+    std::vector<double> best = theory;
+    double least = cost(best);
+    for (const auto& [kp, ki] : {std::pair(-1.0, 0.0), {-1.0, -2.0}, {-2.0, -1.0}, {-2.0, -4.0}}) {
+        const std::vector<double> place = {theory[0] + kp, theory[1] + ki, theory[2]};
+        const double value = cost(place);
+        if (!(value < least)) continue;
+        least = value;
+        best = place;
+    }
+    return best;
+}
+
 // From the gains of theory to the best ones with all that theory leaves out: rounding and filter.
 tServoParameters refined(const tServoLibrary& library, const tNoiseModel& model,
-                         const tLoopGains& gains, const tNoiseModel& seen)
+                         const tLoopGains& gains, const tNoiseModel& seen,
+                         const tDesignProgress& progress)
 {
+    int trials = 0;
     std::vector<double> place = {std::log(gains.kp), std::log(gains.ki), startingLimit(model)};
     const tTrialOptions trial = trialFor(gains, model);
     const auto cost = [&](const std::vector<double>& at) {
@@ -67,8 +90,10 @@ tServoParameters refined(const tServoLibrary& library, const tNoiseModel& model,
         if (!gainsAt(at).fit()) return std::numeric_limits<double>::infinity();
         const auto document = parametersAt(at, seen).documentText();
         const tTrialResult result = runTrial(library, document, model, trial);
+        progress(++trials);
         return result.rmsNs + kWeightOfTail * result.tailNs;
     };
+    if (model.granularityNs > 1) place = bestOf(cost, place);
     patternSearch(cost, place, {0.2, 0.4, 0.5}, 2);
     return parametersAt(place, seen);
 }
@@ -79,6 +104,26 @@ double takeUp(const tLoopGains& gains, const tNoiseModel& model, double measured
 {
     const double frequency = 3 * std::sqrt(2.0) * secondsOf(model.noiseNs) / measuredOver;
     return frequency / 2 / std::sqrt(gains.ki / model.interval());
+}
+
+// A model far from any clock would be simulated for minutes, for a loop that nobody can use.
+void requirePlausible(const tKalmanDesign& kalman, const tNoiseModel& model)
+{
+    constexpr double kMostPairs = 1e5;
+    constexpr double kMostSeconds = 30 * 86400;
+    constexpr double kMostErrorNs = 10e9; // the highest threshold
+    const double pairs = 4 / (kalman.gains.kp * model.interval());
+    const double seconds = pairs * model.interval();
+    if (kalman.rmsNs > kMostErrorNs)
+        throw std::runtime_error(
+            fmt::format("no document holds a clock with such a model: even the "
+                        "best loop leaves an error of {} RMS",
+                        durationText(kalman.rmsNs)));
+    if (!(pairs < kMostPairs) || seconds > kMostSeconds)
+        throw std::runtime_error(
+            fmt::format("the noise is too large for such an oscillator and interval: the best loop "
+                        "would average over {:.3g} pairs, {:.3g} days",
+                        pairs, seconds / 86400));
 }
 
 } // namespace
@@ -131,14 +176,21 @@ void setSpikeFilter(tServoParameters& parameters, const tNoiseModel& model)
     setFilter(parameters, model, startingLimit(model));
 }
 
-tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model)
+tKalmanDesign theoreticalDesign(const tNoiseModel& model)
 {
-    const tKalmanDesign kalman = steadyKalman(withRounding(model));
-    tNoiseModel seen = model; // what the filter and the threshold see of it
-    seen.noiseNs = std::hypot(model.noiseNs, kalman.rmsNs);
+    return steadyKalman(withRounding(model));
+}
+
+tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model,
+                        const tDesignProgress& progress)
+{
+    const tKalmanDesign kalman = theoreticalDesign(model);
+    requirePlausible(kalman, model);
+    tNoiseModel seen = withRounding(model); // what the filter and the threshold see of it
+    seen.noiseNs = std::hypot(seen.noiseNs, kalman.rmsNs);
     tDesign design;
     design.theoreticalRmsNs = kalman.rmsNs;
-    design.quiet = refined(library, model, kalman.gains, seen);
+    design.quiet = refined(library, model, kalman.gains, seen, progress);
     addQuick(design, model);
     return design;
 }

@@ -1,9 +1,11 @@
 #pragma once
 
+#include "design/tLoopGains.h"
 #include "design/tNoiseModel.h"
 #include "design/tTrial.h"
 #include "servo/tServoParameters.h"
 
+#include <functional>
 #include <vector>
 
 namespace dravikHost {
@@ -25,8 +27,16 @@ struct tDesign {
     int64_t measureOverNs = 0;
 };
 
-// Throws std::runtime_error if no document can have such gains.
-tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model);
+// Is told how many simulations have been run.
+using tDesignProgress = std::function<void(int trials)>;
+
+// Throws std::runtime_error if no document can have such gains, or the model is absurd.
+tDesign designDocuments(
+    const tServoLibrary& library, const tNoiseModel& model,
+    const tDesignProgress& progress = [](int) {});
+
+// What theory has for the model, with rounding.
+tKalmanDesign theoreticalDesign(const tNoiseModel& model);
 
 // Adds the quick documents, if the quiet one of the design needs any.
 void addQuick(tDesign& design, const tNoiseModel& model);

@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <numeric>
 #include <stdexcept>
 
 namespace dravikHost {
@@ -91,10 +92,12 @@ public:
             filter.update(innovation, 1);
         }
         variance = sum / count;
+        counted = count;
         return std::log(variance) + logs / count;
     }
 
     double varianceNs2() const { return variance; }
+    double measurements() const { return counted; }
     const std::vector<double>& outliers() const { return outliersNs; }
 
 private:
@@ -123,41 +126,121 @@ private:
     tKalmanFilter filter; // in multiples of the measurements' variance
     int missed = 0;
     double variance = 0;
+    double counted = 0;
     std::vector<double> outliersNs;
 };
 
-// A coarse grid finds the right hill, the search its top. The wander is taken against all that is
-// white, or the hill would be a ridge where the oscillator's noise is larger than the
+// The ratios by the logarithms of the white noise and the wander. The wander is taken against all
+// that is white, or the hill would be a ridge where the oscillator's noise is larger than the
 // measurements'.
-tRatios mostLikely(tLikelihood& likelihood, double interval)
+class tHill
 {
-    const auto ratios = [interval](const std::vector<double>& place) {
+public:
+    tHill(tLikelihood& likelihood, double interval) : likelihood(likelihood), interval(interval) {}
+
+    tRatios ratios(const std::vector<double>& place) const
+    {
         const double frequencyNoise = std::exp(place[0]);
         const double wander = std::exp(place[1]) * std::hypot(1, frequencyNoise);
-        return tRatios{frequencyNoise / std::sqrt(interval),
-                       wander / (interval * std::sqrt(interval))};
-    };
-    const auto cost = [&](const std::vector<double>& place) { return likelihood(ratios(place)); };
-    std::vector<double> best = {-8, -8};
-    double least = cost(best);
-    for (const double white : {-12, -8, -4, 0, 4}) {
-        for (const double walk : {-14, -12, -10, -8, -6, -4, -2, 0, 2}) {
-            const double value = cost({white, walk});
-            if (!(value < least)) continue;
-            least = value;
-            best = {white, walk};
-        }
+        return {frequencyNoise / std::sqrt(interval), wander / (interval * std::sqrt(interval))};
     }
-    patternSearch(cost, best, {1, 1}, 5);
-    cost(best); // leaves variance and outliers of the best
-    return ratios(best);
+
+    double cost(const std::vector<double>& place) const { return likelihood(ratios(place)); }
+
+    // A coarse grid finds the right hill, the search its top.
+    std::vector<double> top() const
+    {
+        std::vector<double> best = {-8, -8};
+        double least = cost(best);
+        for (const double white : {-12, -8, -4, 0, 4}) {
+            for (const double walk : {-14, -12, -10, -8, -6, -4, -2, 0, 2}) {
+                const double value = cost({white, walk});
+                if (!(value < least)) continue;
+                least = value;
+                best = {white, walk};
+            }
+        }
+        patternSearch([this](const auto& place) { return cost(place); }, best, {1, 1}, 5);
+        return best;
+    }
+
+    // The wander where the likelihood has fallen as far as one time in twenty allows, towards more
+    // or less of it; 0 if it never does.
+    double wanderAtFoot(const std::vector<double>& top, double direction) const
+    {
+        constexpr double kFall = 3.84; // of twice the logarithm: chi-squared, one degree of freedom
+        constexpr double kStep = 0.1;
+        constexpr double kLeastWalk = -14; // as the grid has it
+        constexpr double kMostWalk = 4;
+        const double most = cost(top) + kFall / likelihood.measurements();
+        std::vector<double> place = top;
+        place[1] = std::max(place[1], kLeastWalk);
+        for (double step = kStep;; step *= 1 + kStep) {
+            place[1] += direction * step;
+            if (place[1] < kLeastWalk) return 0;
+            const auto along = [&](const std::vector<double>& white) {
+                return cost({white[0], place[1]});
+            };
+            std::vector<double> white = {place[0]};
+            const double least = patternSearch(along, white, {1}, 2);
+            place[0] = white[0];
+            if (!(least < most) || place[1] > kMostWalk) break;
+        }
+        cost(place);
+        return ratios(place).wander * std::sqrt(likelihood.varianceNs2());
+    }
+
+private:
+    tLikelihood& likelihood;
+    double interval;
+};
+
+double secondsBetween(const std::vector<tFreeRunningError>& errors, double median)
+{
+    double sum = 0;
+    double count = 0;
+    for (const tFreeRunningError& error : errors) {
+        if (std::fabs(error.seconds - median) > median / 2) continue; // a gap
+        sum += error.seconds;
+        ++count;
+    }
+    return sum / count;
+}
+
+// What all errors are multiples of.
+int64_t stepOf(const tRecording& recording)
+{
+    constexpr double kExact = 1e-3; // ns
+    int64_t step = 0;
+    for (const tRecordedPair& pair : recording.pairs) {
+        const double whole = std::round(pair.errorNs);
+        if (std::fabs(pair.errorNs - whole) > kExact) return 1;
+        step = std::gcd(step, std::llabs(static_cast<int64_t>(whole)));
+        if (step == 1) return 1;
+    }
+    return std::max<int64_t>(step, 1);
+}
+
+// In steps as large as the noise, errors show little else than the steps: two stamps of an edge
+// each flip between two values. Noise that can still not be told is taken as small.
+void takeStepsOut(tNoiseEstimate& estimate)
+{
+    constexpr double kOfSteps = 0.65;
+    constexpr double kTaken = 0.05;
+    const auto step = static_cast<double>(estimate.granularityNs);
+    if (estimate.granularityNs == 1) return;
+    estimate.noiseTold = estimate.noiseTold && estimate.noiseNs > kOfSteps * step;
+    estimate.noiseNs = estimate.noiseTold
+                           ? std::sqrt(estimate.noiseNs * estimate.noiseNs - step * step / 6)
+                           : kTaken * step;
 }
 
 } // namespace
 
-tNoiseModel estimateNoise(const tRecording& recording)
+tNoiseEstimate estimateNoise(const tRecording& recording)
 {
-    constexpr double kGate = 2.5; // of what is not foreseen: six deviations of mere white noise
+    constexpr double kGate = 2.5;  // of what is not foreseen: six deviations of mere white noise
+    constexpr double kLost = 0.02; // of the other noise
     constexpr double kLeastOutliers = 1e-3; // fewer are the tail of the noise
     requireCorrections(recording);
     if (recording.pairs.size() < kLeastPairs) {
@@ -169,14 +252,28 @@ tNoiseModel estimateNoise(const tRecording& recording)
     std::transform(errors.begin(), errors.end(), intervals.begin(),
                    [](const tFreeRunningError& error) { return error.seconds; });
     const double interval = median(intervals);
-    tLikelihood likelihood(errors, kGate * std::max(unforeseenNs(errors), 1.0));
-    const tRatios ratios = mostLikely(likelihood, interval);
+    const int64_t stepNs = stepOf(recording);
+    tLikelihood likelihood(errors,
+                           kGate * std::max(unforeseenNs(errors), static_cast<double>(stepNs)));
+    const tHill hill(likelihood, interval);
+    const std::vector<double> top = hill.top();
+    const tRatios ratios = hill.ratios(top);
 
-    tNoiseModel model;
-    model.intervalNs = std::llround(nsOf(interval));
+    const double mostWander = hill.wanderAtFoot(top, +1);
+    const double leastWander = hill.wanderAtFoot(top, -1);
+    tNoiseEstimate model;
+    hill.cost(top); // leaves variance and outliers of the best
+    model.intervalNs = std::llround(nsOf(secondsBetween(errors, interval)));
     model.noiseNs = std::sqrt(likelihood.varianceNs2());
     model.frequencyNoisePpb = ratios.frequencyNoise * model.noiseNs;
     model.wanderPpb = ratios.wander * model.noiseNs;
+    model.mostWanderPpb = std::max(mostWander, model.wanderPpb);
+    model.leastWanderPpb = std::min(leastWander, model.wanderPpb);
+    const double whiteNs = model.frequencyNoisePpb * std::sqrt(interval);
+    model.noiseTold = model.noiseNs > kLost * std::max(whiteNs, 1.0);
+    model.frequencyNoiseTold = whiteNs > kLost * model.noiseNs;
+    model.granularityNs = stepNs;
+    takeStepsOut(model);
     const auto outliers = static_cast<double>(likelihood.outliers().size());
     const double rate = outliers / static_cast<double>(errors.size());
     if (rate < kLeastOutliers) return model;

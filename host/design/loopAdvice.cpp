@@ -140,7 +140,7 @@ std::string remedyText(const tServoParameters& parameters, const tLoopForecast& 
     constexpr double kHardlyMore = 1.1;
     if (forecast.measureOverNs)
         return fmt::format(
-            "! the frequency is measured over one pair, through the noise, and {:.2g} "
+            "! the frequency is measured over one pair, through the noise, and {:.1f} "
             "% of starts fail: use --measure-over {}\n",
             forecast.failing * 100, optionText(*forecast.measureOverNs));
     if (forecast.withoutFilter)

@@ -80,16 +80,17 @@ double roundedErrorNs(const tServoLibrary& library, tServoParameters parameters,
         .rmsNs;
 }
 
-// The frequency, as two measurements tell it, is wrong by their noise over the time between. The
-// least time after which that does not lead as far as the threshold; none if the noise alone does.
+// The frequency, as two measurements tell it, is wrong by their noise over the time between. About
+// the least time after which that does not lead as far as the threshold.
 std::optional<int64_t> timeToMeasure(const tServoParameters& parameters, const tLoopAnalysis& loop,
                                      const tNoiseModel& model, double seenNs)
 {
     constexpr double kDayNs = 86400e9; // the longest that --measure-over takes
+    constexpr double kLeastShare = 0.3;
     const double roomNs = nsOf(parameters.snapTimeThreshold) / kSafe;
-    if (roomNs <= seenNs) return std::nullopt;
-    const double leftNs = std::sqrt(roomNs * roomNs - seenNs * seenNs);
-    const double seconds = kRootTwo * model.noiseNs * loop.takeUp / leftNs;
+    const double leftNs = std::sqrt(std::max(roomNs * roomNs - seenNs * seenNs, 0.0));
+    const double seconds =
+        kRootTwo * model.noiseNs * loop.takeUp / std::max(leftNs, kLeastShare * roomNs);
     const double pairs = std::max(std::ceil(seconds / model.interval()), 2.0);
     if (pairs * nsOf(model.interval()) > kDayNs) return std::nullopt;
     return static_cast<int64_t>(pairs) * model.intervalNs;

@@ -15,6 +15,8 @@ struct tNoiseModel {
     double outlierRate = 0;       // share of measurements that are far off
     double outlierSizeNs = 0;     // by which they are, with either sign
 
+    int64_t granularityNs = 1; // timestamps are cut down to its multiples
+
     double interval() const { return secondsOf(intervalNs); } // s
 };
 

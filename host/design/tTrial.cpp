@@ -27,6 +27,7 @@ tMeasurementModel measurementOf(const tNoiseModel& model)
     measurement.noiseNs = model.noiseNs;
     measurement.outlierRate = model.outlierRate;
     measurement.outlierSizeNs = model.outlierSizeNs;
+    measurement.granularityNs = static_cast<uint64_t>(model.granularityNs);
     return measurement;
 }
 
@@ -60,8 +61,8 @@ public:
         const double seenNs = noisy ? measurementErrorNs(measurement, noise) : 0;
         elapsedNs += intervalNs;
         if (spacing.holdsBack(elapsedNs)) return errorNs;
-        host.adjustTime(trueNs + static_cast<uint64_t>(static_cast<int64_t>(std::floor(seenNs))),
-                        clock.timeNs());
+        const auto errorSeenNs = static_cast<int64_t>(std::floor(seenNs));
+        host.adjustTime(cut(trueNs + static_cast<uint64_t>(errorSeenNs)), cut(clock.timeNs()));
         const tLockEvent event = observer.observe(host.calls());
         spacing.given(elapsedNs, event, observer.measuring());
         lost += event == kLockLost ? 1 : 0;
@@ -77,6 +78,8 @@ public:
 
 private:
     static constexpr double kFrequencyPpb = 12'000; // and a fraction, of a clock to be measured
+
+    uint64_t cut(uint64_t ns) const { return noisy ? ns - ns % measurement.granularityNs : ns; }
 
     int64_t intervalNs;
     tMeasurementModel measurement;

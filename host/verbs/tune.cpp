@@ -8,10 +8,12 @@
 #include "text/files.h"
 #include "text/words.h"
 #include "verbs/shared.h"
+#include "watchers/tConsole.h"
 
 #include <fmt/format.h>
 
 #include <array>
+#include <chrono>
 #include <filesystem>
 #include <memory>
 #include <stdexcept>
@@ -82,10 +84,10 @@ void requireEnough(const tTune& options)
         "A trace, or --noise, --wander and --interval, or --from-pi is required");
 }
 
-tNoiseModel noiseModel(const tTune& options)
+tNoiseEstimate noiseModel(const tTune& options)
 {
     constexpr double kUsualFrequencyNoisePpb = 0.1;
-    tNoiseModel model;
+    tNoiseEstimate model;
     model.frequencyNoisePpb = kUsualFrequencyNoisePpb;
     if (!options.trace.file.empty()) model = estimateNoise(readTrace(options.trace));
     const tGivenNoise& given = options.given;
@@ -98,21 +100,56 @@ tNoiseModel noiseModel(const tTune& options)
     replace(model.wanderPpb, given.wanderPpb);
     replace(model.outlierRate, given.outlierRate);
     replace(model.outlierSizeNs, given.outlierSizeNs);
+    model.noiseTold = model.noiseTold || given.noiseNs;
+    model.frequencyNoiseTold = model.frequencyNoiseTold || given.frequencyNoisePpb;
+    if (given.wanderPpb) model.leastWanderPpb = model.mostWanderPpb = *given.wanderPpb;
     return model;
 }
 
-std::string noiseText(const tNoiseModel& model)
+std::string noiseText(const tNoiseEstimate& model)
 {
     const std::string outliers =
         model.outlierRate > 0 ? fmt::format(", {:.3g} % of outliers of {}", model.outlierRate * 100,
                                             durationText(model.outlierSizeNs))
                               : "";
-    return fmt::format(
-        "measurements of {} every {}{};\n"
-        "oscillator with {:.3g} ppb of white noise at 1 s and {:.3g} ppb of wander per "
-        "root second\n",
-        durationText(model.noiseNs), durationText(nsOf(model.interval())), outliers,
-        model.frequencyNoisePpb, model.wanderPpb);
+    const std::string steps =
+        model.granularityNs > 1 ? fmt::format(" in steps of {}", durationText(model.granularityNs))
+                                : "";
+    const std::string noise =
+        model.noiseTold ? "of " + durationText(model.noiseNs)
+        : model.granularityNs > 1
+            ? "whose noise the steps hide, taken as " + durationText(model.noiseNs)
+            : "whose noise cannot be told from the oscillator's";
+    const std::string white =
+        model.frequencyNoiseTold
+            ? fmt::format("{:.3g} ppb of white noise at 1 s", model.frequencyNoisePpb)
+            : "white noise that cannot be told from the measurements'";
+    const std::string wander = model.mostWanderPpb > 0 && model.leastWanderPpb == 0
+                                   ? fmt::format("at most {:.3g}", model.mostWanderPpb)
+                                   : fmt::format("{:.3g}", model.wanderPpb);
+    return fmt::format("measurements{} {} every {}{};\n"
+                       "oscillator with {} and {} ppb of wander per root second\n",
+                       steps, noise, durationText(model.intervalNs), outliers, white, wander);
+}
+
+// A wander that the trace hardly tells, if the error depends on it.
+std::string rangeText(const tNoiseEstimate& model)
+{
+    constexpr double kMatters = 1.5;
+    const auto errorOf = [&](double wanderPpb) {
+        tNoiseModel other = model;
+        other.wanderPpb = wanderPpb;
+        return theoreticalDesign(other).rmsNs;
+    };
+    const double leastNs = errorOf(model.leastWanderPpb);
+    const double mostNs = errorOf(model.mostWanderPpb);
+    if (mostNs < kMatters * leastNs) return "";
+    return fmt::format("! the trace is too short to tell the wander: {:.2g} to {:.2g} ppb per root "
+                       "second are possible;\n"
+                       "! by theory that leaves an error of {} to {} RMS; take a longer trace or "
+                       "give --wander\n",
+                       model.leastWanderPpb, model.mostWanderPpb, durationText(leastNs),
+                       durationText(mostNs));
 }
 
 // Two documents side by side, as simulations through the plug-in show them.
@@ -124,8 +161,11 @@ public:
         : interval(model.interval()), columns{builtIn, tuned}
     {
         const tTrialOptions trial = trialFor(tLoopGains::of(tuned), model);
-        for (size_t i = 0; i < columns.size(); ++i)
+        const tStartOptions alone = {2 * trial.settlingPairs, kStarts};
+        for (size_t i = 0; i < columns.size(); ++i) {
             results[i] = runTrial(library, columns[i].documentText(), model, trial);
+            starts[i] = runStarts(library, columns[i].documentText(), model, alone);
+        }
     }
 
     std::string text() const
@@ -137,6 +177,8 @@ public:
                row("error, peak", [](const tTrialResult& r) { return durationText(r.peakNs); }) +
                row("locks lost per hour",
                    [](const tTrialResult& r) { return fmt::format("{:.3g}", r.lostPerHour); }) +
+               fmt::format("{:<24}{:>12}{:>12}\n", "starts that fail, alone", startsText(starts[0]),
+                           startsText(starts[1])) +
                rowOf("kp, 1/s", [&](auto& p) { return fmt::format("{:.4g}", gains(p).kp); }) +
                rowOf("ki, 1/s per pair",
                      [&](auto& p) { return fmt::format("{:.4g}", gains(p).ki); }) +
@@ -155,6 +197,13 @@ public:
     }
 
 private:
+    static constexpr uint64_t kStarts = 30;
+
+    static std::string startsText(const tStartResult& result)
+    {
+        return fmt::format("{} of {}", result.failed, kStarts);
+    }
+
     template <typename Text> std::string row(const char* title, Text text) const
     {
         return fmt::format("{:<24}{:>12}{:>12}\n", title, text(results[0]), text(results[1]));
@@ -167,6 +216,7 @@ private:
     double interval;
     std::array<tServoParameters, 2> columns;
     std::array<tTrialResult, 2> results;
+    std::array<tStartResult, 2> starts;
 };
 
 // quick.json, quick2.json, quick3.json
@@ -218,6 +268,25 @@ tServoParameters convertedDocument(const tTune& options, const tServoParameters&
     return parameters;
 }
 
+// For the person who waits at a terminal.
+class tProgressLine
+{
+public:
+    explicit tProgressLine(tConsole& console) : console(console) {} // borrowed
+
+    void operator()(int trials) const
+    {
+        using namespace std::chrono;
+        const auto since = duration_cast<nanoseconds>(steady_clock::now() - started).count();
+        console.progress(since,
+                         [trials] { return fmt::format("designing: {} documents tried", trials); });
+    }
+
+private:
+    tConsole& console;
+    std::chrono::steady_clock::time_point started = std::chrono::steady_clock::now();
+};
+
 void run(const tTune& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
@@ -228,16 +297,16 @@ void run(const tTune& options)
         writeDocument(options.output, convertedDocument(options, builtIn));
         return;
     }
-    const tNoiseModel model = noiseModel(options);
-    const tDesign design = designDocuments(library, model);
+    const tNoiseEstimate model = noiseModel(options);
     const bool toStdout = options.output.empty() || options.output == "-";
-    tOutputFile report = toStdout ? tOutputFile::standardError() : tOutputFile("-");
-    report.write(noiseText(model));
-    report.write(tComparison(library, model, builtIn, design.quiet).text());
-    report.write(
-        fmt::format("{:<24}{:>24}\n", "theory: error, RMS", durationText(design.theoreticalRmsNs)));
-    report.write(quickText(design, options));
-    report.flush();
+    tConsole console(toStdout);
+    console.print(noiseText(model));
+    const tDesign design = designDocuments(library, model, tProgressLine(console));
+    const std::string comparison = tComparison(library, model, builtIn, design.quiet).text();
+    console.print(
+        comparison +
+        fmt::format("{:<24}{:>24}\n", "theory: error, RMS", durationText(design.theoreticalRmsNs)) +
+        rangeText(model) + quickText(design, options));
     writeDocument(options.output, design.quiet);
     if (options.quickOutput.empty()) return;
     for (size_t i = 0; i < design.quick.size(); ++i)

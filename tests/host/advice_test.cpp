@@ -1,12 +1,16 @@
 // What is foretold of a document: against closed forms, and against what simulations showed.
 
+#include "design/designDocuments.h"
+#include "design/estimateNoise.h"
 #include "design/loopAdvice.h"
 #include "design/tLoopAnalysis.h"
 #include "design/tLoopForecast.h"
+#include "maths/tNoise.h"
 
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <stdexcept>
 
 using namespace dravikHost;
 
@@ -129,7 +133,6 @@ TEST(LoopAdvice, foretellsWhatSimulationsShow)
     const tAdviceRow kRows[] = {
         {"! orders in whole ppb, from which the law starts again, raise its error to 32", //
          law(0.05, 1.02), 1, 5},
-        {"! the frequency is measured over one pair, through the noise, and 4", {}, 0.0625, 150},
         {"! these locks are lost by the spike filter", tight, 1, 50},
     };
     for (const tAdviceRow& row : kRows)
@@ -155,8 +158,83 @@ TEST(LoopForecast, comesNearToRunsOfAnHour)
         EXPECT_GE(found.lostPerHour, row.least) << row.name;
         EXPECT_LE(found.lostPerHour, row.most) << row.name;
     }
+    const auto starts = forecastLoop(library(), {}, 0.0625, 150);
+    EXPECT_NEAR(0.45, starts.failing, 0.1);
+    EXPECT_EQ(562'500'000, starts.measureOverNs);
+    EXPECT_NEAR(4.7e-6, starts.betterThreshold, 1e-9);
     const auto never = with(&tServoParameters::frequencyLockGain, 1.001);
     EXPECT_FALSE(forecastLoop(library(), never, 1, 50).locks);
+}
+
+// Errors of a clock that walks in frequency, in steps.
+tRecording walking(int pairs, double noiseNs, double wanderPpb, double stepNs)
+{
+    tNoise noise(3);
+    tRecording recording{"trace", "", {}, 0, {}};
+    double phaseNs = 0;
+    double frequencyPpb = 0;
+    for (int i = 0; i < pairs; ++i) {
+        tRecordedPair pair{};
+        pair.elapsedNs = i * 1'000'000'000LL + i % 3 * 60'000 - 20'000 * i;
+        pair.errorNs = std::floor((phaseNs + noiseNs * noise.normal()) / stepNs) * stepNs;
+        pair.orderedPpb = 0;
+        recording.pairs.push_back(pair);
+        phaseNs += frequencyPpb;
+        frequencyPpb += wanderPpb * noise.normal();
+    }
+    return recording;
+}
+
+TEST(NoiseEstimate, saysWhatItCannotTell)
+{
+    const struct {
+        const char* name;
+        tRecording recording;
+        bool noiseTold, wanderTold;
+        double noiseNs, within;
+        double widest; // range of the wander, most over least
+        int64_t stepNs;
+    } kRows[] = {
+        {"long", walking(5000, 50, 1, 1), true, true, 50, 2, 1.6, 1},
+        {"short", walking(100, 50, 1, 1), true, false, 50, 15, 0, 1},
+        {"no wander", walking(100, 50, 0, 1), true, false, 50, 15, 0, 1},
+        {"small steps", walking(5000, 50, 1, 8), true, true, 50, 2, 1.6, 8},
+        {"steps", walking(5000, 20, 0.01, 1000), false, false, 50, 1e-9, 0, 1000},
+        {"no noise", walking(1000, 0, 5, 1), false, true, 0, 1, 3, 1},
+    };
+    for (const auto& row : kRows) {
+        SCOPED_TRACE(row.name);
+        const tNoiseEstimate found = estimateNoise(row.recording);
+        EXPECT_EQ(row.noiseTold, found.noiseTold);
+        EXPECT_EQ(row.wanderTold, found.leastWanderPpb > 0);
+        EXPECT_NEAR(row.noiseNs, found.noiseNs, row.within);
+        EXPECT_EQ(row.stepNs, found.granularityNs);
+        EXPECT_LE(found.leastWanderPpb, found.wanderPpb);
+        EXPECT_GE(found.mostWanderPpb, found.wanderPpb);
+        EXPECT_LE(found.mostWanderPpb,
+                  row.wanderTold ? row.widest * found.leastWanderPpb : 1e3 * found.noiseNs);
+        EXPECT_NEAR(999'980'000, found.intervalNs, 1000); // the mean, not the median
+    }
+}
+
+TEST(Design, refusesWhatNoClockIsLike)
+{
+    for (const tNoiseModel& model :
+         {tNoiseModel{86'400'000'000'000, 1e9, 0.1, 0}, tNoiseModel{1'000'000, 1e9, 0.1, 0},
+          tNoiseModel{86'400'000'000'000, 1, 0.1, 1e6}})
+        EXPECT_THROW(designDocuments(library(), model), std::runtime_error);
+}
+
+// The best pair of gains on a grid left 17 ns; that of theory, 36 ns.
+TEST(Design, makesTheBestOfCoarseStamps)
+{
+    tNoiseModel model{1'000'000'000, 50, 0.1, 1};
+    model.granularityNs = 1000;
+    int trials = 0;
+    const tDesign design = designDocuments(library(), model, [&](int count) { trials = count; });
+    const tTrialOptions trial = trialFor(tLoopGains::of(design.quiet), model);
+    EXPECT_LT(runTrial(library(), design.quiet.documentText(), model, trial).rmsNs, 17);
+    EXPECT_GT(trials, 10);
 }
 
 } // namespace
