@@ -67,6 +67,10 @@ done << 'END'
 END
 expect "a model of years" 1 "$("${host[@]}" tune --noise 1s --wander 0 --interval 24h 2>&1 |
     grep -c 'would average over 568 pairs, 568 days')"
+awk -F, 'BEGIN { print "reference_ns,clock_ns" }
+    $1 == "pair" { printf "%.0f,%.0f\n", n * 999980000, n * 999980000 + $5; n++ }' trace.csv > fast.csv
+expect "the mean spacing, in seconds" 1 "$("${host[@]}" tune fast.csv --free-running 2>&1 |
+    grep -cE '^measurements of [0-9.]+ ns every 1 s;')"
 head -n 40 trace.csv > short.csv
 expect "too short" 1 "$("${host[@]}" tune short.csv 2>&1 | grep -c 'measurements, too few to tell')"
 

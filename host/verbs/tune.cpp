@@ -106,6 +106,13 @@ tNoiseEstimate noiseModel(const tTune& options)
     return model;
 }
 
+// Four digits of a little less than a second are a second.
+std::string spacingText(int64_t ns)
+{
+    const bool nearlySecond = ns < kSecondNs && ns >= kSecondNs / 10'000 * 9'995;
+    return nearlySecond ? "1 s" : durationText(ns);
+}
+
 std::string noiseText(const tNoiseEstimate& model)
 {
     const std::string outliers =
@@ -129,7 +136,7 @@ std::string noiseText(const tNoiseEstimate& model)
                                    : fmt::format("{:.3g}", model.wanderPpb);
     return fmt::format("measurements{} {} every {}{};\n"
                        "oscillator with {} and {} ppb of wander per root second\n",
-                       steps, noise, durationText(model.intervalNs), outliers, white, wander);
+                       steps, noise, spacingText(model.intervalNs), outliers, white, wander);
 }
 
 // A wander that the trace hardly tells, if the error depends on it.
