@@ -78,13 +78,14 @@ public:
             const double t = errors[i].seconds;
             filter.predict(t, disturbance(ratios.frequencyNoise, ratios.wander, t));
             const double innovation = errors[i].errorNs - filter.phase;
-            if (std::fabs(innovation) > gateNs && i > kSettling) {
+            const bool settled = i > restartedAt + kSettling;
+            if (std::fabs(innovation) > gateNs && settled) {
                 takeOutlier(i, innovation);
                 continue;
             }
             missed = 0;
             const double s = filter.covariance.xx + 1;
-            if (i > kSettling) {
+            if (settled) {
                 sum += innovation * innovation / s;
                 logs += std::log(s);
                 ++count;
@@ -108,6 +109,7 @@ private:
         constexpr double kUnknown = 1e12;
         filter.phase = errors[i].errorNs;
         filter.covariance = {1, 0, kUnknown};
+        restartedAt = i;
     }
 
     // Several in a row are no outliers but a step.
@@ -123,7 +125,8 @@ private:
 
     std::vector<tFreeRunningError> errors;
     double gateNs;
-    tKalmanFilter filter; // in multiples of the measurements' variance
+    tKalmanFilter filter;   // in multiples of the measurements' variance
+    size_t restartedAt = 0; // its frequency is not known for some pairs then
     int missed = 0;
     double variance = 0;
     double counted = 0;
@@ -168,7 +171,6 @@ public:
     // or less of it; 0 if it never does.
     double wanderAtFoot(const std::vector<double>& top, double direction) const
     {
-        constexpr double kFall = 3.84; // of twice the logarithm: chi-squared, one degree of freedom
         constexpr double kStep = 0.1;
         constexpr double kLeastWalk = -14; // as the grid has it
         constexpr double kMostWalk = 4;
@@ -190,7 +192,22 @@ public:
         return ratios(place).wander * std::sqrt(likelihood.varianceNs2());
     }
 
+    // Whether all of it may as well be the oscillator's.
+    bool needsNoise(const std::vector<double>& top) const
+    {
+        constexpr double kAllWhite = 10;
+        const double most = cost(top) + kFall / likelihood.measurements();
+        std::vector<double> walk = {top[1]};
+        const auto along = [this](const std::vector<double>& at) {
+            return cost({kAllWhite, at[0]});
+        };
+        return !(patternSearch(along, walk, {2}, 4) < most);
+    }
+
 private:
+    // Of twice the logarithm, one time in twenty: chi-squared with one degree of freedom.
+    static constexpr double kFall = 3.84;
+
     tLikelihood& likelihood;
     double interval;
 };
@@ -261,6 +278,7 @@ tNoiseEstimate estimateNoise(const tRecording& recording)
 
     const double mostWander = hill.wanderAtFoot(top, +1);
     const double leastWander = hill.wanderAtFoot(top, -1);
+    const bool noisy = hill.needsNoise(top);
     tNoiseEstimate model;
     hill.cost(top); // leaves variance and outliers of the best
     model.intervalNs = std::llround(nsOf(secondsBetween(errors, interval)));
@@ -270,7 +288,7 @@ tNoiseEstimate estimateNoise(const tRecording& recording)
     model.mostWanderPpb = std::max(mostWander, model.wanderPpb);
     model.leastWanderPpb = std::min(leastWander, model.wanderPpb);
     const double whiteNs = model.frequencyNoisePpb * std::sqrt(interval);
-    model.noiseTold = model.noiseNs > kLost * std::max(whiteNs, 1.0);
+    model.noiseTold = noisy && model.noiseNs > kLost * std::max(whiteNs, 1.0);
     model.frequencyNoiseTold = whiteNs > kLost * model.noiseNs;
     model.granularityNs = stepNs;
     takeStepsOut(model);

@@ -167,7 +167,7 @@ TEST(LoopForecast, comesNearToRunsOfAnHour)
 }
 
 // Errors of a clock that walks in frequency, in steps.
-tRecording walking(int pairs, double noiseNs, double wanderPpb, double stepNs)
+tRecording walking(int pairs, double noiseNs, double wanderPpb, double stepNs, double whitePpb = 0)
 {
     tNoise noise(3);
     tRecording recording{"trace", "", {}, 0, {}};
@@ -179,7 +179,7 @@ tRecording walking(int pairs, double noiseNs, double wanderPpb, double stepNs)
         pair.errorNs = std::floor((phaseNs + noiseNs * noise.normal()) / stepNs) * stepNs;
         pair.orderedPpb = 0;
         recording.pairs.push_back(pair);
-        phaseNs += frequencyPpb;
+        phaseNs += frequencyPpb + (whitePpb > 0 ? whitePpb * noise.normal() : 0);
         frequencyPpb += wanderPpb * noise.normal();
     }
     return recording;
@@ -200,7 +200,7 @@ TEST(NoiseEstimate, saysWhatItCannotTell)
         {"no wander", walking(100, 50, 0, 1), true, false, 50, 15, 0, 1},
         {"small steps", walking(5000, 50, 1, 8), true, true, 50, 2, 1.6, 8},
         {"steps", walking(5000, 20, 0.01, 1000), false, false, 50, 1e-9, 0, 1000},
-        {"no noise", walking(1000, 0, 5, 1), false, true, 0, 1, 3, 1},
+        {"no noise", walking(1000, 0, 0, 1, 20), false, false, 0, 3, 0, 1},
     };
     for (const auto& row : kRows) {
         SCOPED_TRACE(row.name);
