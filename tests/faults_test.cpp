@@ -40,43 +40,31 @@ void expect(bool good, const std::string& what)
     std::printf("%s: %s\n", where.c_str(), what.c_str());
 }
 
+#define CALL(name)                                                                                 \
+    decltype(zvckmservo_##name)* const name =                                                      \
+        reinterpret_cast<decltype(zvckmservo_##name)*>(find("zvckmservo_" #name))
 struct tLibrary {
-    explicit tLibrary(const char* path) : handle(dlopen(path, RTLD_NOW | RTLD_LOCAL))
-    {
-        if (handle == nullptr) return;
-        bind(initialize, "zvckmservo_initialize");
-        bind(finalize, "zvckmservo_finalize");
-        bind(isSeeded, "zvckmservo_isSeeded");
-        bind(clearHistory, "zvckmservo_clearHistory");
-        bind(adjustTime, "zvckmservo_adjustTime");
-        bind(getTime, "zvckmservo_getTime");
-        bind(writeConfig, "zvckmservo_writeServoConfigJson");
-        bind(readConfig, "zvckmservo_readServoConfigJson");
-        bind(applyMetaData, "zvckmservo_applyMetaData");
-    }
+    explicit tLibrary(const char* path) : handle(dlopen(path, RTLD_NOW | RTLD_LOCAL)) {}
     ~tLibrary()
     {
         if (handle != nullptr) dlclose(handle);
     }
     tLibrary(const tLibrary&) = delete;
     tLibrary& operator=(const tLibrary&) = delete;
+    void* find(const char* name) const { return handle != nullptr ? dlsym(handle, name) : nullptr; }
 
-    template <class Function> void bind(Function*& function, const char* name)
-    {
-        function = reinterpret_cast<Function*>(dlsym(handle, name));
-    }
-
-    void* handle;
-    decltype(zvckmservo_initialize)* initialize = nullptr;
-    decltype(zvckmservo_finalize)* finalize = nullptr;
-    decltype(zvckmservo_isSeeded)* isSeeded = nullptr;
-    decltype(zvckmservo_clearHistory)* clearHistory = nullptr;
-    decltype(zvckmservo_adjustTime)* adjustTime = nullptr;
-    decltype(zvckmservo_getTime)* getTime = nullptr;
-    decltype(zvckmservo_writeServoConfigJson)* writeConfig = nullptr;
-    decltype(zvckmservo_readServoConfigJson)* readConfig = nullptr;
-    decltype(zvckmservo_applyMetaData)* applyMetaData = nullptr;
+    void* const handle;
+    CALL(initialize);
+    CALL(finalize);
+    CALL(isSeeded);
+    CALL(clearHistory);
+    CALL(adjustTime);
+    CALL(getTime);
+    CALL(writeServoConfigJson);
+    CALL(readServoConfigJson);
+    CALL(applyMetaData);
 };
+#undef CALL
 
 // The one clock, 30 ppm fast and 5 ms ahead at the start of a round.
 uint64_t trueNs;
@@ -137,7 +125,7 @@ struct tHost {
     void initialize() { library.initialize(&table, &status); }
     void write(const char* document)
     {
-        const int result = library.writeConfig(&table, document, &status);
+        const int result = library.writeServoConfigJson(&table, document, &status);
         expect(result == (status.code < 0 ? 1 : 0), "wrong result");
     }
     void pair()
@@ -152,7 +140,7 @@ struct tHost {
     }
     void read(char (&text)[1024])
     {
-        const int result = library.readConfig(&table, text, sizeof text, &status);
+        const int result = library.readServoConfigJson(&table, text, sizeof text, &status);
         expect(result == (status.code < 0 ? 1 : 0), "wrong result");
     }
     std::string config()

@@ -553,7 +553,11 @@ TEST(StandardDirectories, AreNotThereUnderAnotherName)
 
 TEST(DebugLine, KeepsItsFormHoweverLongItsParts)
 {
-    const std::string prefix = "6 [    dravik|                   dravik/tServo|0434] ";
+    const std::string head = "6 [    dravik|";
+    const std::string prefix = head + "                   dravik/tServo|0434] ";
+    const std::string longest(459, 'm');
+    const tDebugLocation servo = {"dravik/tServo", 434, "\n"};
+    const tDebugLocation onAndOn = {"dravik/tServo", 434, " and so on\n"};
     const std::string file32(32, 'f');
     const std::string file33 = "x" + file32;
     struct Row {
@@ -564,31 +568,15 @@ TEST(DebugLine, KeepsItsFormHoweverLongItsParts)
         std::string line; // "": dropped
     };
     const Row rows[] = {
-        {"dropped", 4095, {"dravik/tServo", 434, "\n"}, "m", ""},
-        {"lowest level", 4096, {"dravik/tServo", 434, "\n"}, "m", prefix + "m\n"},
-        {"empty message", 8192, {"dravik/tServo", 434, "\n"}, "", prefix + "\n"},
-        {"longest message",
-         8192,
-         {"dravik/tServo", 434, "\n"},
-         std::string(459, 'm'),
-         prefix + std::string(459, 'm') + "\n"},
-        {"cut",
-         8192,
-         {"dravik/tServo", 434, "\n"},
-         std::string(2000, 'm'),
-         prefix + std::string(459, 'm') + "\n"},
-        {"long end",
-         8192,
-         {"dravik/tServo", 434, " and so on\n"},
-         std::string(459, 'm'),
-         prefix + std::string(449, 'm') + " and so on\n"},
+        {"dropped", 4095, servo, "m", ""},
+        {"lowest level", 4096, servo, "m", prefix + "m\n"},
+        {"empty message", 8192, servo, "", prefix + "\n"},
+        {"longest message", 8192, servo, longest, prefix + longest + "\n"},
+        {"cut", 8192, servo, std::string(2000, 'm'), prefix + longest + "\n"},
+        {"long end", 8192, onAndOn, longest, prefix + std::string(449, 'm') + " and so on\n"},
         {"no end", 8192, {"dravik/tServo", 434, ""}, "m", prefix + "m"},
-        {"file of 32",
-         8192,
-         {file32.c_str(), 12345, ""},
-         "m",
-         "6 [    dravik|" + file32 + "|2345] m"},
-        {"file of 33", 8192, {file33.c_str(), 0, ""}, "m", "6 [    dravik|" + file32 + "|0000] m"},
+        {"file of 32", 8192, {file32.c_str(), 12345, ""}, "m", head + file32 + "|2345] m"},
+        {"file of 33", 8192, {file33.c_str(), 0, ""}, "m", head + file32 + "|0000] m"},
     };
     takeSystemLog();
     for (const Row& row : rows) {

@@ -425,20 +425,11 @@ TEST(StateMachine, AnExhaustedAllocatorLeavesAPairHalfTaken)
 TEST(StateMachine, ASetterTouchesItsOwnParameterOnly)
 {
     tFakeHost host;
-    zvckmDravik::iServoConfig& config = host.open().config();
+    tOpenServo& servo = host.open();
+    servo.config().setSpikeFilterEnabled(true);
     for (const char* const step : {"1 0", "2 0 get set 0", "3 0", "4 100 get set -110",
                                    "5 200 get set -275", "6 900 get set -715"}) {
-        config.setFrequencyLockGain(1.0);
-        config.setPhaseLockGain(0.55);
-        config.setPhaseLockCoefficientA(2.0);
-        config.setPhaseLockCoefficientB(1.0);
-        config.setPhaseLockCoefficientC(1.0);
-        config.setSnapTimeThreshold(1e-6);
-        config.setSpikeFilterEnabled(true);
-        config.setSpikeFilterHistorySize(5);
-        config.setSpikeFilterMaxThreshold(1.0);
-        config.setSpikeFilterMinThreshold(2.5e-8);
-        config.setSpikeFilterGrowthFactor(3.0);
+        servo.writeServoConfigJson(servo.readServoConfigJson()); // each to what it is
         play(host, step);
     }
 }

@@ -64,20 +64,19 @@ static void* bind(void* library, const char* name)
     return function;
 }
 
+#define BIND(name)                                                                                 \
+    __extension__ __typeof__(&zvckmservo_##name) name = bind(library, "zvckmservo_" #name)
+
 static void useAndClose(const char* path)
 {
     void* const library = dlopen(path, RTLD_NOW | RTLD_LOCAL);
     check(library != NULL, "dlopen failed");
-    __extension__ __typeof__(&zvckmservo_initialize) initialize =
-        bind(library, "zvckmservo_initialize");
-    __extension__ __typeof__(&zvckmservo_adjustTime) adjustTime =
-        bind(library, "zvckmservo_adjustTime");
-    __extension__ __typeof__(&zvckmservo_getTime) getTime = bind(library, "zvckmservo_getTime");
-    __extension__ __typeof__(&zvckmservo_writeServoConfigJson) write =
-        bind(library, "zvckmservo_writeServoConfigJson");
-    __extension__ __typeof__(&zvckmservo_applyMetaData) applyMetaData =
-        bind(library, "zvckmservo_applyMetaData");
-    __extension__ __typeof__(&zvckmservo_finalize) finalize = bind(library, "zvckmservo_finalize");
+    BIND(initialize);
+    BIND(adjustTime);
+    BIND(getTime);
+    BIND(writeServoConfigJson);
+    BIND(applyMetaData);
+    BIND(finalize);
 
     zvckmservo_HostTable host =
         hostTable(readClock, stepTime, getFrequency, setFrequency, getLimit, getLimit);
@@ -98,7 +97,7 @@ static void useAndClose(const char* path)
         char document[64];
         (void)snprintf(document, sizeof document, "{\"%s\":%s}", parameter->key,
                        parameter->initialText);
-        check(write(&host, document, &status) == 0, parameter->key);
+        check(writeServoConfigJson(&host, document, &status) == 0, parameter->key);
     }
     applyMetaData(&host, /* looks for a file and logs */
                   "{\"selectedTRInstID\":\"a\",\"TRs\":{\"a\":{\"type\":\"IEEE 1588-2008 BC\"}}}",

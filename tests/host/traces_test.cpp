@@ -1,48 +1,25 @@
+#include "host/stepFixture.h"
 #include "metrics/tMeasured.h"
-#include "text/files.h"
 #include "text/quantity.h"
 #include "traces/moments.h"
 #include "traces/tRecording.h"
 
-#include <gtest/gtest.h>
-
 #include <cmath>
-#include <cstdlib>
 #include <stdexcept>
-#include <unistd.h>
 
 using namespace dravikHost;
 
 namespace {
 
-// A file in a folder of its own that goes with it.
-class tTraceFile
-{
-public:
-    explicit tTraceFile(const std::string& text)
-    {
-        char folder[] = "/tmp/traces_test.XXXXXX";
-        path = std::string(mkdtemp(folder)) + "/trace";
-        writeText(path, text);
-    }
-    ~tTraceFile()
-    {
-        (void)unlink(path.c_str());
-        (void)rmdir(path.substr(0, path.rfind('/')).c_str());
-    }
-
-    std::string path;
-};
-
 tRecording readTraceOf(const std::string& text, const tReadOptions& options = {})
 {
-    return readRecording(tTraceFile(text).path, options);
+    return readRecording(tTestFile("trace", text).path, options);
 }
 
 // Behind the name of the file; "" if it is read.
 std::string refusalOf(const std::string& text, const tReadOptions& options = {})
 {
-    const tTraceFile file(text);
+    const tTestFile file("trace", text);
     try {
         (void)readRecording(file.path, options);
     } catch (const std::runtime_error& error) {

@@ -141,52 +141,19 @@ int pthread_mutex_init(pthread_mutex_t* mutex, const pthread_mutexattr_t* attrib
 // The log of the machine stays clean.
 void syslog(int /*priority*/, const char* /*format*/, ...) {}
 
-FILE* fopen(const char* path, const char* mode)
-{
-    REAL(fopen);
-    return failsNow(faults::kFile, EIO) ? nullptr : real(path, mode);
-}
-
-FILE* fopen64(const char* path, const char* mode)
-{
-    REAL(fopen64);
-    return failsNow(faults::kFile, EIO) ? nullptr : real(path, mode);
-}
-
-size_t fread(void* buffer, size_t size, size_t count, FILE* file)
-{
-    REAL(fread);
-    return failsNow(faults::kFile, EIO) ? 0 : real(buffer, size, count, file);
-}
-
-int fseek(FILE* file, long offset, int origin)
-{
-    REAL(fseek);
-    return failsNow(faults::kFile, EIO) ? -1 : real(file, offset, origin);
-}
-
-long ftell(FILE* file)
-{
-    REAL(ftell);
-    return failsNow(faults::kFile, EIO) ? -1 : real(file);
-}
-
-ssize_t read(int file, void* buffer, size_t size)
-{
-    REAL(read);
-    return failsNow(faults::kFile, EIO) ? -1 : real(file, buffer, size);
-}
-
-int fstat(int file, struct stat* found) noexcept
-{
-    REAL(fstat);
-    return failsNow(faults::kFile, EIO) ? -1 : real(file, found);
-}
-
-int stat64(const char* path, struct stat64* found) noexcept
-{
-    REAL(stat64);
-    return failsNow(faults::kFile, EIO) ? -1 : real(path, found);
-}
+#define FAILING(result, name, parameters, arguments, failure)                                      \
+    result name parameters                                                                         \
+    {                                                                                              \
+        REAL(name);                                                                                \
+        return failsNow(faults::kFile, EIO) ? failure : real arguments;                            \
+    }
+FAILING(FILE*, fopen, (const char* path, const char* mode), (path, mode), nullptr)
+FAILING(FILE*, fopen64, (const char* path, const char* mode), (path, mode), nullptr)
+FAILING(size_t, fread, (void* to, size_t size, size_t n, FILE* file), (to, size, n, file), 0)
+FAILING(int, fseek, (FILE * file, long offset, int origin), (file, offset, origin), -1)
+FAILING(long, ftell, (FILE * file), (file), -1)
+FAILING(ssize_t, read, (int file, void* buffer, size_t size), (file, buffer, size), -1)
+FAILING(int, fstat, (int file, struct stat* found) noexcept, (file, found), -1)
+FAILING(int, stat64, (const char* path, struct stat64* found) noexcept, (path, found), -1)
 
 } // extern "C"
