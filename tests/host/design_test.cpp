@@ -294,17 +294,6 @@ TEST(Trial, showsWhatTheLoopMakesOfNoise)
     EXPECT_THROW(runTrial(library(), "{", noiseOf(1, 50, 0, 0), {1, 1, 1}), std::runtime_error);
 }
 
-TEST(Design, comesNearToTheory)
-{
-    const tDesign design = designDocuments(library(), noiseOf(1, 50, 0.1, 1));
-    EXPECT_NEAR(23.8, design.theoreticalRmsNs, 0.05);
-    EXPECT_NEAR(0.184, tLoopGains::of(design.quiet).kp, 0.015);
-    EXPECT_NEAR(0.0188, tLoopGains::of(design.quiet).ki, 0.003);
-    EXPECT_NEAR(12 * std::hypot(50, 23.8) * 1e-9, design.quiet.snapTimeThreshold, 1e-9);
-    EXPECT_EQ(1, design.quiet.spikeFilterEnabled);
-    EXPECT_EQ(1U, design.quick.size());
-}
-
 struct tAdviceRow {
     const char* line;
     tServoParameters parameters;

@@ -1,8 +1,6 @@
 #include "host/scene.h"
 #include "loop/tLiveRun.h"
 
-#include <functional>
-
 using namespace dravikHost;
 
 namespace {
@@ -22,13 +20,10 @@ struct tLive : iStepObserver {
         options.silenceNs = 10 * kSecondNs;
         options.longHoldoverNs = 20 * kSecondNs;
     }
-    void run(
-        const std::string& script, const std::function<void()>& meanwhile = [] {})
+    void run(const std::string& script)
     {
         scene.script = script.c_str();
-        tLiveRun run(library(), scene.clock, signals, options, *this);
-        meanwhile();
-        run.run("live", scene);
+        tLiveRun(library(), scene.clock, signals, options, *this).run("live", scene);
     }
     void begin(const std::string& scenario, const tHostCalls& calls) override
     {
@@ -96,18 +91,6 @@ TEST(LiveRun, showsHowLongTheSilenceIs)
     EXPECT_EQ(11 * kSecondNs, silences[22].holdoverNs);
     EXPECT_LT(silences[21].errorNs, silences[22].errorNs);
     EXPECT_EQ(10 * kSecondNs, silences[32].holdoverNs); // counted from the pair in between
-}
-
-TEST(LiveRun, keepsItsTuningIfTheNewOneIsRefused)
-{
-    const tTestFile config("config.json", "{}");
-    tLive live;
-    live.options.discipline.tuning.configFile = config.path;
-    live.run("....H.", [&config] { unlink(config.path.c_str()); });
-    EXPECT_NE(std::string::npos,
-              live.text.find("4 locked\n5 documents stay as they are: cannot read " + config.path +
-                             ": No such file or directory\nend: "));
-    EXPECT_TRUE(live.latest.locked);
 }
 
 struct tGuardRow {

@@ -1,13 +1,10 @@
 #include "clocks/tSteeredClock.h"
 #include "host/stepFixture.h"
-#include "servo/configDocument.h"
 #include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
 #include "servo/tServoParameters.h"
 #include "servo/tStatus.h"
-#include "servo/tuning.h"
 #include "support/failureOf.h"
-#include "text/json.h"
 
 #include <map>
 #include <stdexcept>
@@ -137,52 +134,6 @@ TEST_F(ServoHost, passesOnWhyTheClockFailed)
               failureOf([&] { host.adjustTime(4'000'000'000, 5'000'000'000); }));
 }
 
-TEST_F(ServoHost, saysWhyADocumentIsRefused)
-{
-    const struct {
-        const char *document, *why;
-    } kRows[] = {
-        {"{\n\"phaseLockGain\": }", "it is not JSON, as of line 2"},
-        {R"({"PHASELOCKGAIN": 0})",
-         "phaseLockGain is 0, not within 1e-9 to 10; applied before it: nothing"},
-        {R"({"spikeFilterHistorySize": null, "snapTimeThreshold": 1})",
-         "spikeFilterHistorySize is null, which is not a number; applied before it: "
-         "snapTimeThreshold"},
-        {R"({"spikeFilterHistorySize": 1, "spikeFilterEnabled": 1, "phaseLockGain": 1})",
-         "spikeFilterHistorySize is 1, not within 2 to 100 pairs; applied before it: "
-         "phaseLockGain, spikeFilterEnabled"},
-    };
-    tServoHost host(library(), clock);
-    for (const auto& row : kRows)
-        EXPECT_EQ(std::string("refused with -52005: ") + row.why,
-                  failureOf([&] { host.writeConfig(row.document); }));
-    EXPECT_EQ(R"({"file": "elsewhere"})", refusalText("{}", R"({"file": "elsewhere"})"));
-}
-
-TEST(DocumentNotes, nameWhatIsOtherwiseThanItLooks)
-{
-    const struct {
-        const char* document;
-        std::vector<std::string> notes;
-    } kRows[] = {
-        {R"({"phaseLockGain": 1, "spikeFilterEnabled": 1, "SPIKEFILTERHISTORYSIZE": 7} )", {}},
-        {"[1]", {"it is not a JSON object, so it sets nothing"}},
-        {R"({"phaseLokGain": 1, "gain": 2})",
-         {"phaseLokGain is not a key and sets nothing; did you mean phaseLockGain?",
-          "gain is not a key and sets nothing"}},
-        {R"({"phaseLockGain": 1, "PhaseLockGain": 2})",
-         {"phaseLockGain stands there twice, and the first one counts"}},
-        {R"({"spikeFilterHistorySize": 7.9, "spikeFilterEnabled": 2})",
-         {"spikeFilterHistorySize is 7.9 and read as 7",
-          "spikeFilterEnabled is 2 and read as off"}},
-        {R"({"spikeFilterEnabled": 1.5} more)",
-         {"spikeFilterEnabled is 1.5 and read as 1, on",
-          "what stands behind the object sets nothing"}},
-    };
-    for (const auto& row : kRows)
-        EXPECT_EQ(row.notes, documentNotes(row.document)) << row.document;
-}
-
 TEST_F(ServoHost, readsBackItsParameters)
 {
     tServoHost host(library(), clock);
@@ -202,34 +153,6 @@ TEST_F(ServoHost, readsBackItsParameters)
     EXPECT_EQ(-10, withinBounds(zvckmservo_kPhaseLockCoefficientC, -11));
 }
 
-TEST_F(ServoHost, isTunedByFiles)
-{
-    const tTestFile good("good.json", R"({"phaseLockGain": 0.25})");
-    const tTestFile bad("bad.json", "{");
-    tServoHost host(library(), clock);
-    tune(host, {});
-    tune(host, {{}, "none that is known", good.path});
-    EXPECT_EQ(0.25, tServoParameters::of(host.readConfig()).phaseLockGain);
-    tNotes notes;
-    EXPECT_EQ(R"({"phaseLockGain": 0.25})", applyConfigFile(host, good.path, notes));
-    EXPECT_EQ(tNotes(), notes);
-    EXPECT_EQ(0U, failureOf([&] {
-                      tune(host, {bad.path, {}, {}});
-                  }).find(bad.path + ": applyMetaData failed with -52005: "));
-    EXPECT_EQ(bad.path + ": refused with -52005: it is not JSON, as of line 1", failureOf([&] {
-                  tune(host, {{}, {}, bad.path});
-              }));
-}
-
-TEST(ServoLibrary, isThePlugInOrNothing)
-{
-    EXPECT_EQ("asked", tServoLibrary::find("asked"));
-    EXPECT_EQ("libc.so.6 is not the plug-in: it has no zvckmservo_initialize",
-              failureOf([] { tServoLibrary("libc.so.6"); }));
-    const std::string missing = failureOf([] { tServoLibrary("/no/library"); });
-    EXPECT_EQ(0U, missing.find("cannot load the plug-in: "));
-}
-
 TEST(Status, keepsTheFirstFailure)
 {
     tStatus status;
@@ -240,17 +163,6 @@ TEST(Status, keepsTheFirstFailure)
     setFailure(&status, -8, "later");
     EXPECT_EQ("it failed with -7: {\"message\": \"" + reason + "\"}",
               failureOf([&] { status.check("it"); }));
-}
-
-TEST(Status, growsByTheRulesOfThePlugIn)
-{
-    tStatus status;
-    for (const uint32_t size : {2U, 10U, 5U})
-        ASSERT_TRUE(status.reallocJson(&status, size));
-    EXPECT_EQ(std::string("{}\0\0\0\0\0\0\0J", 10), std::string(status.json, status.capacity));
-    ASSERT_TRUE(status.reallocJson(&status, 0));
-    EXPECT_EQ(nullptr, status.json);
-    EXPECT_EQ(0U, status.capacity);
 }
 
 } // namespace

@@ -172,18 +172,6 @@ TEST_F(LiveSource, endsInTime)
     }
 }
 
-TEST_F(LiveSource, endsWithASignal)
-{
-    tLiveSource source = open();
-    raise(SIGHUP);
-    EXPECT_TRUE(signals.takeReload());
-    EXPECT_FALSE(signals.takeReload());
-    EXPECT_TRUE(source.next());
-    raise(SIGTERM);
-    EXPECT_FALSE(source.next());
-    EXPECT_TRUE(signals.stopRaised());
-}
-
 TEST(Signals, doAfterwardsWhatTheyDidBefore)
 {
     const auto handlers = [] {

@@ -3,7 +3,6 @@
 #include "watchers/tReport.h"
 #include "watchers/tStatusLines.h"
 #include "watchers/tSummary.h"
-#include "watchers/tTraceFile.h"
 
 #include <functional>
 #include <regex>
@@ -178,11 +177,6 @@ TEST(MetricsFile, failsAtTheFirstFileOnly)
     EXPECT_EQ("     2.000" + reason + "     6.000" + reason, text);
 }
 
-std::string untilAdvice(const std::string& text)
-{
-    return text.substr(0, text.find("            Compare"));
-}
-
 TEST(Summary, countsWhatHappened)
 {
     const auto watch = [](std::optional<double> trueErrorNs) {
@@ -203,6 +197,7 @@ TEST(Summary, countsWhatHappened)
             summary.end("");
         });
     };
+    const std::string text = watch({});
     EXPECT_EQ("pairs       8 in 7.500 s; 1 held back\n"
               "lock        after 3.500 s, lost 2 times, missed 1 time; 4 of 5 pairs locked since\n"
               "error       RMS 4.025 us, peak 9 us, last -10 ns\n"
@@ -213,52 +208,11 @@ TEST(Summary, countsWhatHappened)
               "host calls  getTime 1, stepTime 0, getFrequency 4, setFrequency 6,\n"
               "            getMaxFrequencyOffset 1, getMinFrequencyOffset 0\n"
               "WARNING     the lock did not hold: lost 2 times, 25 % of the time without it\n",
-              untilAdvice(watch({})));
+              text.substr(0, text.find("            Compare")));
     EXPECT_NE(std::string::npos,
               watch(-2.5).find("error       RMS 2.5 ns, peak 2.5 ns, last -2.5 ns\n"
                                "            while locked: RMS 2.5 ns, peak 2.5 ns\n"
                                "            (of the clock against the true time, "));
-}
-
-TEST(Summary, saysOfADryRunWhatWouldBe)
-{
-    const std::string text = shownBy([](tConsole& console) {
-        tSummary summary(console);
-        tStep step = withEvent(stepAt(1, 5, false, 0), kNothingNew,
-                               {{kGetFrequency, 0}, {kSetFrequency, 2000}, {kStepTime, 9}});
-        step.dryRun = true;
-        summary.see(step);
-        summary.end("");
-    });
-    EXPECT_EQ("pairs       1 in 1.000 s\n"
-              "lock        never; missed 0 times\n"
-              "frequency   would be ordered +2.000 ppm to +2.000 ppm, last +2.000 ppm\n"
-              "host calls  getTime 0, stepTime 0, getFrequency 1, setFrequency 0,\n"
-              "            getMaxFrequencyOffset 0, getMinFrequencyOffset 0\n",
-              text);
-}
-
-TEST(TraceFile, holdsPairsAndCallsInOrder)
-{
-    for (const bool dryRun : {false, true}) {
-        const tTestFile file("trace.csv");
-        tTraceFile trace(file.path);
-        trace.begin("", {{kGetMaxFrequencyOffset, 5}});
-        tStep step = withEvent(stepAt(1.25, -40, true, 0), kNothingNew,
-                               {{kGetFrequency, 7}, {kSetFrequency, -20000}, {kStepTime, -3}});
-        step.pair.trueErrorNs = -38.0625;
-        step.dryRun = dryRun;
-        trace.see(step);
-        trace.see(failed(stepAt(2, 5, true, 0))); // is on the disk before the end
-        const std::string order = dryRun ? "held,1.250000000,,,,," : "call,1.250000000,,,,,";
-        EXPECT_EQ("kind,elapsed_s,reference_ns,clock_ns,error_ns,true_error_ns,call,value\n"
-                  "call,0.000000000,,,,,getMaxFrequencyOffset,5\n"
-                  "pair,1.250000000,1700000001250000000,1700000001249999960,-40,-38.062,,\n"
-                  "call,1.250000000,,,,,getFrequency,7\n" +
-                      order + "setFrequency,-20000\n" + order + "stepTime,-3\n" +
-                      "pair,2.000000000,1700000002000000000,1700000002000000005,5,,,\n",
-                  readText(file.path));
-    }
 }
 
 } // namespace
