@@ -12,7 +12,6 @@
 #include <cstdlib>
 #include <fstream>
 #include <gtest/gtest.h>
-#include <initializer_list>
 #include <limits>
 #include <random>
 #include <unistd.h>
@@ -90,15 +89,6 @@ std::string wordsOf(const std::string& name)
     return text;
 }
 
-std::string joined(std::initializer_list<const char*> parts)
-{
-    std::string text;
-    for (const char* const part : parts) {
-        text += part;
-    }
-    return text;
-}
-
 TEST(Parameters, AreDescribedAsTheyAre)
 {
     const std::string header = wordsOf("include/zvckmservo/servo.h");
@@ -107,34 +97,17 @@ TEST(Parameters, AreDescribedAsTheyAre)
     size_t inManual = 0;
     for (const zvckmservo_Parameter& row : zvckmservo_parameters) {
         const bool flag = row.kind == zvckmservo_kBool;
-        const std::string headerEntry =
-            joined({"* \"", row.key, "\" ", flag ? "1, or anything else" : row.boundsText, " ",
-                    row.initialText, " "});
+        const std::string headerEntry = std::string("* \"") + row.key + "\" " +
+                                        (flag ? "1, or anything else" : row.boundsText) + " " +
+                                        row.initialText + " ";
         const std::string manualEntry =
-            joined({"*", row.key, "* (", flag ? "0 or 1" : row.boundsText,
-                    *row.unit != 0 ? " " : "", row.unit, "; ", row.initialText, ")"});
+            std::string("*") + row.key + "* (" + (flag ? "0 or 1" : row.boundsText) +
+            (*row.unit != 0 ? " " : "") + row.unit + "; " + row.initialText + ")";
         inHeader = header.find(headerEntry, inHeader);
         EXPECT_NE(std::string::npos, inHeader) << headerEntry;
         inManual = manual.find(manualEntry, inManual);
         EXPECT_NE(std::string::npos, inManual) << manualEntry;
     }
-}
-
-TEST(Parameters, FilterSwitchAndHistorySize)
-{
-    tFakeHost host;
-    iServoConfig& config = host.open().config();
-    EXPECT_FALSE(config.getSpikeFilterEnabled());
-    config.setSpikeFilterEnabled(true);
-    EXPECT_TRUE(config.getSpikeFilterEnabled());
-    EXPECT_EQ(5U, config.getSpikeFilterHistorySize());
-    for (const uint32_t good : {2U, 100U}) {
-        EXPECT_EQ("", raisedBy([&] { config.setSpikeFilterHistorySize(good); }));
-    }
-    for (const uint32_t bad : {0U, 1U, 101U, static_cast<uint32_t>(-5)}) {
-        EXPECT_EQ(refusalAt(235), raisedBy([&] { config.setSpikeFilterHistorySize(bad); })) << bad;
-    }
-    EXPECT_EQ(100U, config.getSpikeFilterHistorySize());
 }
 
 TEST(Parameters, HostLimitsAreMultipliedByAPartPerBillion)
@@ -215,6 +188,9 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
          defaults},
         {"size cut to 100", R"({"spikeFilterHistorySize":100.99})", "",
          "1 0.55 2 1 1 1e-06 0 100 1 2.5e-08 3 "},
+        {"size of 2", R"({"spikeFilterHistorySize":2})", "", "1 0.55 2 1 1 1e-06 0 2 1 2.5e-08 3 "},
+        {"size above 100", R"({"spikeFilterHistorySize":101})", R"("dravik/tServo","line":235)",
+         defaults},
         {"size below 2", R"({"spikeFilterHistorySize":1.9999})", R"("dravik/tServo","line":235)",
          defaults},
         {"size below 0", R"({"spikeFilterHistorySize":-1})", R"("dravik/tServo","line":235)",

@@ -74,38 +74,6 @@ TEST(SanityCheck, findsLeapsButNotRatesAndOwnSteps)
     }
 }
 
-TEST(LaterDocuments, areAppliedInALockAndGoWithIt)
-{
-    const tTestFile quiet("quiet.json", R"({"phaseLockGain": 0.1})");
-    const tTestFile quieter("quieter.json", R"({"phaseLockGain": 0.01})");
-    const tTestFile refused("refused.json", R"({"phaseLockGain": 0})");
-    const std::string byQuiet = "tuned by " + quiet.path;
-    const std::string byQuieter = "tuned by " + quieter.path;
-    const struct {
-        double atS;
-        bool locked;
-        std::string done;
-        const char* gain; // from then on
-    } kRows[] = {
-        {101, true, "", "0.5"},           {110.9, true, "", "0.5"},
-        {111, true, byQuiet, "0.1"},      {120.9, true, "", "0.1"},
-        {121, true, byQuieter, "0.01"},   {151, false, "tuned as at the start", "0.5"},
-        {152, false, "", "0.5"},          {200, true, "", "0.5"},
-        {209.9, true, "", "0.5"},         {230, true, byQuiet, "0.1"}, // one at a time
-        {230.1, true, byQuieter, "0.01"},
-    };
-    tStillClock still;
-    tServoHost servo(library(), still);
-    servo.writeConfig(R"({"phaseLockGain": 0.5})");
-    tLaterDocuments later(servo, {{nsOfSeconds(10), quiet.path}, {nsOfSeconds(20), quieter.path}});
-    for (const auto& row : kRows) {
-        EXPECT_EQ(row.done, later.observe(servo, nsOfSeconds(row.atS), row.locked)) << row.atS;
-        const std::string gain = std::string("phaseLockGain\":\t") + row.gain + ",";
-        EXPECT_NE(std::string::npos, servo.readConfig().find(gain)) << row.atS;
-    }
-    EXPECT_THROW(tLaterDocuments(servo, {{0, refused.path}}), std::runtime_error);
-}
-
 // A clock that counts its orders, and fails at one of them; the first is 1.
 struct tStepRow {
     char what;

@@ -1,6 +1,5 @@
 #include "host/stepFixture.h"
 #include "watchers/tMetricsFile.h"
-#include "watchers/tReport.h"
 #include "watchers/tStatusLines.h"
 #include "watchers/tSummary.h"
 
@@ -43,34 +42,6 @@ tStep held(tStep step)
     return step;
 }
 
-TEST(Report, saysWhatHappens)
-{
-    const struct {
-        tLockEvent event;
-        tHostCalls calls;
-        const char* text; // behind the time
-    } kRows[] = {
-        {kNothingNew, {{kSetFrequency, -3}}, ""},
-        {kFrequencyMeasured,
-         {{kGetFrequency, 1500}, {kSetFrequency, -20000}},
-         "frequency measured: +21.500 ppm off, now steered by -20.000 ppm\n"},
-        {kFrequencyAtLimit, {{kSetFrequency, 500000}}, "frequency at its limit, +500.000 ppm\n"},
-        {kStepped, {{kStepTime, -3000000}}, "stepped by -3 ms\n"},
-        {kNotStepped, {}, "no step needed, error +120 ns\n"},
-        {kLockGained, {{kSetFrequency, 7}}, "locked, error +120 ns\n"},
-        {kLockMissed, {}, "lock missed, error +120 ns\n"},
-        {kLockLost, {}, "lock lost, error +120 ns\n"},
-    };
-    for (const auto& row : kRows) {
-        const tStep step = withEvent(stepAt(2.5, 120, false, 0), row.event, row.calls);
-        EXPECT_EQ(*row.text == '\0' ? "" : std::string("     2.500 s  ") + row.text,
-                  shownBy([&](tConsole& console) {
-                      tReport(console).see(step);
-                      tReport(console).see(failed(step)); // of which the end tells
-                  }));
-    }
-}
-
 TEST(StatusLines, tellEachPair)
 {
     EXPECT_EQ("dravik-host[2.000]: offset    3000000 s1 freq  +20000\n"
@@ -88,29 +59,6 @@ TEST(StatusLines, tellEachPair)
                   status.see(tSilence{nsOfSeconds(14), nsOfSeconds(10.5), 34.0});
                   status.see(tSilence{nsOfSeconds(14.9), nsOfSeconds(11.4), {}}); // too soon
                   status.see(tSilence{nsOfSeconds(15), nsOfSeconds(11.5), {}});
-              }));
-}
-
-TEST(StatusLines, tellStretches)
-{
-    EXPECT_EQ("dravik-host[3.000]: rms   30 max   50 freq  -10001 +/-   1\n"
-              "dravik-host[5.000]: rms    7 max    7 freq    +500 +/-   0\n"
-              "dravik-host[8.000]: holdover for 3 s, error unknown\n",
-              shownBy([](tConsole& console) {
-                  tStatusLines status(nsOfSeconds(2), console);
-                  status.see(stepAt(1, 10, true, 10000)); // rms: the root of (100+2500+100)/3
-                  status.see(stepAt(2, -50, true, 10001));
-                  status.see(stepAt(3, 10, true, 10002));
-                  status.see(stepAt(4, 7, true, -500));
-                  status.see(failed(stepAt(5, 9000, true, 0)));
-                  status.see(stepAt(5, 7, true, -500));
-                  status.see(tSilence{nsOfSeconds(6.9), nsOfSeconds(1.9), {}}); // too soon
-                  status.see(tSilence{nsOfSeconds(8), nsOfSeconds(3), {}});
-              }));
-    EXPECT_EQ("", shownBy([](tConsole& console) {
-                  tStatusLines status({}, console);
-                  status.see(stepAt(0, 10, true, 10000));
-                  status.see(tSilence{nsOfSeconds(20), nsOfSeconds(20), {}});
               }));
 }
 
