@@ -1,6 +1,5 @@
 #include "host/stepFixture.h"
 #include "watchers/tMetricsFile.h"
-#include "watchers/tStatusLines.h"
 #include "watchers/tSummary.h"
 
 #include <functional>
@@ -40,26 +39,6 @@ tStep held(tStep step)
 {
     step.heldBack = true;
     return step;
-}
-
-TEST(StatusLines, tellEachPair)
-{
-    EXPECT_EQ("dravik-host[2.000]: offset    3000000 s1 freq  +20000\n"
-              "dravik-host[3.500]: offset        -23 s2 freq    -450\n"
-              "dravik-host[14.000]: holdover for 10.5 s, error about 34 ns\n"
-              "dravik-host[15.000]: holdover for 11.5 s, error unknown\n",
-              shownBy([](tConsole& console) {
-                  tStatusLines status(0, console);
-                  tStep stepped = stepAt(2, 3000000, false, -20000);
-                  stepped.stepNs = -3000000;
-                  status.see(stepped);
-                  status.see(stepAt(3.5, -23, true, 450));
-                  status.see(failed(stepAt(4, 0, true, 450)));
-                  status.see(tSilence{nsOfSeconds(4.1), {}, {}}); // not a holdover yet
-                  status.see(tSilence{nsOfSeconds(14), nsOfSeconds(10.5), 34.0});
-                  status.see(tSilence{nsOfSeconds(14.9), nsOfSeconds(11.4), {}}); // too soon
-                  status.see(tSilence{nsOfSeconds(15), nsOfSeconds(11.5), {}});
-              }));
 }
 
 TEST(MetricsFile, exportsEveryFigureOnceASecond)
