@@ -209,12 +209,4 @@ TEST(Plot, thinsLongTracesOut)
     EXPECT_EQ("6000 700 nan 0", spike);
 }
 
-TEST(Plot, isOfTwoKinds)
-{
-    for (const char* const name : {"a.svg", "a.b.png", "/c/d.svg"})
-        EXPECT_TRUE(isPictureName(name)) << name;
-    for (const char* const name : {"a", ".svg", ".png", "a.gif", "a.SVG", "a.svg.gz", "asvg"})
-        EXPECT_FALSE(isPictureName(name)) << name;
-}
-
 } // namespace

@@ -1,6 +1,5 @@
 #include "host/stepFixture.h"
 #include "watchers/tMetricsFile.h"
-#include "watchers/tSummary.h"
 
 #include <functional>
 #include <regex>
@@ -20,13 +19,6 @@ std::string shownBy(const std::function<void(tConsole&)>& watch)
     watch(console);
     __fpurge(stdout); // what was not flushed is not shown while it happens
     return testing::internal::GetCapturedStdout();
-}
-
-tStep withEvent(tStep step, tLockEvent event, tHostCalls calls = {})
-{
-    step.event = event;
-    step.calls = std::move(calls);
-    return step;
 }
 
 tStep failed(tStep step)
@@ -102,44 +94,6 @@ TEST(MetricsFile, failsAtTheFirstFileOnly)
     });
     const std::string reason = " s  cannot write " + inTheWay + ": Is a directory\n";
     EXPECT_EQ("     2.000" + reason + "     6.000" + reason, text);
-}
-
-TEST(Summary, countsWhatHappened)
-{
-    const auto watch = [](std::optional<double> trueErrorNs) {
-        return shownBy([&](tConsole& console) {
-            tSummary summary(console);
-            summary.begin("", {{kGetMaxFrequencyOffset, 5}, {kSetFrequency, 1000}});
-            summary.see(withEvent(stepAt(0, 900, false, 0), kNothingNew, {{kGetTime, 1}}));
-            summary.see(held(stepAt(1, 800, false, 0)));
-            summary.see(withEvent(stepAt(2, 0, false, 0), kLockMissed, {{kSetFrequency, -9000}}));
-            double atS = 3.5;
-            for (const int64_t errorNs : {30, -50, 10, 9000, -10}) { // out of the lock once
-                tStep step = stepAt(atS++, errorNs, errorNs != 9000, 0);
-                if (step.locked) step.calls = {{kGetFrequency, 0}, {kSetFrequency, 30 * errorNs}};
-                step.pair.trueErrorNs = trueErrorNs;
-                step.locksLost = trueErrorNs ? 1 : 2;
-                summary.see(step);
-            }
-            summary.end("");
-        });
-    };
-    const std::string text = watch({});
-    EXPECT_EQ("pairs       8 in 7.500 s; 1 held back\n"
-              "lock        after 3.500 s, lost 2 times, missed 1 time; 4 of 5 pairs locked since\n"
-              "error       RMS 4.025 us, peak 9 us, last -10 ns\n"
-              "            while locked: RMS 30 ns, peak 50 ns\n"
-              "            (of the clock against the reference as measured, all pairs since the "
-              "first lock)\n"
-              "frequency   ordered -9.000 ppm to +1.000 ppm, last -0.300 ppm\n"
-              "host calls  getTime 1, stepTime 0, getFrequency 4, setFrequency 6,\n"
-              "            getMaxFrequencyOffset 1, getMinFrequencyOffset 0\n"
-              "WARNING     the lock did not hold: lost 2 times, 25 % of the time without it\n",
-              text.substr(0, text.find("            Compare")));
-    EXPECT_NE(std::string::npos,
-              watch(-2.5).find("error       RMS 2.5 ns, peak 2.5 ns, last -2.5 ns\n"
-                               "            while locked: RMS 2.5 ns, peak 2.5 ns\n"
-                               "            (of the clock against the true time, "));
 }
 
 } // namespace
