@@ -410,6 +410,44 @@ TEST_F(Socket, replacesOnlyWhatNobodyListensToAnyMore)
     EXPECT_THROW(socketReference(std::string(200, 'x')), std::system_error);
 }
 
+tRecordedPair recorded(int64_t seconds, int64_t errorNs, double orderedPpb, int64_t stepNs = 0)
+{
+    const tPair pair = pairAt(static_cast<double>(seconds), errorNs);
+    const auto error = static_cast<double>(errorNs);
+    return {pair.elapsedNs, pair.referenceNs, pair.clockNs, error,
+            error - 1,      orderedPpb,       stepNs,       {}};
+}
+
+// The oscillator alone gains 10 ns each second.
+tRecording recording()
+{
+    tRecording made;
+    made.pairs = {recorded(0, 100, 0, -50), recorded(2, 70, -5), recorded(3, 75, 20)};
+    return made;
+}
+
+TEST(FreeRunningSource, takesTheRecordedCorrectionsOutAndPutsItsOwnIn)
+{
+    tRecording made = recording();
+    made.pairs[2].referenceNs += 1000; // the reference was stepped
+    for (const int32_t orderedPpb : {0, 7}) {
+        tFreeRunningClock clock(made.pairs[0].clockNs, 1000);
+        clock.setOffsetPpb(orderedPpb);
+        tFreeRunningSource source(made, clock);
+        for (const int64_t seconds : {0, 2, 3}) {
+            const auto pair = source.next();
+            const int64_t errorNs = 100 + (10 + orderedPpb) * seconds;
+            EXPECT_EQ(seconds * kSecondNs, pair->elapsedNs);
+            EXPECT_NEAR(errorNs, pair->errorNs(), 1);
+            EXPECT_NEAR(errorNs - 1, *pair->trueErrorNs, 1e-3);
+        }
+        EXPECT_FALSE(source.next());
+    }
+    made.pairs[1].orderedPpb.reset();
+    tFreeRunningClock clock(kStartNs, 1000);
+    EXPECT_THROW(tFreeRunningSource(made, clock), std::runtime_error);
+}
+
 TEST(MeasurementError, isNoiseAndNowAndThenAnOutlier)
 {
     tNoise noise(2);
