@@ -59,6 +59,7 @@ while IFS='|' read -r status pattern arguments; do
 done << 'END'
 2|A trace, or --noise, --wander and --interval, or --from-pi is required|--noise 1ns
 2|--from-pi: '1,-1' is not KP,KI|--from-pi 1,-1
+2|--from-pi: '0,1' is not KP,KI|--from-pi 0,1
 2|--from-pi: '1,1,1' is not KP,KI|--from-pi 1,1,1
 2|--quick: several documents take files|--noise 1ns --wander 1ppb --interval 1s --quick -
 2|--from-pi: a trace has no say in it|trace.csv --from-pi 1,1

@@ -190,7 +190,7 @@ TEST(Measured, hasTheLongestStretchWithoutAGap)
 TEST(Measured, losesItsSlope)
 {
     tMeasured measured =
-        measure(recordingOf({{0, 1, 1, true}, {1, 5, 5, true}, {4, 9, 9, true}}), {});
+        measure(recordingOf({{2, 1, 1, true}, {3, 5, 5, true}, {6, 9, 9, true}}), {});
     measured.series = {1, {1, 5, 3, 7}};
     measured.removeSlope();
     EXPECT_NEAR(0, measured.errors[0], 1e-18);

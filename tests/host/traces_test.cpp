@@ -43,6 +43,12 @@ struct tReadRow {
 
 // What is read, with the sign that is positive for a clock that is ahead.
 const tReadRow kRead[] = {
+    {"ptp4l",
+     "ptp4l[10.250]: master offset -23 s2 freq +5 path delay 500\n"
+     "ptp4l[11.250]: port 1: UNCALIBRATED to SLAVE\n"
+     "ptp4l[11.300]: a sentence that ends in an offset 9 s2 freq +5 path delay 500\n"
+     "ptp4l[11.500]: master offset 7 s2 freq +5 path delay 500\n",
+     2, -23, 7, 1'250'000'000, "ptp4l", 0},
     {"behind a date",
      "2024-05-06 10:11:00.123 ptp4l[6.202]: selected /dev/ptp1 as PTP clock\n"
      "2024-05-06 10:11:08.750 ptp4l[6.829]: master offset -4 s2 freq +0 path delay 1\n"
@@ -60,6 +66,30 @@ const tReadRow kRead[] = {
      "{\"MESSAGE\":\"[24.5] swp3 sys offset 4 s2 freq +1 delay "
      "2\",\"SYSLOG_IDENTIFIER\":\"phc2sys\"}\n",
      1, 4, 4, 0, "phc2sys swp3", 0},
+    {"ts2phc",
+     "ts2phc[27.133]: adding tstamp 21.94 to clock /dev/ptp3\n"
+     "ts2phc[27.133]: /dev/ptp3 offset 640 s2 freq +5112\n",
+     1, 640, 640, 0, "ts2phc /dev/ptp3", 0},
+    {"damaged lines",
+     "ptp4l[1.0]: master offset 1 s2 freq +5 path delay 5\n"
+     "ptp4l[2.0]: master offset 1 sX freq +5 path delay 5\n"
+     "ptp4l[3.0]: master offset 1x s2 freq +5 path delay 5\n"
+     "ptp4l[4.0]: master offset 1 s2 freq +\n"
+     "ptp4l[5.0]: master offset 1 s2 freq +5\n"
+     "ptp4l[6.0]: master off\n"
+     "ptp4l[7\n"
+     "ptp4l[0.5]: master offset 9 s2 freq +5 path delay 5\n"
+     "ptp4l[8.0]: master offset 2 s2 freq +5 path delay 5\n"
+     "ptp4l[0.7]: master offset 9 s2 freq +5 path delay 5\n"
+     "ptp4l[9.0]: master offset 3 s2 freq +5 path delay 5\n",
+     3, 1, 3, 8'000'000'000, "ptp4l", 8},
+    {"refclocks.log",
+     "   Date (UTC) Time         Refid  DP L P  Raw offset   Cooked offset      Disp.\n"
+     "2026-02-28 23:59:59.500000 PPS0    0 N 1  4.900000e-07  2.300000e-08  1.000e-06\n"
+     "2026-02-28 23:59:59.500000 PPS0    - N -       -       -6.741777e-07  1.000e-06\n"
+     "2026-02-30 00:00:00.500000 PPS0    1 N 1  4.900000e-07  1.500000e-08  1.000e-06\n"
+     "2026-03-01 00:00:00.750000 PPS0    1 N 1  4.900000e-07 -1.500000e-08  1.000e-06\n",
+     2, -23, 15, 1'250'000'000, "PPS0", 1},
     {"statistics.log of two versions",
      "2017-08-31 16:27:19 192.0.2.1 4.611e-06  3.391e-05  5.239e-06  9.759e-07  9.758e-04 4.9e-04 "
      "3 0 3\n"
@@ -89,28 +119,35 @@ const tReadRow kRead[] = {
     {"peerstats", "48773 10847.650 PPS(0) 961a -0.001605376 0.000000000 0.001424877 0.000958674\n",
      1, 1'605'376, 1'605'376, 0, "PPS(0)", 0},
     {"sfptpd",
-     "2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n",
-     1, 12.375, 12.375, 0, "ptp1->system(em1)", 0},
+     "2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n"
+     "2016-03-03 10:04:42.413263 [ptp1->system(em1)], offset: 12.3\n",
+     1, 12.375, 12.375, 0, "ptp1->system(em1)", 1},
     {"ptpd",
      "# Timestamp, State, Clock ID, One Way Delay, Offset From Master, Slave to Master\n"
      "2015-06-11 13:20:12.123456, lstn, , , , \n"
-     "2015-06-11 13:20:13.123456, slv, 0011/01,  0.000010234,  0.000000123,  0.000010000, S\n",
-     1, 123, 123, 0, "", 0},
+     "2015-06-11 13:20:13.123456, slv, 0011/01,  0.000010234,  0.000000123,  0.000010000, S\n"
+     "2015-06-11 13:20:14.123456, slv, 0011/01,  0.000010234,  0.0000001\n",
+     1, 123, 123, 0, "", 1},
     {"CSV of spreadsheets",
      "\xef\xbb\xbf"
      "\"Reference_NS\" ; Clock_NS ; note\r\n"
      "1700000000000000000 ; \"1700000000000000023\" ;\r\n"
-     "1700000001000000000;1700000000999999999,25;x;\r\n",
+     "1700000001000000000;1700000000999999999,25;clock_ns;\r\n",
      2, 23, -0.75, 1'000'000'000, "", 0},
     {"TIE with units", "# time [ms]  TIE [us]\n0 1.5\n125 -2\n", 2, 1500, -2000, 125'000'000, "",
      0},
     {"TIE with decimal commas", "time (s);TIE (ns)\n0,000;11,5\n0,125;13\n0,250;\n", 2, 11.5, 13,
      125'000'000, "", 1},
+    {"rows unlike their header", "time (s);TIE (ns)\n0 11.5\n1 13\n", 2, 11.5, 13, kSecondNs, "",
+     0},
     {"an offset with its unit",
      "when,timestamp,offset_us\na,2024-05-06T10:00:00Z,12\nb,2024-05-06T10:00:01Z,-14\n", 2, 12'000,
      -14'000, 1'000'000'000, "", 0},
-    {"phase with a header", "File: a.phd\nType: Phase\nTau: 0.5\n# Header End\n1.2e-9\n-0.9e-9\n",
-     2, 1.2, -0.9, 500'000'000, "", 0},
+    {"phase with a header",
+     "File: a.phd\nType: Phase\nTau: 0.5\n# Header End\n1.2e-9\n# Tau: 2\n-0.9e-9\n", 2, 1.2, -0.9,
+     500'000'000, "", 0},
+    {"frequency with a header", "# Type: Frequency\n# Tau: 2\n3e-9\n-4e-9\n", 3, 0, -2,
+     4'000'000'000, "", 0},
 };
 
 TEST(Trace, isReadByWhatItsLinesAre)
@@ -139,6 +176,13 @@ TEST(Trace, tellsTheCorrections)
     EXPECT_EQ(130'300, tracking.stepNs); // slewed away before the next line
     const tRecordedPair loopstats = first("50935 75440.031 0.000006019 13.778190 6\n");
     EXPECT_NEAR(13'778.19, *loopstats.orderedPpb, 1e-6);
+    const tRecordedPair held = first("kind,reference_ns,clock_ns,call,value\n"
+                                     "pair,1000000000,1000000023,,\n"
+                                     "call,,,setFrequency,7\n"
+                                     "held,,,setFrequency,9\n"
+                                     "held,,,stepTime,-23\n");
+    EXPECT_EQ(7, held.orderedPpb); // what was held back reached no clock
+    EXPECT_EQ(0, held.stepNs);
 }
 
 struct tRefusedRow {
@@ -168,6 +212,8 @@ const tRefusedRow kRefused[] = {
     {"reference_ns,clock_ns,clock_ns\n1,2,3\n", "the column clock_ns stands there 2 times"},
     {"reference_ns,clock_ns\n1.7E+18,1.7E+18\n", "a spreadsheet has rounded away"},
     {"reference_ns,clock_ns\nx,1\n", "not used are lines 2 (no number in reference_ns"},
+    {"elapsed_s,reference_ns,clock_ns\nx,1,2\n", "(elapsed_s is not a time"},
+    {"0,1,2\n1,2,3\n", " is no trace of a known kind"},
     {"reference_ns,clock_ns\n1,2\nclock_ns,reference_ns\n1,2\n", "a second header"},
     {"Frequency\n1\n2\n", "names no time error that is known"},
     {"2016-03-03 10:04:41.4 [a->b], offset: 12,375, freq-adj: 1,5\n", "the offset is no number"},
@@ -176,6 +222,13 @@ const tRefusedRow kRefused[] = {
     {"Time (s),Frequency (Hz)\n0,1\n1,2\n", "names no time error that is known"},
     {"Time,TIE (ns),Phase (ns)\n0,1,2\n", "two columns may be the error"},
     {"1\n2\n", "no time, and no --interval"},
+    {"Timestamp, a, b, c, d\n", " is no trace of a known kind"},
+    {"phc2sys[1.x]: phc offset 6 s2 freq -4 delay 3\n", "no time in front of it"},
+    {"50935 75440.031 0.000006019 13.778190 6\n"
+     "49213 525.624 127.127.4.1 93 226 00:08:29.606 D\n"
+     "49213 526.624 127.127.4.1 93 226 00:08:30.606 D\n"
+     "49213 527.624 127.127.4.1 93 226 00:08:31.606 D\n",
+     " is mostly ntpd's clockstats"},
     {"Tau: 1\n1\n\n2,5\nx\n", "line 4 is not one number"},
     {"2021-11-20 19:15:00 h 3 -1.4 0.056 -9.303e-04 ?  1 2.0e-04 4.0e-05\n", "(not synchronised)"},
 };
@@ -222,6 +275,8 @@ TEST(Trace, tellsRunsOfAProgramApart)
     ASSERT_EQ(4U, restarted.pairs.size());
     EXPECT_EQ(11 * kSecondNs, restarted.pairs.back().elapsedNs);
     EXPECT_FALSE(restarted.pairs[2].beginsStretch);
+    const std::string summary = "host phc2sys[6]: [9.5] CLOCK_REALTIME rms 3 max 4 freq +1 +/- 3\n";
+    EXPECT_EQ(2U, readTraceOf(summary + line(7, 10) + line(7, 11)).pairs.size());
     const std::string why = refusalOf(line(7, 10) + line(8, 10) + line(7, 11) + line(8, 11));
     EXPECT_NE(std::string::npos, why.find("'phc2sys CLOCK_REALTIME (host 7)', "
                                           "'phc2sys CLOCK_REALTIME (host 8)'"));
@@ -250,6 +305,20 @@ TEST(Trace, beginsAStretchAfterAReboot)
     ASSERT_EQ(8U, recording.pairs.size());
     EXPECT_EQ(0, recording.pairs.front().elapsedNs);
     EXPECT_EQ(-10, recording.pairs.front().errorNs);
+}
+
+// A journal says so between the lines, though time may go on.
+TEST(Trace, beginsAStretchWhereAJournalSaysSo)
+{
+    const std::string before = "ptp4l[1.0]: master offset 1 s2 freq +1 path delay 1\n";
+    const std::string after = "ptp4l[9.0]: master offset 2 s2 freq +1 path delay 1\n";
+    for (const auto& [line, begins] : {std::pair("-- Reboot --\n", true),
+                                       {"-- Boot 1f2e3d4c --\n", true},
+                                       {"-- Logs begin at Mon --\n", false}}) {
+        const tRecording recording = readTraceOf(before + line + after);
+        ASSERT_EQ(2U, recording.pairs.size());
+        EXPECT_EQ(begins, recording.pairs[1].beginsStretch) << line;
+    }
 }
 
 TEST(Trace, readsSummariesAsWhatTheyAre)
@@ -299,8 +368,17 @@ TEST(Moments, goOnEvenlyThroughALeapSecond)
     EXPECT_EQ(1'500'000'000, *leap - *before);
     EXPECT_EQ(2'000'000'000, *after - *before);
     for (const char* const date :
-         {"2026-02-30", "2026-13-01", "2025-02-29", "2026-00-10", "26-01-01"})
+         {"2026-02-30", "2026-13-01", "2025-02-29", "2026-00-10", "26-01-01", "1969-12-31",
+          "2000-02-30", "2100-02-29", "2026-12-32"})
         EXPECT_FALSE(moments.ofDate(date, "00:00:00")) << date;
+    for (const auto& [date, second] : {std::pair("1970-01-01", int64_t{0}),
+                                       {"2000-02-29", 951'782'400},
+                                       {"2000-03-01", 951'868'800},
+                                       {"2100-02-28", 4'107'456'000},
+                                       {"2100-03-01", 4'107'542'400}})
+        EXPECT_EQ(second * kSecondNs, tMoments().ofDate(date, "00:00:00")) << date;
+    EXPECT_EQ(0, tMoments().ofJulian("40587", "0"));
+    EXPECT_FALSE(tMoments().ofJulian("40586", "0"));
     for (const char* const time : {"24:00:00", "12:60:00", "12:00:60", "12:00", "12:00:61"})
         EXPECT_FALSE(moments.ofDate("2026-02-28", time)) << time;
 }
