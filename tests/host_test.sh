@@ -83,7 +83,7 @@ negative seed       |2|--seed: '-1'|simulate --seed -1
 no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
 another library     |1|libm.* has no zvckmservo_initialize|run --library libm.so.6
 no such file        |1|^dravik-host: cannot read $scratch/none: No such|run --config $scratch/none
-another for check   |1|^dravik-host: cannot load the plug-in: $scratch/none|check $scratch/err --library $scratch/none
+another for check   |1|^dravik-host: cannot load the plug-in: $scratch/none|check $config/dravik_tr_ptp4l_bc.json --library $scratch/none
 not a file          |1|^dravik-host: cannot read /: Is a directory|check /
 bad metadata        |1|^dravik-host: $scratch/err: applyMetaData failed with -52005: \{|simulate --metadata $scratch/err
 one input twice     |2|standard input is taken by --metadata|show --metadata - --config -

@@ -222,6 +222,8 @@ const tRefusedRow kRefused[] = {
     {"Time (s),Frequency (Hz)\n0,1\n1,2\n", "names no time error that is known"},
     {"Time,TIE (ns),Phase (ns)\n0,1,2\n", "two columns may be the error"},
     {"1\n2\n", "no time, and no --interval"},
+    {"   Date (UTC) Time     IP Address   Std dev'n Est offset  Offset sd  Diff freq\n",
+     " looks like chrony's statistics.log, but has no measurement"},
     {"Timestamp, a, b, c, d\n", " is no trace of a known kind"},
     {"phc2sys[1.x]: phc offset 6 s2 freq -4 delay 3\n", "no time in front of it"},
     {"50935 75440.031 0.000006019 13.778190 6\n"
@@ -325,7 +327,8 @@ TEST(Trace, readsSummariesAsWhatTheyAre)
 {
     const tRecording recording =
         readTraceOf("ptp4l[1.0]: rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[2.0]: rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n");
+                    "ptp4l[2.0]: rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n"
+                    "ptp4l[3.0]: rms 4 mux 9 freq +1 +/- 3 delay 237 +/- 0\n");
     const tMeasured measured = measure(recording, {});
     EXPECT_EQ(2U, measured.errors.size());
     EXPECT_NEAR(std::sqrt((9 + 16) / 2.0) * 1e-9, measured.rms(), 1e-18);
