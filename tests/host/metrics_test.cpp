@@ -248,6 +248,8 @@ TEST(Figures, haveNamesAndTaus)
         EXPECT_NEAR(row.value.value_or(0), found.value_or(0), 1e-6 * row.value.value_or(0))
             << row.figure;
     }
+    measured.series = {1, {1e-9, 3e-9}};
+    EXPECT_DOUBLE_EQ(2e-9, valueOf(parseFigure("mtie(1s)"), measured).value_or(0));
     measured.timeToLock.reset();
     measured.locksLost.reset();
     EXPECT_FALSE(valueOf(parseFigure("time-to-lock"), measured));

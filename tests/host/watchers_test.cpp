@@ -47,6 +47,9 @@ TEST(MetricsFile, exportsEveryFigureOnceASecond)
                       "samples_unusable_total 7\n",
                   std::regex_replace(readText(file.path), std::regex("#.*\n|dravik_"), ""));
     };
+    metrics.see(tSilence{0, {}, {}}); // before the first pair
+    EXPECT_NE(std::string::npos, readText(file.path).find("offset_seconds NaN\n"));
+    EXPECT_NE(std::string::npos, readText(file.path).find("locked 0\n"));
     tStep step = stepAt(1, -4000000, true, -3500);
     step.steps = 5;
     step.locksLost = 3;
