@@ -24,6 +24,12 @@ int32_t withinKernel(double limitPpb)
     return static_cast<int32_t>(std::min<double>(limitPpb, widestPpb));
 }
 
+std::unique_ptr<iLiveClock> ready(std::unique_ptr<tKernelClock> clock, bool isToBeSet)
+{
+    if (isToBeSet) clock->requireSettable();
+    return clock;
+}
+
 std::unique_ptr<tKernelClock> openPtp(const std::string& path, int32_t limitPpb)
 {
     const auto device = std::make_shared<tPtpDevice>(path);
@@ -60,9 +66,8 @@ std::unique_ptr<iLiveClock> openClock(const tClockChoice& choice)
 {
     if (choice.name == "soft") return startSoft(choice);
     const auto path = afterPrefix(choice.name, "phc:");
-    auto clock = path ? openPtp(*path, choice.limitPpb) : openRealtime(choice.limitPpb);
-    if (choice.isToBeSet) clock->requireSettable();
-    return clock;
+    if (path) return ready(openPtp(*path, choice.limitPpb), choice.isToBeSet);
+    return ready(openRealtime(choice.limitPpb), choice.isToBeSet);
 }
 
 } // namespace dravikHost

@@ -114,16 +114,18 @@ void requirePlausible(const tKalmanDesign& kalman, const tNoiseModel& model)
     constexpr double kMostErrorNs = 10e9; // the highest threshold
     const double pairs = 4 / (kalman.gains.kp * model.interval());
     const double seconds = pairs * model.interval();
-    if (kalman.rmsNs > kMostErrorNs)
+    if (kalman.rmsNs > kMostErrorNs) {
         throw std::runtime_error(
             fmt::format("no document holds a clock with such a model: even the "
                         "best loop leaves an error of {} RMS",
                         durationText(kalman.rmsNs)));
-    if (!(pairs < kMostPairs) || seconds > kMostSeconds)
+    }
+    if (!(pairs < kMostPairs) || seconds > kMostSeconds) {
         throw std::runtime_error(
             fmt::format("the noise is too large for such an oscillator and interval: the best loop "
                         "would average over {:.3g} pairs, {:.3g} days",
                         pairs, seconds / 86400));
+    }
 }
 
 } // namespace

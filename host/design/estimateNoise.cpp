@@ -177,7 +177,8 @@ public:
         const double most = cost(top) + kFall / likelihood.measurements();
         std::vector<double> place = top;
         place[1] = std::max(place[1], kLeastWalk);
-        for (double step = kStep;; step *= 1 + kStep) {
+        double step = kStep;
+        while (true) {
             place[1] += direction * step;
             if (place[1] < kLeastWalk) return 0;
             const auto along = [&](const std::vector<double>& white) {
@@ -187,6 +188,7 @@ public:
             const double least = patternSearch(along, white, {1}, 2);
             place[0] = white[0];
             if (!(least < most) || place[1] > kMostWalk) break;
+            step *= 1 + kStep;
         }
         cost(place);
         return ratios(place).wander * std::sqrt(likelihood.varianceNs2());

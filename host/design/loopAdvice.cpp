@@ -40,10 +40,11 @@ std::string gainsText(const tServoParameters& parameters)
 
 std::string stabilityText(const tServoParameters& parameters, const tLoopAnalysis& loop)
 {
-    if (loop.marginal)
+    if (loop.marginal) {
         return fmt::format("! marginal: with A = B no frequency is learnt once locked; each ppb "
                            "that the oscillator changes keeps the clock {} off\n",
                            secondsAsText(1e-9 / tLoopGains::of(parameters).kp));
+    }
     if (loop.stable) {
         return loop.stableBelow > 0
                    ? fmt::format("  stable below {}\n", secondsAsText(loop.stableBelow))
@@ -86,12 +87,14 @@ std::string frequencyLockText(const tServoParameters& parameters, const tLoopAna
     const double astray = off * std::max(loop.takeUp, interval);
     const std::string text = fmt::format("frequencyLockGain {:.10g} sets the frequency {} off",
                                          gain, offsetText(off * 1e9));
-    if (off > kUsualLimit)
+    if (off > kUsualLimit) {
         return fmt::format("! {}, beyond most clocks' limit of 500 ppm: never locks; better 1\n",
                            text);
-    if (astray < parameters.snapTimeThreshold)
+    }
+    if (astray < parameters.snapTimeThreshold) {
         return fmt::format("  {}: each lock begins with an error of up to {}\n", text,
                            secondsAsText(astray));
+    }
     return fmt::format("! {}: the error goes to {}, beyond snapTimeThreshold, {}: {}; better 1\n",
                        text, secondsAsText(astray), secondsAsText(parameters.snapTimeThreshold),
                        off * interval < parameters.snapTimeThreshold ? "the lock never holds"
@@ -107,16 +110,18 @@ std::string actionText(const tServoParameters& parameters)
     const double b = parameters.phaseLockCoefficientB;
     const double threshold = parameters.snapTimeThreshold;
     const double stays = kLeastChange / (g * (a - b));
-    if (g * (std::fabs(a) + std::fabs(b)) * threshold < kLeastChange)
+    if (g * (std::fabs(a) + std::fabs(b)) * threshold < kLeastChange) {
         return fmt::format("! gain too small to act: no error below snapTimeThreshold, {}, makes "
                            "half of 1 ppb, the least that is ordered\n",
                            secondsAsText(threshold));
-    if (stays >= threshold)
+    }
+    if (stays >= threshold) {
         return fmt::format(
             "! gain too small to correct the frequency: a lasting error has to reach "
             "{} to make half of 1 ppb, the least that is ordered; snapTimeThreshold "
             "is {}\n",
             secondsAsText(stays), secondsAsText(threshold));
+    }
     return fmt::format("  orders are whole ppb: without noise the error may stay within {}\n",
                        secondsAsText(stays));
 }
@@ -126,8 +131,8 @@ std::string noiseText(const tLoopAnalysis& loop, const std::optional<tLoopForeca
     constexpr double kMuchMore = 1.25;
     const std::string share = fmt::format("{:.0f} % of the noise", loop.noiseGain * 100);
     if (!forecast) return fmt::format("  passes {} on to the clock\n", share);
-    const std::string passed = fmt::format("  passes {} on to the clock, {}\n", share,
-                                           durationText(loop.noiseGain * forecast->noiseNs));
+    std::string passed = fmt::format("  passes {} on to the clock, {}\n", share,
+                                     durationText(loop.noiseGain * forecast->noiseNs));
     if (forecast->roundedNs < kMuchMore * forecast->linearNs) return passed;
     return passed + fmt::format("! orders in whole ppb, from which the law starts again, raise its "
                                 "error to {} RMS; a larger gain suffers less\n",
@@ -138,11 +143,12 @@ std::string noiseText(const tLoopAnalysis& loop, const std::optional<tLoopForeca
 std::string remedyText(const tServoParameters& parameters, const tLoopForecast& forecast)
 {
     constexpr double kHardlyMore = 1.1;
-    if (forecast.measureOverNs)
+    if (forecast.measureOverNs) {
         return fmt::format(
             "! the frequency is measured over one pair, through the noise, and {:.1f} "
             "% of starts fail: use --measure-over {}\n",
             forecast.failing * 100, optionText(*forecast.measureOverNs));
+    }
     if (forecast.withoutFilter)
         return "! these locks are lost by the spike filter, which lets the error go\n";
     const double better = forecast.betterThreshold;

@@ -154,12 +154,14 @@ std::vector<double> marksUpTo(double farthestNs, double typicalNs)
     const bool isWide = farthestNs > 100 * typicalNs;
     const double leastNs = isWide ? 3 * typicalNs : typicalNs; // labels need room
     std::vector<double> marks;
-    for (double decade = std::pow(10, std::floor(std::log10(leastNs)));; decade *= 10) {
+    double decade = std::pow(10, std::floor(std::log10(leastNs)));
+    while (true) {
         for (const double mark : {1.0, 2.0, 5.0}) {
             if ((isWide && mark > 1) || mark * decade < leastNs) continue;
             marks.push_back(mark * decade);
             if (marks.back() >= farthestNs) return marks;
         }
+        decade *= 10;
     }
 }
 

@@ -49,9 +49,10 @@ int misspelt(const CLI::App& app, const std::vector<tVerb>& verbs)
     std::vector<std::string> known;
     for (const CLI::Option* const option : verb.get_options())
         known.push_back(option->get_name());
-    if (chosen.empty())
+    if (chosen.empty()) {
         for (const tVerb& each : verbs)
             known.emplace_back(each.name);
+    }
     const char* const kind = word.front() == '-' ? "option" : chosen.empty() ? "verb" : "argument";
     (void)std::fprintf(stderr, "dravik-host: unknown %s %s%s\n", kind, word.c_str(),
                        didYouMean(word, known).c_str());
