@@ -273,10 +273,12 @@ TEST(Trace, tellsRunsOfAProgramApart)
         return "host phc2sys[" + std::to_string(process) + "]: [" + std::to_string(second) +
                ".5] CLOCK_REALTIME phc offset " + std::to_string(second) + " s2 freq +1 delay 1\n";
     };
-    const tRecording restarted = readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21));
-    ASSERT_EQ(4U, restarted.pairs.size());
-    EXPECT_EQ(11 * kSecondNs, restarted.pairs.back().elapsedNs);
+    const tRecording restarted =
+        readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21) + line(9, 15));
+    ASSERT_EQ(5U, restarted.pairs.size());
+    EXPECT_EQ(11 * kSecondNs, restarted.pairs[3].elapsedNs);
     EXPECT_FALSE(restarted.pairs[2].beginsStretch);
+    EXPECT_TRUE(restarted.pairs[4].beginsStretch); // as time went back
     const std::string summary = "host phc2sys[6]: [9.5] CLOCK_REALTIME rms 3 max 4 freq +1 +/- 3\n";
     EXPECT_EQ(2U, readTraceOf(summary + line(7, 10) + line(7, 11)).pairs.size());
     const std::string why = refusalOf(line(7, 10) + line(8, 10) + line(7, 11) + line(8, 11));
@@ -314,12 +316,10 @@ TEST(Trace, beginsAStretchWhereAJournalSaysSo)
 {
     const std::string before = "ptp4l[1.0]: master offset 1 s2 freq +1 path delay 1\n";
     const std::string after = "ptp4l[9.0]: master offset 2 s2 freq +1 path delay 1\n";
-    for (const auto& [line, begins] : {std::pair("-- Reboot --\n", true),
-                                       {"-- Boot 1f2e3d4c --\n", true},
-                                       {"-- Logs begin at Mon --\n", false}}) {
+    for (const char* const line : {"-- Reboot --\n", "-- Boot 1f2e3d4c --\n"}) {
         const tRecording recording = readTraceOf(before + line + after);
         ASSERT_EQ(2U, recording.pairs.size());
-        EXPECT_EQ(begins, recording.pairs[1].beginsStretch) << line;
+        EXPECT_TRUE(recording.pairs[1].beginsStretch) << line;
     }
 }
 
