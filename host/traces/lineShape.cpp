@@ -72,8 +72,6 @@ bool fits(std::string_view word, char letter)
         return consistsOf(word, kHexDigits, 1, 8);
     case 'l':
         return consistsOf(word, "N+-?", 1, 1);
-    case 'c':
-        return word.size() == 1 && std::isalnum(static_cast<unsigned char>(word[0])) == 0;
     case 'u':
         return isShort(word);
     case 'o':

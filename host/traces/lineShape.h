@@ -26,7 +26,7 @@ std::optional<double> finiteIn(std::string_view text);
 //     s    seconds of a day           x    number with an exponent or decimal point
 //     n    any word                   i    whole number
 //     b    zeros and ones             E I  as e and i, or "-"
-//     h H  8 and 1 to 8 hex digits    c    one character that is no letter or digit
+//     h H  8 and 1 to 8 hex digits
 //     l    leap status                u    letters and digits, at most 4
 //     o    five characters of options
 //

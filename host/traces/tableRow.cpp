@@ -72,9 +72,9 @@ char separatorOf(std::string_view line)
         if (findSeparator(line, separator) < line.size()) return separator;
     const size_t comma = findSeparator(line, ',');
     if (comma == line.size()) return kBlanks;
-    // "0,125 13,223" has decimal commas, "0.125, 13.223" has none.
+    // "0,125 13,223" has decimal commas, "0.125, 13.223" and "0 ,5" have none.
     const size_t blank = line.find(' ');
-    const bool decimal = blank != std::string_view::npos && line[blank - 1] != ',' &&
+    const bool decimal = blank != std::string_view::npos && comma < blank &&
                          comma + 1 < line.size() && line[comma + 1] != ' ' &&
                          std::isdigit(static_cast<unsigned char>(line[blank - 1])) != 0 &&
                          line.find(',', blank) != std::string_view::npos;

@@ -341,8 +341,8 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
 {
     tReadOptions options;
     options.unitNs = 1;
-    const tRecording columns = readTraceOf("0 5\n1 6\n", options);
-    EXPECT_EQ(5, columns.pairs.front().errorNs);
+    for (const char* const text : {"0 5\n1 6\n", "0 ,5\n1 ,6\n", "0,0 5,0\n1,0 6,0\n"})
+        EXPECT_EQ(5, readTraceOf(text, options).pairs.front().errorNs) << text;
     EXPECT_EQ(" has a unit of its own; leave --unit out",
               refusalOf("time (s),tie (us)\n0,5\n1,6\n", options));
 
