@@ -105,8 +105,12 @@ private:
     {
         double least = std::numeric_limits<double>::infinity();
         const double half = -(q + std::copysign(std::sqrt(q * q - 4 * p * r), q)) / 2;
-        for (const double root : {half / p, r / half})
+        const auto look = [&least](double dividend, double divisor) {
+            const double root = divisor != 0 ? dividend / divisor : 0;
             if (root > 0 && root < least) least = root;
+        };
+        look(half, p);
+        look(r, half);
         return least;
     }
 

@@ -144,7 +144,7 @@ std::string rangeText(const tNoiseEstimate& model)
 {
     constexpr double kMatters = 1.5;
     const auto errorOf = [&](double wanderPpb) {
-        tNoiseModel other = model;
+        auto other = static_cast<const tNoiseModel&>(model);
         other.wanderPpb = wanderPpb;
         return theoreticalDesign(other).rmsNs;
     };
@@ -269,7 +269,7 @@ tServoParameters convertedDocument(const tTune& options, const tServoParameters&
     tServoParameters parameters = builtIn;
     options.controller->putInto(parameters);
     if (!options.given.noiseNs || !options.given.intervalNs) return parameters;
-    const tNoiseModel model = noiseModel(options);
+    const tNoiseEstimate model = noiseModel(options);
     parameters.snapTimeThreshold = snapThresholdFor(model);
     setSpikeFilter(parameters, model);
     return parameters;

@@ -133,9 +133,10 @@ std::string tSummary::warningText() const
         "TIME\n"
         "            --noise TIME; or design one: dravik-host tune TRACE\n";
     if (dryRun || pairs == 0) return "";
-    if (!firstLockNs)
+    if (!firstLockNs) {
         return fmt::format("WARNING     the clock was never locked\n{}",
                            locksMissed > 0 ? kAdvice : "");
+    }
     if (locksLost == 0) return "";
     return fmt::format(
         "WARNING     the lock did not hold: lost {}, {:.3g} % of the time without it\n{}",
