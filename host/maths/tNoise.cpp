@@ -1,32 +1,18 @@
 #include "maths/tNoise.h"
 
+#include "maths/sameBits.h"
+
 #include <cmath>
 
 namespace dravikHost {
 
 namespace {
 
-constexpr double kLn2 = 0.693147180559945309417;
-constexpr double kSqrtHalf = 0.707106781186547524401;
-
-// ln(m * 2^e) = e ln 2 + 2 atanh((m - 1)/(m + 1)), with m so near to 1 that the argument stays
-// below 0.172 and the terms up to the 19th power reach the last digit.
-double logarithm(double value)
-{
-    int exponent = 0;
-    double mantissa = std::frexp(value, &exponent);
-    if (mantissa < kSqrtHalf) {
-        mantissa *= 2;
-        --exponent;
-    }
-    const double z = (mantissa - 1) / (mantissa + 1);
-    double series = 0;
-    for (int power = 19; power > 0; power -= 2)
-        series = series * (z * z) + 1.0 / power;
-    return exponent * kLn2 + 2 * z * series;
-}
+constexpr uint64_t kFarApart = 0x9e3779b97f4a7c15;
 
 } // namespace
+
+tNoise::tNoise(uint64_t seed, uint64_t cause) : engine(seed + cause * kFarApart) {}
 
 double tNoise::uniform() { return static_cast<double>(engine() >> 11) * 0x1p-53; }
 
@@ -50,5 +36,7 @@ double tNoise::normal()
     hasSpare = true;
     return x * factor;
 }
+
+double tNoise::exponential() { return -logarithm(1 - uniform()); }
 
 } // namespace dravikHost

@@ -10,10 +10,12 @@ namespace dravikHost {
 class tNoise
 {
 public:
-    explicit tNoise(uint64_t seed) : engine(seed) {}
+    // Each cause has numbers of its own.
+    explicit tNoise(uint64_t seed, uint64_t cause = 0);
 
-    double uniform(); // 0 to below 1
-    double normal();  // mean 0, standard deviation 1
+    double uniform();     // 0 to below 1
+    double normal();      // mean 0, standard deviation 1
+    double exponential(); // mean 1, not negative
 
 private:
     std::mt19937_64 engine;
