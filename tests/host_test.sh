@@ -6,8 +6,10 @@ host=(${EMULATOR:+"$EMULATOR"} "$1/dravik-host") cc=$2
 root=$(cd "$(dirname "$0")/.." && pwd)
 include=$root/include
 scratch=$(mktemp -d)
-config=$scratch/config   # a name without a space, as rows are split into words
+config=$scratch/config   # names without a space, as rows are split into words
+scenarios=$scratch/scenarios
 ln -s "$root/config" "$config"
+ln -s "$root/examples/scenarios" "$scenarios"
 trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 source "$(dirname "$0")/support/expect.sh"
@@ -72,10 +74,16 @@ then in order       |2|'5s=b' does not come after|simulate --then 10s=a --then 5
 then not there      |1|^dravik-host: cannot read $scratch/none|simulate --then 10s=$scratch/none
 then refused        |1|err: refused with -52005: it is not JSON|simulate --then 10s=$scratch/err
 END
+for file in "$scenarios"/*.scenario; do
+    check "$file" 0 "^simulate: .* off, scenario $file, seed 1" simulate --scenario "$file" --duration 20s
+done
 check "never locked" 0 "^lock        never; missed 0 times$" simulate --frequency-error 600ppm
 expect "no RMS without a lock" 0 "$(grep -c RMS "$scratch/out")"
 
+echo "clok" > "$scratch/typo"
 table << END
+scenario beside it  |2|--noise: not with --scenario|simulate --scenario $scratch/typo --noise 1ns
+scenario misspelt   |1|typo:1: unknown statement 'clok'; did|simulate --scenario $scratch/typo
 unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 rate above 100 %    |2|--outlier-rate: '101%' is not within|simulate --outlier-rate 101%

@@ -63,6 +63,7 @@ dravik-host run --then |60s=
 dravik-host run --then 2min|2min=
 dravik-host run --then 60s=config/dravik_tr_ptp4l_t|config/dravik_tr_ptp4l_tab.json
 dravik-host run --duration c|
+dravik-host simulate --scenario examples/scenarios/qu|examples/scenarios/quiet.scenario
 dravik-host run --dry-run --csv CHANGE|CHANGELOG.md
 dravik-host show --reference-type |IEEE\ 802.1AS-2011\ TAB,IEEE\ 1588-2008\ BC
 dravik-host show --reference-type IEEE\ 1|IEEE\ 1588-2008\ BC

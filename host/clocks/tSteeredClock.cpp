@@ -41,16 +41,19 @@ void tSteeredClock::pass(int64_t trueNs, double phaseNoiseNs)
 }
 
 tSimulatedClock::tSimulatedClock(uint64_t startNs, const tOscillatorModel& model,
-                                 int32_t maxOffsetPpb, tNoise& noise)
-    : tSteeredClock(startNs, model.frequencyErrorPpb, maxOffsetPpb), model(model), noise(noise)
+                                 int32_t maxOffsetPpb, tNoise& noise, uint64_t seed)
+    : tSteeredClock(startNs, model.frequencyErrorPpb, maxOffsetPpb), model(model), noise(noise),
+      drift(seed)
 {}
 
 // White frequency noise adds up to a phase that walks; both walks grow with the root of the time.
-// Numbers are drawn at level 0 too, so that one option does not change the noise of another.
+// Numbers are drawn at level 0 too, so that one option does not change the noise of another. Drift
+// is so small that what the ordered offset makes of it is left out.
 void tSimulatedClock::advance(int64_t trueNs)
 {
     const double rootSeconds = std::sqrt(secondsOf(trueNs));
-    pass(trueNs, model.frequencyNoisePpb * rootSeconds * noise.normal()); // ppb * s is ns
+    const double driftedNs = drift.nextPpb(model.drift, trueNs) * secondsOf(trueNs); // ppb * s
+    pass(trueNs, model.frequencyNoisePpb * rootSeconds * noise.normal() + driftedNs);
     frequencyError += model.frequencyWanderPpb * 1e-9 * rootSeconds * noise.normal();
 }
 

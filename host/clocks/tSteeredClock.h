@@ -1,6 +1,7 @@
 #pragma once
 
 #include "clocks/iClock.h"
+#include "clocks/tDrift.h"
 #include "maths/tNoise.h"
 
 namespace dravikHost {
@@ -38,21 +39,27 @@ struct tOscillatorModel {
     double frequencyErrorPpb = 0;  // at the start; positive is fast
     double frequencyNoisePpb = 0;  // white: Allan deviation at 1 s
     double frequencyWanderPpb = 0; // random walk: standard deviation after 1 s
+    tDriftModel drift{};
 };
 
 // A clock on a modelled oscillator. Its time passes only in advance().
 class tSimulatedClock : public tSteeredClock
 {
 public:
-    // The noise is borrowed.
+    // The noise is borrowed; that of the drift has the seed.
     tSimulatedClock(uint64_t startNs, const tOscillatorModel& model, int32_t maxOffsetPpb,
-                    tNoise& noise);
+                    tNoise& noise, uint64_t seed = 0);
 
     void advance(int64_t trueNs);
+
+    // From here on; the frequency goes on from where it is.
+    void become(const tOscillatorModel& next) { model = next; }
+    void changeFrequency(double byPpb) { frequencyError += byPpb * 1e-9; }
 
 private:
     tOscillatorModel model;
     tNoise& noise;
+    tDrift drift;
 };
 
 // A clock whose oscillator behaves as a recorded one did: its own error is given for each stretch

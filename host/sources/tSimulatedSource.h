@@ -1,39 +1,42 @@
 #pragma once
 
-#include "clocks/tSteeredClock.h"
-#include "maths/tNoise.h"
+#include "maths/tFlicker.h"
 #include "sources/iPairSource.h"
+#include "sources/tScenario.h"
 
 namespace dravikHost {
 
-struct tMeasurementModel {
-    int64_t intervalNs = 0;
-    int64_t durationNs = 0;
-    double noiseNs = 0;         // white, standard deviation
-    double outlierRate = 0;     // 0 to 1
-    double outlierSizeNs = 0;   // added with either sign
-    uint64_t granularityNs = 1; // of both timestamps
-};
-
-// What one measurement is off by, in ns.
+// What one measurement is off by, in ns, of noise and outliers of either sign.
 double measurementErrorNs(const tMeasurementModel& model, tNoise& noise);
 
-// Pairs in simulated time: a perfect reference, seen through noise, and the simulated clock.
+// Pairs in simulated time: a reference, seen through noise, and the simulated clock. A phase of the
+// scenario begins with the first pair that is not before it.
 class tSimulatedSource : public iPairSource
 {
 public:
     static constexpr uint64_t kStartNs = 1'700'000'000'000'000'000;
 
-    // Clock and noise are borrowed; the clock is moved on from pair to pair.
-    tSimulatedSource(tSimulatedClock& clock, const tMeasurementModel& model, tNoise& noise);
+    // Clock and noise are borrowed; the clock, which is as the first phase says, is moved on from
+    // pair to pair. What comes beside that noise has the seed.
+    tSimulatedSource(tSimulatedClock& clock, tScenario scenario, tNoise& noise, uint64_t seed = 0);
 
     std::optional<tPair> next() override;
 
 private:
+    void enterPhases();
+    tPair measure();
+    double delayNs();
+    bool comes();
+
     tSimulatedClock& clock;
-    tMeasurementModel model;
+    tScenario scenario;
+    tPhase now;
+    size_t entered = 1; // phases so far
     tNoise& noise;
-    int64_t elapsedNs; // of the pair given last
+    tNoise chances, delays, misses;
+    tFlicker flicker;
+    int64_t elapsedNs; // of the latest pair
+    int64_t jumpedNs = 0;
 };
 
 } // namespace dravikHost

@@ -2,6 +2,7 @@
 
 #include "loop/tDiscipline.h"
 #include "sources/tSimulatedSource.h"
+#include "text/files.h"
 #include "verbs/shared.h"
 
 #include <fmt/format.h>
@@ -9,6 +10,7 @@
 #include <charconv>
 #include <memory>
 #include <stdexcept>
+#include <string>
 
 namespace dravikHost {
 
@@ -18,8 +20,15 @@ struct tSimulation : tDisciplineOptions {
     tInitialError initialError;
     tOscillatorModel oscillator;
     tMeasurementModel measurement;
+    std::string scenario; // file; "": none
+    bool intervalGiven = false;
     uint64_t seed = 1;
 };
+
+// What a scenario says itself.
+constexpr const char* kModelOptions[] = {"--initial-offset",  "--frequency-error", "--noise",
+                                         "--outlier-rate",    "--outlier-size",    "--granularity",
+                                         "--frequency-noise", "--frequency-wander"};
 
 void addMeasurementOptions(tOptionSet& options, tMeasurementModel& model)
 {
@@ -55,18 +64,47 @@ uint64_t parseSeed(const std::string& text)
     return seed;
 }
 
+void checkScenario(const tOptionSet& options, tSimulation& simulation)
+{
+    if (simulation.scenario.empty()) return;
+    for (const char* const name : kModelOptions) {
+        if (options.given(name))
+            throw std::invalid_argument(
+                fmt::format("{}: not with --scenario, whose file says what is simulated", name));
+    }
+    const tTuning& tuning = simulation.tuning;
+    if (simulation.scenario == "-" && (tuning.metaDataFile == "-" || tuning.configFile == "-"))
+        throw std::invalid_argument("--scenario: the standard input is taken already");
+    simulation.intervalGiven = options.given("--interval");
+}
+
+tScenario scenarioOf(const tSimulation& options)
+{
+    tScenarioStart start;
+    start.keepsInterval = options.intervalGiven;
+    start.phase.oscillator = options.oscillator;
+    start.phase.measurement = options.measurement;
+    start.phase.stepNs = options.initialError.offsetNs;
+    start.phase.frequencyPpb = options.initialError.frequencyPpb;
+    if (options.scenario.empty()) return {start.phase};
+    return parseScenario(readText(options.scenario), options.scenario, start);
+}
+
 void run(const tSimulation& options)
 {
     const tServoLibrary library(tServoLibrary::find(options.library));
-    tOscillatorModel oscillator = options.oscillator;
-    oscillator.frequencyErrorPpb = options.initialError.frequencyPpb;
+    const tScenario scenario = scenarioOf(options);
+    const tPhase& first = scenario.front();
+    tOscillatorModel oscillator = first.oscillator;
+    oscillator.frequencyErrorPpb = first.frequencyPpb;
     tNoise noise(options.seed);
-    tSimulatedClock clock(tSimulatedSource::kStartNs +
-                              static_cast<uint64_t>(options.initialError.offsetNs),
-                          oscillator, options.maxFrequencyOffsetPpb, noise);
-    tSimulatedSource source(clock, options.measurement, noise);
+    tSimulatedClock clock(tSimulatedSource::kStartNs + static_cast<uint64_t>(first.stepNs),
+                          oscillator, options.maxFrequencyOffsetPpb, noise, options.seed);
+    tSimulatedSource source(clock, scenario, noise, options.seed);
+    const std::string file = options.scenario.empty() ? "" : ", scenario " + options.scenario;
     runInMadeTime(library, clock, source,
-                  fmt::format("simulate: clock {}, seed {}; {}", options.initialError.text(),
+                  fmt::format("simulate: clock {}{}, seed {}; {}",
+                              tInitialError{first.stepNs, first.frequencyPpb}.text(), file,
                               options.seed, library.path),
                   options);
 }
@@ -84,7 +122,12 @@ std::function<void()> addSimulate(tOptionSet& options)
         "--seed", "NUMBER",
         [simulation](const std::string& text) { simulation->seed = parseSeed(text); },
         "Same seed, same bytes of output", std::to_string(simulation->seed));
-    options.finally([simulation] { requireOneInput(simulation->tuning); });
+    options.text("--scenario", "FILE", simulation->scenario,
+                 "What is simulated, and changes on the way");
+    options.finally([simulation, options] {
+        requireOneInput(simulation->tuning);
+        checkScenario(options, *simulation);
+    });
     return [simulation] { run(*simulation); };
 }
 
