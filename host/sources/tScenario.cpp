@@ -119,12 +119,12 @@ public:
         if (word == "at") {
             enter(within("at", kDuration, needWord(rest, "a time"), 1, kFiftyYearsNs));
             happen(needWord(rest, "what happens"), rest);
-        } else {
-            if (phases.size() > 1) refuse("comes after statements with a time");
-            if (!change(word, rest))
-                refuse(fmt::format("unknown statement '{}'{}", word,
-                                   didYouMean(word, {"clock", "reference", "at"})));
+            return;
         }
+        if (phases.size() > 1) refuse("comes after statements with a time");
+        if (change(word, rest)) return;
+        refuse(fmt::format("unknown statement '{}'{}", word,
+                           didYouMean(word, {"clock", "reference", "at"})));
     }
 
     tScenario done() { return std::move(phases); }

@@ -68,9 +68,9 @@ void checkScenario(const tOptionSet& options, tSimulation& simulation)
 {
     if (simulation.scenario.empty()) return;
     for (const char* const name : kModelOptions) {
-        if (options.given(name))
-            throw std::invalid_argument(
-                fmt::format("{}: not with --scenario, whose file says what is simulated", name));
+        if (!options.given(name)) continue;
+        throw std::invalid_argument(
+            fmt::format("{}: not with --scenario, whose file says what is simulated", name));
     }
     const tTuning& tuning = simulation.tuning;
     if (simulation.scenario == "-" && (tuning.metaDataFile == "-" || tuning.configFile == "-"))
