@@ -53,7 +53,8 @@ struct clock* clockOfId(clockid_t id)
 static int64_t readingOf(clockid_t id, struct clock* clock)
 {
     const int64_t hourNs = 3600LL * kSecondNs;
-    if (id < 0) return timeOf(clock) + measurementErrorNs(&clock->reading);
+    if (id < 0)
+        return cutStamp(&clock->reading, timeOf(clock) + measurementErrorNs(&clock->reading));
     if (id == CLOCK_MONOTONIC_RAW) return hourNs + clock->raw.wholeNs;
     if (id == CLOCK_REALTIME || id == CLOCK_REALTIME_COARSE || id == CLOCK_REALTIME_ALARM)
         return timeOf(clock);

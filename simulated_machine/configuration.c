@@ -8,9 +8,11 @@
 #include <sys/timex.h>
 #include <unistd.h>
 
+static char where[300]; /* "FILE:LINE: " of the statement being read */
+
 _Noreturn void giveUp(const char* what, const char* which)
 {
-    (void)fprintf(stderr, "simulated machine: %s: %s\n", what, which);
+    (void)fprintf(stderr, "simulated machine: %s%s: %s\n", where, what, which);
     _exit(99);
 }
 
@@ -21,13 +23,13 @@ void* nextFunction(const char* name)
     return found;
 }
 
-static double quantityIn(const char* text)
+double quantityIn(const char* text)
 {
     static const struct {
         const char* name;
         double factor;
-    } units[] = {{"", 1},    {"ns", 1},  {"us", 1e3}, {"ms", 1e6},
-                 {"s", 1e9}, {"ppb", 1}, {"ppm", 1e3}};
+    } units[] = {{"", 1},       {"ns", 1},     {"us", 1e3}, {"ms", 1e6},  {"s", 1e9},
+                 {"min", 60e9}, {"h", 3600e9}, {"ppb", 1},  {"ppm", 1e3}, {"%", 0.01}};
     char* end = NULL;
     const double number = strtod(text, &end);
     for (size_t i = 0; end != text && i < sizeof units / sizeof *units; ++i)
@@ -73,6 +75,7 @@ static const struct key kOfClock[] = {
     {"frequency", kNumber, offsetof(struct clock, frequencyPpb), 0},
     {"white", kNumber, offsetof(struct clock, whitePpb), 0},
     {"wander", kNumber, offsetof(struct clock, wanderPpb), 0},
+    {"flicker", kNumber, offsetof(struct clock, flickerPpb), 0},
     {"sine", kNumber, offsetof(struct clock, sinePpb), 0},
     {"period", kNumber, offsetof(struct clock, periodNs), 0},
     {"ramp", kNumber, offsetof(struct clock, rampPpb), 0},
@@ -100,7 +103,12 @@ static const struct key kOfProducer[] = {
 static const struct key kOfMeasurement[] = {
     {"noise", kNumber, offsetof(struct measurement, deviationNs), 0},
     {"outliers", kNumber, offsetof(struct measurement, outlierShare), 0},
+    {"delayed", kNumber, offsetof(struct measurement, delayedShare), 0},
     {"size", kNumber, offsetof(struct measurement, outlierNs), 0},
+    {"delay", kNumber, offsetof(struct measurement, delayNs), 0},
+    {"flicker", kNumber, offsetof(struct measurement, flickerNs), 0},
+    {"granularity", kNumber, offsetof(struct measurement, granularityNs), 0},
+    {"missing", kNumber, offsetof(struct measurement, missingShare), 0},
     {"errors", kFile, offsetof(struct measurement, errorsNs), 0},
     {NULL, kNumber, 0, 0},
 };
@@ -115,6 +123,16 @@ static int set(void* record, const struct key* keys, const char* name, const cha
     if (keys->kind == kFile) *(struct series*)(void*)place = seriesIn(value);
     if (keys->kind == kLetters) (void)snprintf(place, keys->size, "%s", value);
     return 1;
+}
+
+int setClock(struct clock* clock, const char* name, const char* value)
+{
+    return set(clock, kOfClock, name, value);
+}
+
+int setReading(struct measurement* reading, const char* name, const char* value)
+{
+    return set(reading, kOfMeasurement, name, value);
 }
 
 /* KEY=VALUE... of a record and of the errors of its readings. */
@@ -208,10 +226,30 @@ static void take(struct machine* made, char* statement)
             if (!made->trace) giveUp("cannot write", name);
             (void)fputs("elapsed_s,clock,error_ns,ordered_ppb,event\n", made->trace);
             setAll(&rest, made, kOfMachine, NULL);
+        } else if (strcmp(word, "scenario") == 0) {
+            addScenario(made, name, &rest);
         } else if (!set(made, kOfMachine, word, name)) {
             giveUp("unknown", word);
         }
     }
+}
+
+/* A scenario is read in the midst of the machine's statements. */
+void readStatements(struct machine* made, const char* path,
+                    void take(struct machine* made, char* statement))
+{
+    FILE* const file = fopen(path, "re");
+    if (!file) giveUp("cannot read", path);
+    char before[sizeof where];
+    char line[512];
+    memcpy(before, where, sizeof where);
+    for (int number = 1; fgets(line, sizeof line, file); ++number) {
+        line[strcspn(line, "\n")] = 0;
+        (void)snprintf(where, sizeof where, "%.250s:%d: ", path, number);
+        take(made, line);
+    }
+    memcpy(where, before, sizeof where);
+    (void)fclose(file);
 }
 
 static struct noise seeded(const struct machine* made, int cause)
@@ -220,6 +258,15 @@ static struct noise seeded(const struct machine* made, int cause)
     (void)uniform(&noise);
     noise.state ^= (uint64_t)(uniform(&noise) * 0x1p63); /* far from its neighbours */
     return noise;
+}
+
+static void seedReading(const struct machine* made, struct measurement* reading, int cause)
+{
+    reading->noise = seeded(made, cause);
+    reading->chances = seeded(made, cause + 100);
+    reading->delays = seeded(made, cause + 200);
+    reading->misses = seeded(made, cause + 300);
+    reading->flicker.noise = seeded(made, cause + 400);
 }
 
 /* A loader that cannot load this library goes on without it. Who must not do so looks for
@@ -244,22 +291,17 @@ void configure(struct machine* made)
     char* rest = nothing;
     addClock(made, "system", &rest);
     const char* const path = getenv("SIMULATED_MACHINE");
-    FILE* const file = fopen(path ? path : "", "re");
-    if (!file) giveUp("SIMULATED_MACHINE is not a file", path ? path : "");
-    char line[512];
-    while (fgets(line, sizeof line, file)) {
-        line[strcspn(line, "\n")] = 0;
-        take(made, line);
-    }
-    (void)fclose(file);
+    if (!path) giveUp("SIMULATED_MACHINE", "not set");
+    readStatements(made, path, take);
     leaveSign(path);
     for (int i = 0; i < made->clockCount; ++i) {
         struct clock* const clock = &made->clocks[i];
         clock->steppedNs = (int64_t)clock->offsetNs;
         clock->white = seeded(made, 10 * i + 1);
         clock->walk = seeded(made, 10 * i + 2);
-        clock->reading.noise = seeded(made, 10 * i + 3);
+        clock->flicker.noise = seeded(made, 10 * i + 5);
+        seedReading(made, &clock->reading, 10 * i + 3);
     }
     for (int i = 0; i < made->producerCount; ++i)
-        made->producers[i].reading.noise = seeded(made, 10 * i + 4);
+        seedReading(made, &made->producers[i].reading, 10 * i + 4);
 }

@@ -6,7 +6,7 @@
  *
  * SIMULATED_MACHINE names a file of statements, one a line; # begins a comment. Beside it a file
  * with .loaded at the end of its name shows that the library was loaded indeed. Times have a unit
- * of ns, us, ms, s, frequencies one of ppb, ppm.
+ * of ns, us, ms, s, min, h, frequencies one of ppb, ppm, shares may have %.
  *   seed N                 of all noise
  *   start T                true time at the start
  *   tai N                  seconds between TAI and UTC
@@ -22,7 +22,8 @@
  *     offset= frequency=   at the start, against true time
  *     max=                 the largest order
  *     white= wander=       noise of the frequency: deviation over 1 s, of its walk in 1 s
- *     sine= period= ramp=  ppb, time, ppb each second
+ *     flicker=             as Allan deviation, the same over all times
+ *     sine= period= ramp=  ppb to either side, upwards first; time; ppb each second
  *     file=FILE            ppb, a line for each second
  *     status=              system: bits of the kernel's clock at the start (64: not synchronised)
  *     delay=               ptp: of a reading
@@ -43,8 +44,20 @@
  *
  * Clocks of PTP, segments and sockets also take what their readings have of errors:
  *     noise=               deviation
- *     outliers= size=      share of outliers, and their size
+ *     outliers= delayed=   share of outliers of both signs, and of those that are late
+ *     size=                of both
  *     errors=FILE          ns, a line each
+ *     granularity=         of their stamps
+ *     missing=             share that does not come; readings of a PTP clock fail
+ *     delay= flicker=      mean of an exponential delay, which shows the reader ahead; TDEV, the same
+ *                          over all times; of a PTP clock these two come from a scenario only
+ *
+ *   scenario FILE CLOCK SOURCE
+ *                          a file as dravik-host simulate takes it, for one clock (system or a PATH)
+ *                          and one source (UNIT or PATH) of those above it: values at the start, and
+ *                          what happens later. interval= is for segments and sockets. It has not the
+ *                          same random numbers there and here, but the same statistics. After a jump
+ *                          errors in traces count against where the source is.
  *
  *   at T signal HUP|INT|TERM
  *   at T run SHELL COMMAND
@@ -71,8 +84,19 @@ struct noise {
     double spare;
     int hasSpare;
 };
-double uniform(struct noise* noise); /* 0 to below 1 */
-double normal(struct noise* noise);  /* mean 0, deviation 1 */
+double uniform(struct noise* noise);     /* 0 to below 1 */
+double normal(struct noise* noise);      /* mean 0, deviation 1 */
+double exponential(struct noise* noise); /* mean 1 */
+double sineOfTurns(double turns);
+
+/* Walks that are drawn back to 0, each four times as slowly as the one before. */
+enum { kStages = 12 };
+struct flicker {
+    struct noise noise;
+    double stages[kStages];
+};
+double flickerOfAllan(struct flicker* flicker, double ppb); /* of frequencies: the deviation */
+double flickerOfTime(struct flicker* flicker, double ns);   /* of times: TDEV */
 
 struct series {
     double* values;
@@ -80,12 +104,16 @@ struct series {
 };
 
 struct measurement {
-    double deviationNs, outlierShare, outlierNs;
+    double deviationNs, outlierShare, delayedShare, outlierNs, delayNs, flickerNs, granularityNs,
+        missingShare;
     struct series errorsNs;
     size_t next;
-    struct noise noise;
+    struct noise noise, chances, delays, misses;
+    struct flicker flicker;
 };
 int64_t measurementErrorNs(struct measurement* model);
+int64_t cutStamp(const struct measurement* model, int64_t ns); /* to the granularity */
+int isMissing(struct measurement* model);
 
 struct phase {
     int64_t wholeNs;
@@ -96,13 +124,16 @@ struct clock {
     char name[108];
     struct phase raw, steered; /* since the start; a step moves neither */
     int64_t steppedNs;         /* with the offset at the start */
-    double offsetNs, frequencyPpb, whitePpb, wanderPpb, sinePpb, periodNs, rampPpb, maxPpb;
+    double offsetNs, frequencyPpb, whitePpb, wanderPpb, sinePpb, periodNs, rampPpb, maxPpb,
+        flickerPpb;
     struct series filePpb;
     double delayNs, status;
     char quirks[8];
     struct measurement reading;
     struct noise white, walk;
-    double walkedPpb, ownPpb; /* ownPpb: of the oscillator, in this stretch of the grid */
+    struct flicker flicker;
+    double walkedPpb, rampedPpb, turns; /* turns: of the sinusoid */
+    double ownPpb;                      /* of the oscillator, in this stretch of the grid */
     double orderedPpb;
     int silent, file;
 };
@@ -118,7 +149,7 @@ struct producer {
     unsigned char* segment;
 };
 
-enum verb { kSignal, kRun, kStep, kFrequency, kSilence, kResume };
+enum verb { kSignal, kRun, kStep, kFrequency, kSilence, kResume, kJump, kClock, kReference };
 struct event {
     int64_t atNs;
     enum verb verb;
@@ -126,7 +157,14 @@ struct event {
     double value;
 };
 
-enum { kClocks = 4, kProducers = 4, kEvents = 32 };
+enum { kClocks = 4, kProducers = 4, kEvents = 64 };
+struct scenario {
+    struct clock* clock; /* NULL: there is no scenario */
+    char source[108];    /* its name; one of the next two is NULL */
+    struct clock* device;
+    struct producer* producer;
+    int64_t lastNs; /* of its events */
+};
 struct machine {
     double seed, startNs, taiS, gridNs, readingNs, wakeNs, paceNs;
     int emulated, signalled;
@@ -134,6 +172,8 @@ struct machine {
     int64_t elapsedNs, slotEndNs, nextTraceNs; /* true time since the start */
     struct clock clocks[kClocks];              /* the first is the machine's */
     struct producer producers[kProducers];
+    struct scenario scenario;
+    int64_t jumpedNs;             /* of its reference */
     struct event events[kEvents]; /* one that is over has the verb kept and atNs at INT64_MAX */
     int clockCount, producerCount, eventCount;
 };
@@ -141,6 +181,14 @@ struct machine {
 struct machine* machine(void); /* configured on first use */
 _Noreturn void giveUp(const char* what, const char* which);
 void configure(struct machine* made);
+void readStatements(struct machine* made, const char* path,
+                    void take(struct machine* made, char* statement));
+double quantityIn(const char* text);
+int setClock(struct clock* clock, const char* name, const char* value); /* 0: no such name */
+int setReading(struct measurement* reading, const char* name, const char* value);
+
+void addScenario(struct machine* made, const char* path, char** rest);
+void playScenario(struct machine* made, struct event* event); /* kClock, kReference */
 void lockUp(int emulated); /* no clock of the real machine can be set from here on */
 
 int64_t trueNs(void);

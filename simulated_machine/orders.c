@@ -183,7 +183,7 @@ int stime(const time_t* time)
 
 static struct ptp_clock_time timeFor(const struct clock* clock, int64_t errorNs)
 {
-    const int64_t ns = timeOf(clock) + errorNs;
+    const int64_t ns = cutStamp(&clock->reading, timeOf(clock) + errorNs);
     return (struct ptp_clock_time){ns / kSecondNs, (uint32_t)(ns % kSecondNs), 0};
 }
 
@@ -209,6 +209,7 @@ static int answerPtp(struct clock* clock, unsigned long request, void* argument)
         ((struct ptp_clock_caps*)argument)->max_adj = (int)clock->maxPpb;
         return 0;
     }
+    if (isMissing(&clock->reading)) return fail(EIO);
     if (odd(clock, 'b') && number != _IOC_NR(PTP_SYS_OFFSET) && number != _IOC_NR(PTP_SYS_OFFSET2))
         return fail(EOPNOTSUPP);
     if (number == _IOC_NR(PTP_SYS_OFFSET_PRECISE) || number == _IOC_NR(PTP_SYS_OFFSET_PRECISE2)) {

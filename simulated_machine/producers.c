@@ -111,10 +111,11 @@ static int sendSample(struct producer* producer, int64_t systemNs, int64_t refer
 /* Nothing is produced for a program that is not there yet. A datagram has microseconds only. */
 void produce(struct producer* producer)
 {
-    if (producer->produced >= producer->count) return;
-    int64_t systemNs = timeOf(&machine()->clocks[0]);
-    int64_t referenceNs = trueNs() + (int64_t)producer->offsetNs + producer->steppedNs +
-                          measurementErrorNs(&producer->reading);
+    struct measurement* const reading = &producer->reading;
+    if (producer->produced >= producer->count || isMissing(reading)) return;
+    int64_t systemNs = cutStamp(reading, timeOf(&machine()->clocks[0]));
+    int64_t referenceNs = trueNs() + (int64_t)producer->offsetNs + producer->steppedNs;
+    referenceNs = cutStamp(reading, referenceNs + measurementErrorNs(reading));
     const int64_t agoNs = isNext(producer, "old") ? kHourNs : 0;
     if (producer->unit < 0) {
         referenceNs -= systemNs % 1000;

@@ -32,7 +32,7 @@ void traceClock(const struct clock* clock, const char* event)
 {
     const struct machine* const now = machine();
     if (!now->trace) return;
-    const int64_t errorNs = timeOf(clock) - trueNs();
+    const int64_t errorNs = timeOf(clock) - trueNs() - now->jumpedNs;
     (void)fprintf(now->trace, "%.9f,%s,%.3f,%.3f,%s\n", (double)now->elapsedNs * 1e-9, clock->name,
                   (double)errorNs + clock->steered.fractionNs, clock->orderedPpb, event);
     (void)fflush(now->trace);
@@ -43,11 +43,13 @@ static void beginStretch(struct clock* clock)
     const struct machine* const now = machine();
     const double seconds = (double)now->elapsedNs * 1e-9;
     const double rootSeconds = sqrt(now->gridNs * 1e-9);
-    clock->ownPpb = clock->frequencyPpb + clock->walkedPpb + clock->rampPpb * seconds +
-                    clock->whitePpb / rootSeconds * normal(&clock->white);
+    clock->ownPpb = clock->frequencyPpb + clock->walkedPpb + clock->rampedPpb +
+                    clock->whitePpb / rootSeconds * normal(&clock->white) +
+                    flickerOfAllan(&clock->flicker, clock->flickerPpb) +
+                    clock->sinePpb * sineOfTurns(clock->turns);
     clock->walkedPpb += clock->wanderPpb * rootSeconds * normal(&clock->walk);
-    if (clock->periodNs > 0)
-        clock->ownPpb += clock->sinePpb * sin(6.283185307179586 * seconds * 1e9 / clock->periodNs);
+    clock->rampedPpb += clock->rampPpb * now->gridNs * 1e-9;
+    if (clock->periodNs > 0) clock->turns += now->gridNs / clock->periodNs;
     if (clock->filePpb.count > 0) {
         const size_t at = (size_t)seconds;
         const size_t last = clock->filePpb.count - 1;
@@ -83,7 +85,7 @@ static void pass(int64_t untilNs)
     }
 }
 
-static void happen(const struct event* event)
+static void happen(struct event* event)
 {
     static const int signals[] = {SIGHUP, SIGINT, SIGTERM};
     struct machine* const now = machine();
@@ -96,19 +98,26 @@ static void happen(const struct event* event)
         if (system(event->text) != 0) giveUp("a command failed", event->text); /* NOLINT: wanted */
         return;
     }
+    if (event->verb == kClock || event->verb == kReference) {
+        playScenario(now, event);
+        return;
+    }
+    if (event->verb == kJump) now->jumpedNs += (int64_t)event->value;
+    const int isStep = event->verb == kStep || event->verb == kJump;
+    const int isSilence = event->verb == kSilence || event->verb == kResume;
     for (int i = 0; i < now->clockCount; ++i) {
         struct clock* const clock = &now->clocks[i];
         if (strcmp(event->text, clock->name) != 0) continue;
-        if (event->verb == kStep) clock->steppedNs += (int64_t)event->value;
+        if (isStep) clock->steppedNs += (int64_t)event->value;
         if (event->verb == kFrequency) clock->frequencyPpb += event->value;
-        if (event->verb >= kSilence) clock->silent = event->verb == kSilence;
+        if (isSilence) clock->silent = event->verb == kSilence;
         traceClock(clock, "event");
     }
     for (int i = 0; i < now->producerCount; ++i) {
         struct producer* const producer = &now->producers[i];
         if (strcmp(event->text, producer->path) != 0) continue;
-        if (event->verb == kStep) producer->steppedNs += (int64_t)event->value;
-        if (event->verb >= kSilence) producer->silent = event->verb == kSilence;
+        if (isStep) producer->steppedNs += (int64_t)event->value;
+        if (isSilence) producer->silent = event->verb == kSilence;
     }
 }
 
