@@ -90,6 +90,7 @@ TEST(Scenario, doesWhatItsStatementsSay)
         {"reference delayed=10% size=1us", bias, 100, 15},
         {"reference delay=100ns", bias, 100, 5},
         {"reference delay=100ns", early, 100, 7},
+        {"reference delay=100ns delayed=10% size=1us", early, 316, 15}, // by chances of their own
         {"reference flicker=100ns", tdev8, 100, 8},
         {"reference missing=25%", count, 3000, 80},
         {"at 1000s reference interval=500ms", count, 7000, 0},
@@ -98,6 +99,7 @@ TEST(Scenario, doesWhatItsStatementsSay)
         {"at 500s jump 10us", at500, -10'000, 1e-6},
         {"at 500s jump 10us", bias, 0, 1e-6},
         {"clock offset=1us\nat 500s clock offset=2us", at1000, 3000, 1e-6},
+        {"clock offset=1us frequency=10ppb\nat 500s jump 10us\nat 600s resume", at1000, 1000, 1e-3},
         {"clock frequency=100ppb\nat 500s clock frequency=-50ppb", at1000, 75'000, 1e-3},
         {"at 500s clock ramp=1ppb\nat 600s clock ramp=0", at1000, 45'000, 1e-3},
         {"clock sine=50ppb period=1000s", at500, 50'000 / 3.14159265, 1e-3},
