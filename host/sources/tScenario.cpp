@@ -12,11 +12,12 @@ namespace dravikHost {
 
 namespace {
 
-// The bounds are those of the options of the same meaning.
+// The bounds are those of the options of the same meaning; all keep times within 64 bits.
 constexpr double kFiftyYearsNs = 438300 * 3600e9;
 constexpr double kDayNs = 24 * 3600e9;
 constexpr double kTenthPpb = 1e8; // of a clock's rate
 constexpr double kMostNoisePpb = 1e6;
+constexpr double kMostRampPpb = 1000; // each second
 
 struct tKey {
     const char* name;
@@ -42,7 +43,7 @@ const std::vector<tKey> kOfClock = {
      [](tPhase& phase, double ppb) { phase.oscillator.drift.sinePpb = ppb; }},
     {"period", kDuration, 1, kFiftyYearsNs,
      [](tPhase& phase, double ns) { phase.oscillator.drift.sinePeriodNs = whole(ns); }},
-    {"ramp", kFrequency, -kMostNoisePpb, kMostNoisePpb,
+    {"ramp", kFrequency, -kMostRampPpb, kMostRampPpb,
      [](tPhase& phase, double ppb) { phase.oscillator.drift.rampPpb = ppb; }},
 };
 
@@ -146,8 +147,8 @@ private:
         tPhase& now = phases.back();
         if (change(word, rest)) return;
         if (word == "jump") {
-            now.jumpNs = whole(
-                within("jump", kDuration, needWord(rest, "a time"), -kFiftyYearsNs, kFiftyYearsNs));
+            now.jumpNs =
+                whole(within("jump", kDuration, needWord(rest, "a time"), -kDayNs, kDayNs));
         } else if (word == "silence" || word == "resume") {
             now.silent = word == "silence";
         } else {
