@@ -14,9 +14,10 @@ public:
     virtual uint64_t timeNs() = 0;
     virtual void step(int64_t deltaNs) = 0;
 
-    // Offset of the rate from nominal that is in force, and what it may be set to.
-    virtual int32_t offsetPpb() = 0;
-    virtual void setOffsetPpb(int32_t offsetPpb) = 0;
+    // Offset of the rate from nominal that is in force, and what it may be set to. A clock may
+    // round what it is given, and then tells what it took.
+    virtual double offsetPpb() = 0;
+    virtual void setOffsetPpb(double offsetPpb) = 0;
     virtual int32_t maxOffsetPpb() = 0;
     virtual int32_t minOffsetPpb() = 0;
 };

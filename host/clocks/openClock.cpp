@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <cerrno>
+#include <cmath>
 #include <limits>
 #include <system_error>
 
@@ -15,12 +16,16 @@ namespace dravikHost {
 
 namespace {
 
+int32_t wholePpb(long kernelFrequency)
+{
+    return static_cast<int32_t>(std::lround(ppbOfKernelFrequency(kernelFrequency)));
+}
+
 // What the kernel's own numbers can say: a long may have 32 bits.
 int32_t withinKernel(double limitPpb)
 {
-    const int32_t widestPpb = sizeof(long) > 4
-                                  ? std::numeric_limits<int32_t>::max()
-                                  : ppbOfKernelFrequency(std::numeric_limits<int32_t>::max()) - 1;
+    const int32_t widestPpb = sizeof(long) > 4 ? std::numeric_limits<int32_t>::max()
+                                               : wholePpb(std::numeric_limits<int32_t>::max()) - 1;
     return static_cast<int32_t>(std::min<double>(limitPpb, widestPpb));
 }
 
@@ -43,7 +48,7 @@ std::unique_ptr<tKernelClock> openRealtime(int32_t limitPpb)
     timex state{};
     if (clock_adjtime(CLOCK_REALTIME, &state) < 0)
         throw std::system_error(errno, std::generic_category(), "cannot read CLOCK_REALTIME");
-    const int32_t narrower = std::min(limitPpb, ppbOfKernelFrequency(state.tolerance));
+    const int32_t narrower = std::min(limitPpb, wholePpb(state.tolerance));
     return std::make_unique<tKernelClock>(CLOCK_REALTIME, "CLOCK_REALTIME", narrower,
                                           readSystemItself);
 }

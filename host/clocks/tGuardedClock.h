@@ -22,8 +22,8 @@ public:
         guard(deltaNs);
         if (!dryRun) clock.step(deltaNs);
     }
-    int32_t offsetPpb() override { return clock.offsetPpb(); }
-    void setOffsetPpb(int32_t offsetPpb) override
+    double offsetPpb() override { return clock.offsetPpb(); }
+    void setOffsetPpb(double offsetPpb) override
     {
         if (!dryRun) clock.setOffsetPpb(offsetPpb);
     }

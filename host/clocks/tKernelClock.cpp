@@ -28,11 +28,11 @@ time_t secondsOf(int64_t whole)
 
 } // namespace
 
-long kernelFrequency(int32_t offsetPpb) { return std::lround(offsetPpb * kKernelUnitsPerPpb); }
+long kernelFrequency(double offsetPpb) { return std::lround(offsetPpb * kKernelUnitsPerPpb); }
 
-int32_t ppbOfKernelFrequency(long frequency)
+double ppbOfKernelFrequency(long frequency)
 {
-    return static_cast<int32_t>(std::lround(static_cast<double>(frequency) / kKernelUnitsPerPpb));
+    return static_cast<double>(frequency) / kKernelUnitsPerPpb;
 }
 
 tKernelClock::tKernelClock(clockid_t id, std::string name, int32_t limitPpb,
@@ -61,19 +61,19 @@ void tKernelClock::step(int64_t deltaNs)
     adjust(request, "step");
 }
 
-int32_t tKernelClock::offsetPpb() { return ppbOfKernelFrequency(adjust({}, "read").freq); }
+double tKernelClock::offsetPpb() { return ppbOfKernelFrequency(adjust({}, "read").freq); }
 
 // Beyond its limits one clock refuses and another one takes the limit without a word.
-void tKernelClock::setOffsetPpb(int32_t offsetPpb)
+void tKernelClock::setOffsetPpb(double offsetPpb)
 {
     timex request{};
     request.modes = ADJ_FREQUENCY;
     request.freq = kernelFrequency(offsetPpb);
     adjust(request, "set the frequency of");
-    const int32_t inForcePpb = this->offsetPpb();
-    if (inForcePpb == offsetPpb) return;
-    throw std::out_of_range(
-        fmt::format("{} took an offset of {} ppb for {} ppb", name, inForcePpb, offsetPpb));
+    const long inForce = adjust({}, "read").freq;
+    if (inForce == request.freq) return;
+    throw std::out_of_range(fmt::format("{} took an offset of {:.10g} ppb for {:.10g} ppb", name,
+                                        ppbOfKernelFrequency(inForce), offsetPpb));
 }
 
 timex tKernelClock::adjust(timex request, const char* deed)

@@ -24,8 +24,8 @@ public:
 
     uint64_t timeNs() override;
     void step(int64_t deltaNs) override;
-    int32_t offsetPpb() override;
-    void setOffsetPpb(int32_t offsetPpb) override;
+    double offsetPpb() override;
+    void setOffsetPpb(double offsetPpb) override;
     int32_t maxOffsetPpb() override { return limitPpb; }
     int32_t minOffsetPpb() override { return -limitPpb; }
 
@@ -38,8 +38,8 @@ private:
     std::function<tCrossReading()> reader;
 };
 
-// The kernel counts in 2^-16 ppm. Rounded both ways, a value that is read back is the one set.
-long kernelFrequency(int32_t offsetPpb);
-int32_t ppbOfKernelFrequency(long frequency);
+// The kernel counts in 2^-16 ppm, a little less than 1/64 ppb.
+long kernelFrequency(double offsetPpb); // the nearest
+double ppbOfKernelFrequency(long frequency);
 
 } // namespace dravikHost

@@ -3,7 +3,6 @@
 #include "clocks/iClock.h"
 
 #include <algorithm>
-#include <cmath>
 
 namespace dravikHost {
 
@@ -18,19 +17,19 @@ public:
     void showOffset(double recordedPpb) // of its rate
     {
         const double limit = limitPpb;
-        shownPpb = static_cast<int32_t>(std::lround(std::clamp(recordedPpb, -limit, limit)));
+        shownPpb = std::clamp(recordedPpb, -limit, limit);
     }
 
     uint64_t timeNs() override { return shownNs; }
     void step(int64_t /*deltaNs*/) override {}
-    int32_t offsetPpb() override { return shownPpb; }
-    void setOffsetPpb(int32_t orderedPpb) override { shownPpb = orderedPpb; }
+    double offsetPpb() override { return shownPpb; }
+    void setOffsetPpb(double orderedPpb) override { shownPpb = orderedPpb; }
     int32_t maxOffsetPpb() override { return limitPpb; }
     int32_t minOffsetPpb() override { return -limitPpb; }
 
 private:
     uint64_t shownNs = 0;
-    int32_t shownPpb = 0;
+    double shownPpb = 0;
     int32_t limitPpb;
 };
 

@@ -17,7 +17,7 @@ tCrossReading tSoftClock::crossRead()
 uint64_t tSoftClock::timeNs() { return timeAtRaw(rawTimeNs()); }
 
 // The time up to now has passed at the old rate.
-void tSoftClock::setOffsetPpb(int32_t offsetPpb)
+void tSoftClock::setOffsetPpb(double offsetPpb)
 {
     timeNs();
     clock.setOffsetPpb(offsetPpb);

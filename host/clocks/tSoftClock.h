@@ -16,8 +16,8 @@ public:
 
     uint64_t timeNs() override;
     void step(int64_t deltaNs) override { clock.step(deltaNs); }
-    int32_t offsetPpb() override { return clock.offsetPpb(); }
-    void setOffsetPpb(int32_t offsetPpb) override;
+    double offsetPpb() override { return clock.offsetPpb(); }
+    void setOffsetPpb(double offsetPpb) override;
     int32_t maxOffsetPpb() override { return clock.maxOffsetPpb(); }
     int32_t minOffsetPpb() override { return clock.minOffsetPpb(); }
 

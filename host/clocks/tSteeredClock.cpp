@@ -15,7 +15,7 @@ tSteeredClock::tSteeredClock(uint64_t startNs, double frequencyErrorPpb, int32_t
 
 void tSteeredClock::step(int64_t deltaNs) { wholeNs += static_cast<uint64_t>(deltaNs); }
 
-void tSteeredClock::setOffsetPpb(int32_t offsetPpb)
+void tSteeredClock::setOffsetPpb(double offsetPpb)
 {
     if (offsetPpb < minOffsetPpb() || offsetPpb > maxOffsetPpb()) {
         throw std::out_of_range(

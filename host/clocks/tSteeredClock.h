@@ -15,8 +15,8 @@ public:
 
     uint64_t timeNs() override { return wholeNs; }
     void step(int64_t deltaNs) override;
-    int32_t offsetPpb() override { return orderedPpb; }
-    void setOffsetPpb(int32_t offsetPpb) override;
+    double offsetPpb() override { return orderedPpb; }
+    void setOffsetPpb(double offsetPpb) override;
     int32_t maxOffsetPpb() override { return limitPpb; }
     int32_t minOffsetPpb() override { return -limitPpb; }
 
@@ -31,7 +31,7 @@ protected:
 private:
     uint64_t wholeNs;      // apart from the fraction, so that years keep their nanosecond
     double fractionNs = 0; // 0 to 1
-    int32_t orderedPpb = 0;
+    double orderedPpb = 0;
     int32_t limitPpb;
 };
 

@@ -49,9 +49,9 @@ void tDiscipline::followOrders(tStep& step)
 {
     if (options.dryRun) return;
     for (const tHostCall& call : step.calls) {
-        if (call.operation == kSetFrequency) inForcePpb = static_cast<double>(call.value);
+        if (call.operation == kSetFrequency) inForcePpb = call.ppb;
         if (call.operation != kStepTime) continue;
-        step.stepNs += call.value;
+        step.stepNs += call.ns;
         ++steps;
     }
 }

@@ -31,9 +31,16 @@ constexpr bool isOrder(tHostOperation operation)
     return operation == kStepTime || operation == kSetFrequency;
 }
 
+// Whether it is of the clock's rate, in ppb, and not of its time, in ns.
+constexpr bool isOfFrequency(tHostOperation operation)
+{
+    return operation != kGetTime && operation != kStepTime;
+}
+
 struct tHostCall {
     tHostOperation operation;
-    int64_t value; // given or returned, in the operation's unit: nanoseconds or ppb
+    int64_t ns = 0; // given or returned: a time, or a step
+    double ppb = 0; // or a frequency: an offset, or a limit of it
 };
 
 using tHostCalls = std::vector<tHostCall>;

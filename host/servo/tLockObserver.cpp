@@ -2,7 +2,7 @@
 
 namespace dravikHost {
 
-tLockObserver::tLockObserver(int32_t minOffsetPpb, int32_t maxOffsetPpb)
+tLockObserver::tLockObserver(double minOffsetPpb, double maxOffsetPpb)
     : minOffsetPpb(minOffsetPpb), maxOffsetPpb(maxOffsetPpb)
 {}
 
@@ -11,7 +11,7 @@ tLockEvent tLockObserver::observe(const tHostCalls& callsOfPair)
     const tHostCall* const set = findCall(callsOfPair, kSetFrequency);
     const bool again = setBefore;
     setBefore = set != nullptr;
-    if (set != nullptr) return frequencySet(set->value, again);
+    if (set != nullptr) return frequencySet(set->ppb, again);
     if (findCall(callsOfPair, kStepTime) != nullptr) return enter(kSnapped, kStepped);
     return nothingDone();
 }
@@ -22,7 +22,7 @@ void tLockObserver::restart()
     setBefore = false;
 }
 
-tLockEvent tLockObserver::frequencySet(int64_t offsetPpb, bool again)
+tLockEvent tLockObserver::frequencySet(double offsetPpb, bool again)
 {
     if (state == kLocked) return kNothingNew;
     if (state == kSnapped || again) return enter(kLocked, kLockGained);

@@ -25,7 +25,7 @@ enum tLockEvent {
 class tLockObserver
 {
 public:
-    tLockObserver(int32_t minOffsetPpb, int32_t maxOffsetPpb);
+    tLockObserver(double minOffsetPpb, double maxOffsetPpb);
 
     tLockEvent observe(const tHostCalls& callsOfPair);
     void restart(); // the plug-in's history was cleared
@@ -35,12 +35,12 @@ public:
 private:
     enum tState { kMeasuring, kMeasured, kSnapped, kLocked };
 
-    tLockEvent frequencySet(int64_t offsetPpb, bool again);
+    tLockEvent frequencySet(double offsetPpb, bool again);
     tLockEvent nothingDone();
     tLockEvent enter(tState next, tLockEvent event);
 
-    int32_t minOffsetPpb;
-    int32_t maxOffsetPpb;
+    double minOffsetPpb;
+    double maxOffsetPpb;
     tState state = kMeasuring;
     bool setBefore = false; // by the previous pair
 };

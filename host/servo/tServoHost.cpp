@@ -4,6 +4,7 @@
 
 #include <fmt/format.h>
 
+#include <cmath>
 #include <exception>
 #include <stdexcept>
 
@@ -35,8 +36,9 @@ template <typename Action>
 void perform(tHostOperation operation, zverr_Status* status, Action action) noexcept
 {
     try {
-        const auto value = action(current->clock);
-        current->calls.push_back({operation, static_cast<int64_t>(value)});
+        tHostCall call{operation};
+        action(current->clock, call);
+        current->calls.push_back(call);
     } catch (const std::exception& failure) {
         current->failure = std::current_exception();
         setFailure(status, kClockFailed, failure.what());
@@ -47,30 +49,40 @@ void perform(tHostOperation operation, zverr_Status* status, Action action) noex
 
 void getTime(uint64_t* timeNs, zverr_Status* status)
 {
-    perform(kGetTime, status, [&](iClock& clock) { return *timeNs = clock.timeNs(); });
+    perform(kGetTime, status, [&](iClock& clock, tHostCall& call) {
+        *timeNs = clock.timeNs();
+        call.ns = static_cast<int64_t>(*timeNs);
+    });
 }
 
 void stepTime(int64_t deltaNs, zverr_Status* status)
 {
-    perform(kStepTime, status, [&](iClock& clock) { return clock.step(deltaNs), deltaNs; });
+    perform(kStepTime, status, [&](iClock& clock, tHostCall& call) {
+        clock.step(deltaNs);
+        call.ns = deltaNs;
+    });
 }
 
 void getFrequency(int32_t* offsetPpb, zverr_Status* status)
 {
-    perform(kGetFrequency, status, [&](iClock& clock) { return *offsetPpb = clock.offsetPpb(); });
+    perform(kGetFrequency, status, [&](iClock& clock, tHostCall& call) {
+        call.ppb = *offsetPpb = static_cast<int32_t>(std::lround(clock.offsetPpb()));
+    });
 }
 
 void setFrequency(int32_t offsetPpb, zverr_Status* status)
 {
-    perform(kSetFrequency, status,
-            [&](iClock& clock) { return clock.setOffsetPpb(offsetPpb), offsetPpb; });
+    perform(kSetFrequency, status, [&](iClock& clock, tHostCall& call) {
+        clock.setOffsetPpb(offsetPpb);
+        call.ppb = offsetPpb;
+    });
 }
 
 int32_t getMaxFrequencyOffset(zverr_Status* status)
 {
     int32_t limitPpb = 0;
     perform(kGetMaxFrequencyOffset, status,
-            [&](iClock& clock) { return limitPpb = clock.maxOffsetPpb(); });
+            [&](iClock& clock, tHostCall& call) { call.ppb = limitPpb = clock.maxOffsetPpb(); });
     return limitPpb;
 }
 
@@ -78,7 +90,7 @@ int32_t getMinFrequencyOffset(zverr_Status* status)
 {
     int32_t limitPpb = 0;
     perform(kGetMinFrequencyOffset, status,
-            [&](iClock& clock) { return limitPpb = clock.minOffsetPpb(); });
+            [&](iClock& clock, tHostCall& call) { call.ppb = limitPpb = clock.minOffsetPpb(); });
     return limitPpb;
 }
 

@@ -89,6 +89,14 @@ std::string offsetText(double offsetPpb)
     return fmt::format("{:+.3f} ppm", shown / 1e3);
 }
 
+std::string decimalText(double value)
+{
+    std::string text = fmt::format("{:.6f}", value);
+    text.erase(text.find_last_not_of('0') + 1);
+    if (text.back() == '.') text.pop_back();
+    return text;
+}
+
 std::string secondsText(int64_t ns, int digits)
 {
     const std::string text = fmt::format("{}.{:09}", ns / kSecondNs, ns % kSecondNs);

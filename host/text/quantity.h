@@ -43,6 +43,7 @@ inline std::string signedDurationText(int64_t ns)
     return signedDurationText(static_cast<double>(ns));
 }
 std::string offsetText(double offsetPpb);
+std::string decimalText(double value);           // as many decimals as it takes, up to six
 std::string secondsText(int64_t ns, int digits); // not negative; cut, not rounded
 
 } // namespace dravikHost

@@ -50,6 +50,7 @@ private:
     bool readHeader(std::string_view line);
     std::optional<tFields> split(std::string_view line) const;
     tLine readPair(const tFields& fields, tRecordingBuilder& builder);
+    static std::optional<tHostCall> callIn(const tFields& fields);
     tLine readCall(const tFields& fields, tRecordingBuilder& builder);
     std::string cutShort(const tFields& fields);
     void endPair(tRecordingBuilder& builder);
@@ -61,8 +62,8 @@ private:
     bool hasCalls = false;
     tHostCalls calls; // of the last pair
     std::optional<tLockObserver> observer;
-    int32_t lowestPpb = 0;
-    int32_t highestPpb = 0;
+    double lowestPpb = 0;
+    double highestPpb = 0;
     std::optional<double> orderedPpb;
     std::optional<double> initialPpb; // before anything was ordered
 };
@@ -205,34 +206,45 @@ tLine tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
     return tLine::added(builder.add("", pair));
 }
 
+// A row of a call; nothing if it is none that is known.
+std::optional<tHostCall> tCsvFormat::callIn(const tFields& fields)
+{
+    const auto name =
+        std::find(kHostOperationNames.begin(), kHostOperationNames.end(), fields[kCall]);
+    if (name == kHostOperationNames.end()) return std::nullopt;
+    const auto operation = static_cast<tHostOperation>(name - kHostOperationNames.begin());
+    if (isOfFrequency(operation)) {
+        const auto ppb = finiteIn(fields[kValue]);
+        return ppb ? std::optional(tHostCall{operation, 0, *ppb}) : std::nullopt;
+    }
+    const auto ns = numberIn<int64_t>(fields[kValue]);
+    return ns ? std::optional(tHostCall{operation, *ns}) : std::nullopt;
+}
+
 // Calls in front of the first pair tell the limits of the clock.
 tLine tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
 {
-    const auto operation =
-        std::find(kHostOperationNames.begin(), kHostOperationNames.end(), fields[kCall]);
-    const auto value = numberIn<int64_t>(fields[kValue]);
-    if (operation == kHostOperationNames.end() || !value)
-        return tLine::unread("no call that is known");
+    const auto call = callIn(fields);
+    if (!call) return tLine::unread("no call that is known");
     hasCalls = true;
-    calls.push_back({static_cast<tHostOperation>(operation - kHostOperationNames.begin()), *value});
+    calls.push_back(*call);
     if (fields[kKind] == "held") return {tLine::kFrame, ""};
-    const auto ppb = static_cast<double>(*value);
-    switch (static_cast<tHostOperation>(operation - kHostOperationNames.begin())) {
+    switch (call->operation) {
     case kGetMaxFrequencyOffset:
-        highestPpb = static_cast<int32_t>(*value);
+        highestPpb = call->ppb;
         break;
     case kGetMinFrequencyOffset:
-        lowestPpb = static_cast<int32_t>(*value);
+        lowestPpb = call->ppb;
         break;
     case kGetFrequency:
-        if (!initialPpb) initialPpb = ppb;
+        if (!initialPpb) initialPpb = call->ppb;
         break;
     case kSetFrequency:
-        orderedPpb = ppb;
-        if (builder.last() != nullptr) builder.last()->orderedPpb = ppb;
+        orderedPpb = call->ppb;
+        if (builder.last() != nullptr) builder.last()->orderedPpb = call->ppb;
         break;
     case kStepTime:
-        if (builder.last() != nullptr) builder.last()->stepNs = *value;
+        if (builder.last() != nullptr) builder.last()->stepNs = call->ns;
         break;
     case kGetTime:
         break;

@@ -8,27 +8,27 @@ namespace dravikHost {
 
 namespace {
 
-double valueOf(const tHostCalls& calls, tHostOperation operation)
+tHostCall callOf(const tHostCalls& calls, tHostOperation operation)
 {
     const tHostCall* const call = findCall(calls, operation);
-    return call != nullptr ? static_cast<double>(call->value) : 0;
+    return call != nullptr ? *call : tHostCall{operation};
 }
 
 std::string eventText(const tStep& step)
 {
-    const double orderedPpb = valueOf(step.calls, kSetFrequency);
+    const double orderedPpb = callOf(step.calls, kSetFrequency).ppb;
     const std::string error = signedDurationText(step.pair.errorNs());
     switch (step.event) {
     case kFrequencyMeasured: // the correction, the other way round, is how far it had been off
         return fmt::format("frequency measured: {} off, {} by {}",
-                           offsetText(valueOf(step.calls, kGetFrequency) - orderedPpb),
+                           offsetText(callOf(step.calls, kGetFrequency).ppb - orderedPpb),
                            step.dryRun ? "would be steered" : "now steered",
                            offsetText(orderedPpb));
     case kFrequencyAtLimit:
         return fmt::format("frequency at its limit, {}", offsetText(orderedPpb));
     case kStepped:
         return fmt::format("{} by {}", step.dryRun ? "would step" : "stepped",
-                           signedDurationText(valueOf(step.calls, kStepTime)));
+                           signedDurationText(callOf(step.calls, kStepTime).ns));
     case kNotStepped:
         return fmt::format("no step needed, error {}", error);
     case kLockGained:

@@ -40,9 +40,9 @@ void tSummary::addCalls(const tHostCalls& calls, bool held)
     for (const tHostCall& call : calls) {
         if (!held || !isOrder(call.operation)) ++callCounts[call.operation];
         if (call.operation != kSetFrequency) continue;
-        lowestPpb = lastPpb ? std::min(lowestPpb, call.value) : call.value;
-        highestPpb = lastPpb ? std::max(highestPpb, call.value) : call.value;
-        lastPpb = call.value;
+        lowestPpb = lastPpb ? std::min(lowestPpb, call.ppb) : call.ppb;
+        highestPpb = lastPpb ? std::max(highestPpb, call.ppb) : call.ppb;
+        lastPpb = call.ppb;
     }
 }
 
@@ -108,10 +108,9 @@ std::string tSummary::errorText() const
 std::string tSummary::frequencyText() const
 {
     if (!lastPpb) return "frequency   never ordered\n";
-    const auto text = [](int64_t ppb) { return offsetText(static_cast<double>(ppb)); };
     return fmt::format("frequency   {} {} to {}, last {}\n",
-                       dryRun ? "would be ordered" : "ordered", text(lowestPpb), text(highestPpb),
-                       text(*lastPpb));
+                       dryRun ? "would be ordered" : "ordered", offsetText(lowestPpb),
+                       offsetText(highestPpb), offsetText(*lastPpb));
 }
 
 std::string tSummary::callsText() const

@@ -52,9 +52,9 @@ private:
     int64_t lastElapsedNs = 0;
 
     std::array<int64_t, kHostOperationNames.size()> callCounts{};
-    int64_t lowestPpb = 0; // of what was ordered
-    int64_t highestPpb = 0;
-    std::optional<int64_t> lastPpb;
+    double lowestPpb = 0; // of what was ordered
+    double highestPpb = 0;
+    std::optional<double> lastPpb;
 
     std::optional<int64_t> firstLockNs;
     bool locked = false;

@@ -36,7 +36,9 @@ void tTraceFile::addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held)
     for (const tHostCall& call : calls) {
         const char* const kind = held && isOrder(call.operation) ? "held" : "call";
         file->write(fmt::format("{},{},,,,,{},{}\n", kind, secondsText(elapsedNs, 9),
-                                kHostOperationNames[call.operation], call.value));
+                                kHostOperationNames[call.operation],
+                                isOfFrequency(call.operation) ? decimalText(call.ppb)
+                                                              : std::to_string(call.ns)));
     }
 }
 

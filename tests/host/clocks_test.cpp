@@ -10,6 +10,7 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
+#include <cmath>
 #include <stdexcept>
 #include <system_error>
 #include <vector>
@@ -134,7 +135,7 @@ TEST(RecordedClock, showsWhatWasRecorded)
     clock.step(5);
     EXPECT_EQ(kStart, clock.timeNs());
     for (const auto& [recordedPpb, shownPpb] :
-         {std::pair(12.5, 13), {-0.4, 0}, {1e12, 100}, {-1e12, -100}}) {
+         {std::pair(12.5, 12.5), {-0.25, -0.25}, {1e12, 100}, {-1e12, -100}}) {
         clock.showOffset(recordedPpb);
         EXPECT_EQ(shownPpb, clock.offsetPpb());
     }
@@ -200,15 +201,21 @@ TEST(SystemTime, ofOneClockIsTheMiddleOfAWindow)
 
 TEST(KernelFrequency, givesBackWhatWasSet)
 {
-    for (const auto& [ppb, units] :
-         {std::pair(0, 0L), {1, 66}, {-1, -66}, {500'000, 32'768'000}, {-100'000, -6'553'600}})
+    for (const auto& [ppb, units] : {std::pair(0.0, 0L),
+                                     {1, 66},
+                                     {-1, -66},
+                                     {1.0 / 64, 1},
+                                     {0.0229, 2},
+                                     {0.0228, 1},
+                                     {500'000, 32'768'000},
+                                     {-100'000, -6'553'600}})
         EXPECT_EQ(units, kernelFrequency(ppb)) << ppb;
-    EXPECT_EQ(1, ppbOfKernelFrequency(33));
-    EXPECT_EQ(0, ppbOfKernelFrequency(-32));
-    for (const int32_t ppb : {1, 2, 3, 7, 499'999, 999'999, 32'767'998, 2'147'483'647}) {
+    EXPECT_DOUBLE_EQ(0.5, ppbOfKernelFrequency(32'768) / 1000);
+    for (const int32_t finest : {1, 2, 3, 31, 32, 7 * 64, 31'999'999, 2'097'151'999}) {
+        const double ppb = finest / 64.0;
         if (sizeof(long) == 4 && ppb > 32'767'999) continue;
-        EXPECT_EQ(ppb, ppbOfKernelFrequency(kernelFrequency(ppb)));
-        EXPECT_EQ(-ppb, ppbOfKernelFrequency(kernelFrequency(-ppb)));
+        EXPECT_EQ(finest, std::lround(64 * ppbOfKernelFrequency(kernelFrequency(ppb))));
+        EXPECT_EQ(-finest, std::lround(64 * ppbOfKernelFrequency(kernelFrequency(-ppb))));
     }
 }
 
@@ -244,6 +251,8 @@ TEST_F(KernelClock, refusesAnOffsetThatIsNotTaken)
     EXPECT_EQ(-32'768'000, kernel.frequency);
     EXPECT_EQ(-500'000, clock.offsetPpb());
     EXPECT_EQ(0U, kernel.requests.back().modes); // only looked at
+    clock.setOffsetPpb(-0.02);
+    EXPECT_DOUBLE_EQ(-1 / 65.536, clock.offsetPpb()); // what was taken
     EXPECT_THROW(clock.setOffsetPpb(500'001), std::out_of_range);
     EXPECT_EQ(600'000, clock.maxOffsetPpb());
     EXPECT_EQ(-600'000, clock.minOffsetPpb());

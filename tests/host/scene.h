@@ -15,7 +15,7 @@ class tFailingClock : public tSteeredClock
 public:
     using tSteeredClock::tSteeredClock;
     void step(int64_t deltaNs) override { order(), tSteeredClock::step(deltaNs); }
-    void setOffsetPpb(int32_t ppb) override { order(), tSteeredClock::setOffsetPpb(ppb); }
+    void setOffsetPpb(double ppb) override { order(), tSteeredClock::setOffsetPpb(ppb); }
 
     int orders = 0;
     int failsAt = 0;

@@ -5,6 +5,7 @@
 #include "servo/tServoParameters.h"
 #include "servo/tStatus.h"
 #include "support/failureOf.h"
+#include "text/quantity.h"
 
 #include <map>
 #include <stdexcept>
@@ -16,14 +17,10 @@ namespace {
 // What the plug-in did for one pair: s sets an offset inside the limits, u one just inside the
 // upper limit, U and L set the upper and the lower one, j steps, b steps and sets, - does nothing.
 const std::map<char, tHostCalls> kDeeds = {
-    {'s', {{kGetTime, 5}, {kSetFrequency, 0}}},
-    {'u', {{kSetFrequency, 199}}},
-    {'l', {{kSetFrequency, -99}}},
-    {'U', {{kSetFrequency, 200}}},
-    {'L', {{kSetFrequency, -100}}},
-    {'j', {{kGetTime, 5}, {kStepTime, 5}}},
-    {'b', {{kStepTime, 5}, {kSetFrequency, 0}}},
-    {'-', {{kGetTime, 5}}},
+    {'s', {{kGetTime, 5}, {kSetFrequency}}},  {'u', {{kSetFrequency, 0, 199}}},
+    {'l', {{kSetFrequency, 0, -99}}},         {'U', {{kSetFrequency, 0, 200}}},
+    {'L', {{kSetFrequency, 0, -100}}},        {'j', {{kGetTime, 5}, {kStepTime, 5}}},
+    {'b', {{kStepTime, 5}, {kSetFrequency}}}, {'-', {{kGetTime, 5}}},
 };
 
 // Events by a letter each: nothing new (.), Measured, At the limit, Stepped, Not stepped, Gained,
@@ -72,8 +69,10 @@ std::string told(const tHostCalls& calls)
 {
     std::string text;
     for (const tHostCall& call : calls)
-        text += std::string(kHostOperationNames[call.operation]) + " " +
-                std::to_string(call.value) + "; ";
+        text +=
+            std::string(kHostOperationNames[call.operation]) + " " +
+            decimalText(isOfFrequency(call.operation) ? call.ppb : static_cast<double>(call.ns)) +
+            "; ";
     return text;
 }
 
@@ -103,7 +102,7 @@ class tBusyClock : public tSteeredClock
 public:
     tBusyClock() : tSteeredClock(0, 0, 100'000) {}
 
-    void setOffsetPpb(int32_t offsetPpb) override
+    void setOffsetPpb(double offsetPpb) override
     {
         if (other != nullptr) other->adjustTime(1, 1);
         if (broken) throw std::runtime_error("a \"loose\" wire");
