@@ -1,11 +1,14 @@
 // The textbook controller as a plug-in, so that dravik-host runs it where it runs the real one.
 // It takes the clock over as that one does: two pairs for the frequency, one for a step, and from
 // the fourth pair on the controller. The interval is that of the first two pairs. It reports no
-// failure of its own and never gives a lock up.
+// failure of its own and never gives a lock up. Between pairs it keeps its frequency itself, so it
+// is run at a resolution of 1 ppb.
 
 #include "textbookController.h"
+#include "zvckmservo/parameters.h"
 
 #include <cmath>
+#include <string>
 
 namespace {
 
@@ -56,8 +59,6 @@ tTextbookServo& servoOf(const zvckmservo_HostTable* host)
     return *static_cast<tTextbookServo*>(host->servoHandle);
 }
 
-void refuse(zverr_Status* status) { status->code = zvplaterr_softwareFaultPLATInternalUseOnly; }
-
 } // namespace
 
 void zvckmservo_initialize(zvckmservo_HostTable* host, zverr_Status* /*status*/)
@@ -89,22 +90,28 @@ void zvckmservo_getTime(zvckmservo_HostTable* host, uint64_t* time, zverr_Status
     host->getTime(time, status);
 }
 
+// It has none of the parameters: it gives out those of a new servo, and takes any.
 int zvckmservo_writeServoConfigJson(zvckmservo_HostTable* /*host*/, const char* /*configJson*/,
-                                    zverr_Status* status)
+                                    zverr_Status* /*status*/)
 {
-    refuse(status);
-    return 1;
+    return 0;
 }
 
-int zvckmservo_readServoConfigJson(zvckmservo_HostTable* /*host*/, char* /*buffer*/,
-                                   size_t /*bufferSize*/, zverr_Status* status)
+int zvckmservo_readServoConfigJson(zvckmservo_HostTable* /*host*/, char* buffer, size_t bufferSize,
+                                   zverr_Status* /*status*/)
 {
-    refuse(status);
-    return 1;
+    std::string text = "{";
+    for (const zvckmservo_Parameter& parameter : zvckmservo_parameters) {
+        text += text.size() > 1 ? ", \"" : "\"";
+        text += std::string(parameter.key) + "\": " + parameter.initialText;
+    }
+    text += '}';
+    buffer[text.copy(buffer, bufferSize - 1)] = '\0';
+    return 0;
 }
 
 void zvckmservo_applyMetaData(zvckmservo_HostTable* /*host*/, const char* /*metaDataJson*/,
                               zverr_Status* status)
 {
-    refuse(status);
+    status->code = zvplaterr_softwareFaultPLATInternalUseOnly;
 }

@@ -94,20 +94,20 @@ frequency
 frequency
 frequency
 == ptp from realtime | system frequency=100ppm;ptp ptp frequency=-150ppm offset=1s;trace trace pace=5s | --reference realtime --clock phc:ptp --config calm.json --interval 1s --duration 6s | cut -d, -f2- trace
-     1.000 s  frequency measured: -250.039 ppm off, now steered by +250.039 ppm
+     1.000 s  frequency measured: -250.038 ppm off, now steered by +250.038 ppm
      2.000 s  stepped by -999.8 ms
      3.000 s  locked, error +1 ns
 clock,error_ns,ordered_ppb,event
 ptp,1000000000.000,0.000,frequency
 system,0.000,0.000,
 ptp,1000000000.000,0.000,
-ptp,999850014.998,250039.001,frequency
-ptp,199980.495,250039.001,step
-ptp,299971.991,250037.994,frequency
-ptp,399962.481,250035.995,frequency
-ptp,499950.972,250037.003,frequency
+ptp,999850014.998,250038.498,frequency
+ptp,199980.992,250038.498,step
+ptp,299971.985,250037.399,frequency
+ptp,399961.879,250036.865,frequency
+ptp,499951.240,250036.316,frequency
 system,500000.000,0.000,
-ptp,500000.967,250037.003,
+ptp,500001.234,250036.316,
 == not precise | ptp ptp delay=400ns quirks=e offset=1ms;trace trace | --reference realtime --clock phc:ptp --config calm.json --interval 1s --duration 4s | cut -d, -f2- trace
      1.000 s  frequency measured: +0.000 ppm off, now steered by +0.000 ppm
      2.000 s  stepped by -1 ms

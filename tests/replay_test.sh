@@ -87,7 +87,7 @@ replay "$scratch/quick.csv" --csv "$scratch/again.csv" > "$scratch/out"
 expect "verbatim" "" "$(cmp "$scratch/quick.csv" "$scratch/again.csv")"
 expect "verbatim says so" 1 "$(grep -c "verbatim: errors as recorded" "$scratch/out")"
 furthest() { # ONE OTHER: the largest distance between their errors, once both are locked
-    paste -d, "$1" "$2" | awk -F, '/^pair/ && $2 > 9 {d = $5 - $13; m = d > m ? d : -d > m ? -d : m} END {print m}'
+    paste -d, "$1" "$2" | awk -F, '/^pair/ && $2 > 9 {d = $5 - $13; m = d > m ? d : -d > m ? -d : m} END {print m + 0}'
 }
 for document in quick slow; do
     config=()

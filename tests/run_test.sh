@@ -31,20 +31,20 @@ dravik-host[1.000]: offset    3011980 s0 freq  +11970
 dravik-host[2.000]: offset    3012069 s1 freq  +11970
      3.000 s  locked, error -10 ns
 dravik-host[3.000]: offset        -10 s2 freq  +11959
-dravik-host[4.000]: offset          1 s2 freq  +11966
-dravik-host[5.000]: offset         75 s2 freq  +12048
+dravik-host[4.000]: offset          1 s2 freq  +11965
+dravik-host[5.000]: offset         76 s2 freq  +12048
 dravik-host[6.000]: offset         -3 s2 freq  +12003
 dravik-host[7.000]: offset         54 s2 freq  +12064
-dravik-host[8.000]: offset        -51 s2 freq  +11978
+dravik-host[8.000]: offset        -51 s2 freq  +11979
 pairs       9 in 8.000 s
 lock        after 3.000 s, lost 0 times, missed 0 times; 6 of 6 pairs locked since
-error       RMS 43.31 ns, peak 75 ns, last -51 ns
+error       RMS 43.59 ns, peak 76 ns, last -51 ns
             (of the clock against the reference as measured, all pairs since the first lock)
-frequency   ordered -12.064 ppm to -11.959 ppm, last -11.978 ppm
+frequency   ordered -12.064 ppm to -11.959 ppm, last -11.979 ppm
 host calls  getTime 0, stepTime 1, getFrequency 7, setFrequency 7,
             getMaxFrequencyOffset 1, getMinFrequencyOffset 1
 offset_seconds -5.1e-08
-frequency_offset -1.1978e-05
+frequency_offset -1.19786563e-05
 locked 1
 holdover_seconds 0
 estimated_error_seconds 0
@@ -56,14 +56,14 @@ samples_unusable_total 0
 10
 10
 pair,8.000000000,1000000008000000000,1000000007999999949,-51,,,
-call,8.000000000,,,,,getFrequency,-12064
-call,8.000000000,,,,,setFrequency,-11978
+call,8.000000000,,,,,getFrequency,-12064.453125
+call,8.000000000,,,,,setFrequency,-11978.65625
 == lines now and then | ptp ref errors=errors | --reference phc:ref --interval 1s --duration 22s --config calm.json --status 10s
      1.000 s  frequency measured: +11.970 ppm off, now steered by -11.970 ppm
      2.000 s  stepped by -3.012 ms
      3.000 s  locked, error -10 ns
 dravik-host[10.000]: rms 1570890 max 3012069 freq  +10901 +/- 3448
-dravik-host[20.000]: rms   45 max   66 freq  +12000 +/-  38
+dravik-host[20.000]: rms   44 max   65 freq  +12000 +/-  38
 == within --max-step | system | --max-step 4ms --interval 1s --duration 4s
      1.000 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
      2.000 s  stepped by -3.012 ms
@@ -91,10 +91,10 @@ host calls  getTime 0, stepTime 0, getFrequency 2, setFrequency 0,
 call,0.000000000,,,,,getMaxFrequencyOffset,500000
 call,0.000000000,,,,,getMinFrequencyOffset,-500000
 call,1.000000000,,,,,getFrequency,0
-held,1.000000000,,,,,setFrequency,-12000
+held,1.000000000,,,,,setFrequency,-11999.859375
 held,2.000000000,,,,,stepTime,-3024000
 call,5.000000000,,,,,getFrequency,0
-held,5.000000000,,,,,setFrequency,-12000
+held,5.000000000,,,,,setFrequency,-11999.859375
 held,6.000000000,,,,,stepTime,-3072000
 replay: dry, 8 measurements from CSV with reference_ns and clock_ns;
      3.000 s  locked, error +0 ns
@@ -114,9 +114,9 @@ lock        after 3.000 s, lost 0 times, missed 0 times; 5 of 5 pairs locked sin
 pairs       30 in 29.000 s; 6 held back
 lock        after 6.000 s, lost 1 time, missed 0 times; 17 of 24 pairs locked since
 error       RMS 270 us, peak 500 us, last +0 ns
-            while locked: RMS 0.343 ns, peak 1 ns
+            while locked: RMS 0 ns, peak 0 ns
             (of the clock against the reference as measured, all pairs since the first lock)
-frequency   ordered -12.000 ppm to -11.999 ppm, last -12.000 ppm
+frequency   ordered -12.000 ppm to -12.000 ppm, last -12.000 ppm
 host calls  getTime 0, stepTime 2, getFrequency 19, setFrequency 19,
             getMaxFrequencyOffset 1, getMinFrequencyOffset 1
 WARNING     the lock did not hold: lost 1 time, 30.4 % of the time without it
@@ -149,31 +149,31 @@ left out of the reference's samples: 1 out of date, 0 not usable
      3.000 s  stepped by -3.024 ms
      4.000 s  locked, error -10 ns
     24.000 s  reference is silent: holding the frequency
-dravik-host[31.000]: holdover for 12 s, error about 476.8 ns
+dravik-host[31.000]: holdover for 12 s, error about 478 ns
     60.000 s  reference is back after 41 s
-dravik-host[61.000]: rms  383 max  541 freq  +12441 +/- 160
+dravik-host[61.000]: rms  391 max  553 freq  +12450 +/- 164
     74.000 s  reference is silent: holding the frequency
-dravik-host[91.000]: holdover for 22 s, error about 3.072 us
-dravik-host[121.000]: holdover for 52 s, error about 7.256 us
-dravik-host[151.000]: holdover for 82 s, error about 11.44 us
-dravik-host[181.000]: holdover for 112 s, error about 15.63 us
+dravik-host[91.000]: holdover for 22 s, error about 3.133 us
+dravik-host[121.000]: holdover for 52 s, error about 7.4 us
+dravik-host[151.000]: holdover for 82 s, error about 11.67 us
+dravik-host[181.000]: holdover for 112 s, error about 15.94 us
    200.000 s  reference is back after 131 s: measuring anew
    201.000 s  frequency measured: +0.051 ppm off, now steered by -12.040 ppm
-   202.000 s  no step needed, error +1.323 us
-   203.000 s  locked, error +1.343 us
+   202.000 s  no step needed, error +1.312 us
+   203.000 s  locked, error +1.332 us
 pairs       34 in 204.000 s
 lock        after 4.000 s, lost 1 time, missed 0 times; 28 of 31 pairs locked since
-error       RMS 503.4 ns, peak 1.393 us, last -215 ns
-            while locked: RMS 290.5 ns, peak 1.343 us
+error       RMS 500.4 ns, peak 1.383 us, last -213 ns
+            while locked: RMS 290 ns, peak 1.332 us
             (of the clock against the reference as measured, all pairs since the first lock)
-frequency   ordered -13.517 ppm to -11.857 ppm, last -12.542 ppm
+frequency   ordered -13.505 ppm to -11.855 ppm, last -12.538 ppm
 host calls  getTime 0, stepTime 1, getFrequency 30, setFrequency 30,
             getMaxFrequencyOffset 1, getMinFrequencyOffset 1
 WARNING     the lock did not hold: lost 1 time, 1.5 % of the time without it
             Compare the document with the noise: dravik-host check DOCUMENT --interval TIME
             --noise TIME; or design one: dravik-host tune TRACE
-estimated_error_seconds 6.838792e-06
-estimated_error_seconds 1.52085498e-05
+estimated_error_seconds 6.97442861e-06
+estimated_error_seconds 1.5510187e-05
 == seldom, but not silent | system | --interval 150ms --holdover-after 50ms --remeasure-after 60ms --duration 1s
      0.150 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
      0.300 s  stepped by -3.002 ms
@@ -191,7 +191,7 @@ estimated_error_seconds 1.52085498e-05
      6.000 s  documents stay as they are: live.json: refused with -52005: snapTimeThreshold is 100, not within 1e-8 to 10 s; applied before it: nothing
      7.000 s  documents read again
      8.000 s  lock lost, error +132 us
-    10.000 s  frequency measured: +131.999 ppm off, now steered by -11.999 ppm
+    10.000 s  frequency measured: +131.998 ppm off, now steered by -12.000 ppm
 dravik-host: refused a step of -396 us after the first lock
 exit 1
 == a further document | system | --interval 1s --config calm.json --then 3s=live.json --duration 9s

@@ -14,14 +14,15 @@ namespace dravikHost {
 
 namespace {
 
-// What rounding adds: timestamps to their steps, and orders to parts per billion, from which
-// the law starts again, so that their errors add up as a walk of the frequency does.
+// What rounding adds: timestamps to their steps, and orders to theirs, from which the law starts
+// again, so that their errors add up as a walk of the frequency does.
 tNoiseModel withRounding(const tNoiseModel& model)
 {
     tNoiseModel sum = model;
     sum.noiseNs =
         std::hypot(model.noiseNs, static_cast<double>(model.granularityNs) / std::sqrt(6.0));
-    sum.wanderPpb = std::hypot(model.wanderPpb, 1 / std::sqrt(12.0 * model.interval()));
+    const double orderedPpb = 1.0 / usualFactor(snapThresholdFor(model));
+    sum.wanderPpb = std::hypot(model.wanderPpb, orderedPpb / std::sqrt(12.0 * model.interval()));
     return sum;
 }
 

@@ -3,6 +3,7 @@
 #include "design/tLoopAnalysis.h"
 #include "design/tLoopForecast.h"
 #include "design/tLoopGains.h"
+#include "design/tTrial.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
@@ -101,32 +102,35 @@ std::string frequencyLockText(const tServoParameters& parameters, const tLoopAna
                                                                      : "never locks");
 }
 
-// Orders are whole parts per billion, from which the law starts again: half of one is lost.
+// Orders are rounded, and the law starts again from what was ordered: half of a step is lost.
 std::string actionText(const tServoParameters& parameters)
 {
-    constexpr double kLeastChange = 0.5e-9;
+    const double stepPpb = 1.0 / usualFactor(parameters.snapTimeThreshold);
+    const double leastChange = 0.5e-9 * stepPpb;
     const double g = parameters.phaseLockGain;
     const double a = parameters.phaseLockCoefficientA;
     const double b = parameters.phaseLockCoefficientB;
     const double threshold = parameters.snapTimeThreshold;
-    const double stays = kLeastChange / (g * (a - b));
-    if (g * (std::fabs(a) + std::fabs(b)) * threshold < kLeastChange) {
+    const double stays = leastChange / (g * (a - b));
+    if (g * (std::fabs(a) + std::fabs(b)) * threshold < leastChange) {
         return fmt::format("! gain too small to act: no error below snapTimeThreshold, {}, makes "
-                           "half of 1 ppb, the least that is ordered\n",
-                           secondsAsText(threshold));
+                           "half of {} ppb, the least that is ordered\n",
+                           secondsAsText(threshold), stepPpb);
     }
     if (stays >= threshold) {
         return fmt::format(
             "! gain too small to correct the frequency: a lasting error has to reach "
-            "{} to make half of 1 ppb, the least that is ordered; snapTimeThreshold "
+            "{} to make half of {} ppb, the least that is ordered; snapTimeThreshold "
             "is {}\n",
-            secondsAsText(stays), secondsAsText(threshold));
+            secondsAsText(stays), stepPpb, secondsAsText(threshold));
     }
-    return fmt::format("  orders are whole ppb: without noise the error may stay within {}\n",
-                       secondsAsText(stays));
+    return fmt::format(
+        "  orders are in steps of {} ppb: without noise the error may stay within {}\n", stepPpb,
+        secondsAsText(stays));
 }
 
-std::string noiseText(const tLoopAnalysis& loop, const std::optional<tLoopForecast>& forecast)
+std::string noiseText(const tServoParameters& parameters, const tLoopAnalysis& loop,
+                      const std::optional<tLoopForecast>& forecast)
 {
     constexpr double kMuchMore = 1.25;
     const std::string share = fmt::format("{:.0f} % of the noise", loop.noiseGain * 100);
@@ -134,9 +138,11 @@ std::string noiseText(const tLoopAnalysis& loop, const std::optional<tLoopForeca
     std::string passed = fmt::format("  passes {} on to the clock, {}\n", share,
                                      durationText(loop.noiseGain * forecast->noiseNs));
     if (forecast->roundedNs < kMuchMore * forecast->linearNs) return passed;
-    return passed + fmt::format("! orders in whole ppb, from which the law starts again, raise its "
-                                "error to {} RMS; a larger gain suffers less\n",
-                                durationText(forecast->roundedNs));
+    return passed +
+           fmt::format("! orders in steps of {} ppb, from which the law starts again, raise "
+                       "its error to {} RMS; a larger gain suffers less\n",
+                       1.0 / usualFactor(parameters.snapTimeThreshold),
+                       durationText(forecast->roundedNs));
 }
 
 // What would hold locks that are lost.
@@ -203,7 +209,7 @@ std::string loopAdvice(const tServoLibrary& library, const tServoParameters& par
     std::optional<tLoopForecast> forecast;
     if (noiseNs) forecast = forecastLoop(library, parameters, interval, *noiseNs);
     text += dynamicsText(loop) + bandwidthText(loop) + (rounds ? actionText(parameters) : "") +
-            noiseText(loop, forecast);
+            noiseText(parameters, loop, forecast);
     if (!forecast) return text;
     return text + lockText(parameters, *forecast) + filterText(parameters, interval, *noiseNs);
 }

@@ -72,7 +72,8 @@ double roundedErrorNs(const tServoLibrary& library, tServoParameters parameters,
                       const tLoopAnalysis& loop, const tNoiseModel& model)
 {
     parameters.spikeFilterEnabled = 0;
-    parameters.snapTimeThreshold = zvckmservo_parameters[zvckmservo_kSnapTimeThreshold].highest;
+    const double highest = zvckmservo_parameters[zvckmservo_kSnapTimeThreshold].highest;
+    parameters.snapTimeThreshold = highest / usualFactor(parameters.snapTimeThreshold);
     tStartOptions starts = startsFor(loop, model.interval(), 0);
     starts.starts = std::max<uint64_t>(starts.starts / 4, 8);
     return runTrial(library, parameters.documentText(), model,

@@ -9,13 +9,13 @@
 namespace dravikHost {
 
 // What white noise of the measurements makes of a stable loop, on a usual oscillator: by theory,
-// and by simulations through the plug-in for what theory leaves out, which are orders in whole
-// parts per billion and starts in which the frequency is measured through the noise.
+// and by simulations through the plug-in for what theory leaves out, which are the
+// rounding of orders and starts in which the frequency is measured through the noise.
 struct tLoopForecast {
     double noiseNs = 0;         // of the measurements
     double seenNs = 0;          // deviation of what the threshold is compared with
     double linearNs = 0;        // error of the clock, RMS, if orders had any value
-    double roundedNs = 0;       // with orders in whole parts per billion
+    double roundedNs = 0;       // with orders in their steps
     bool locks = false;         // at least one start did
     double failing = 0;         // share of starts that miss the lock or lose it again
     double lostPerHour = 0;     // locks, in an hour that begins with a start

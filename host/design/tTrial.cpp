@@ -2,8 +2,7 @@
 
 #include "clocks/tSteeredClock.h"
 #include "loop/tMeasureSpacing.h"
-#include "servo/tLockObserver.h"
-#include "servo/tServoHost.h"
+#include "servo/tFineServo.h"
 #include "sources/tSimulatedSource.h"
 
 #include <algorithm>
@@ -40,17 +39,15 @@ struct tFirstPairs {
 class tRun
 {
 public:
-    tRun(const tServoLibrary& library, const std::string& document, const tNoiseModel& model,
+    tRun(const tServoLibrary& library, const tServoParameters& parameters, const tNoiseModel& model,
          uint64_t seed, const tFirstPairs& first = {})
         : intervalNs(model.intervalNs), measurement(measurementOf(model)), noise(seed),
           clock(tSimulatedSource::kStartNs + first.offsetNs,
                 oscillatorOf(model, first.noisy ? kFrequencyPpb + noise.uniform() : 0),
                 kMaxOffsetPpb, noise),
-          host(library, clock), observer(-kMaxOffsetPpb, kMaxOffsetPpb),
+          servo(library, clock, usualFactor(parameters.snapTimeThreshold), parameters),
           spacing(first.measureOverNs), noisy(first.noisy)
-    {
-        host.writeConfig(document);
-    }
+    {}
 
     // Returns the true error, in ns.
     double takePair()
@@ -62,12 +59,12 @@ public:
         elapsedNs += intervalNs;
         if (spacing.holdsBack(elapsedNs)) return errorNs;
         const auto errorSeenNs = static_cast<int64_t>(std::floor(seenNs));
-        host.adjustTime(cut(trueNs + static_cast<uint64_t>(errorSeenNs)), cut(clock.timeNs()));
-        const tLockEvent event = observer.observe(host.calls());
-        spacing.given(elapsedNs, event, observer.measuring());
+        const tLockEvent event =
+            servo.adjustTime(cut(trueNs + static_cast<uint64_t>(errorSeenNs)), cut(clock.timeNs()));
+        spacing.given(elapsedNs, event, servo.measuring());
         lost += event == kLockLost ? 1 : 0;
         missed = missed || event == kLockMissed;
-        wasLocked = wasLocked || observer.locked();
+        wasLocked = wasLocked || servo.locked();
         noisy = noisy || wasLocked;
         return errorNs;
     }
@@ -85,8 +82,7 @@ private:
     tMeasurementModel measurement;
     tNoise noise;
     tSimulatedClock clock;
-    tServoHost host;
-    tLockObserver observer;
+    tFineServo servo;
     tMeasureSpacing spacing;
     bool noisy; // the measurements
     bool wasLocked = false;
@@ -98,15 +94,21 @@ private:
 
 } // namespace
 
+int usualFactor(double snapTimeThreshold)
+{
+    return tFineServo::factorFor(tFineServo::kFinest, kMaxOffsetPpb, snapTimeThreshold);
+}
+
 tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
                       const tNoiseModel& model, const tTrialOptions& options)
 {
+    const tServoParameters parameters = tServoParameters::of(document);
     tTrialResult result;
     double squares = 0;
     double eighths = 0;
     int64_t lost = 0;
     for (uint64_t i = 0; i < options.seeds; ++i) {
-        tRun run(library, document, model, kFirstSeed + i);
+        tRun run(library, parameters, model, kFirstSeed + i);
         for (int64_t pair = 0; pair < options.settlingPairs; ++pair)
             run.takePair();
         for (int64_t pair = 0; pair < options.countedPairs; ++pair) {
@@ -131,11 +133,12 @@ tStartResult runStarts(const tServoLibrary& library, const std::string& document
                        const tNoiseModel& model, const tStartOptions& options)
 {
     constexpr uint64_t kOffsetNs = 1'000'000;
+    const tServoParameters parameters = tServoParameters::of(document);
     tStartResult result;
     double squares = 0;
     const int64_t half = options.pairs / 2;
     for (uint64_t i = 0; i < options.starts; ++i) {
-        tRun run(library, document, model, kFirstSeed + i,
+        tRun run(library, parameters, model, kFirstSeed + i,
                  {true, kOffsetNs, options.measureOverNs});
         for (int64_t pair = 0; pair < half; ++pair)
             run.takePair();

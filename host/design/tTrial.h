@@ -9,7 +9,10 @@
 
 namespace dravikHost {
 
-// What a document is worth: simulations through the plug-in, whole parts per billion and whole
+// Into how many parts of a ppb a run divides its orders, unless it is told otherwise.
+int usualFactor(double snapTimeThreshold);
+
+// What a document is worth: simulations through the plug-in, the rounding of orders and whole
 // nanoseconds included. The lock is acquired without noise, so what counts is how it is held.
 struct tTrialOptions {
     int64_t settlingPairs; // not counted

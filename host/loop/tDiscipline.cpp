@@ -2,16 +2,35 @@
 
 #include "clocks/tSteeredClock.h"
 
+#include <fmt/format.h>
+
+#include <utility>
+
 namespace dravikHost {
 
 tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
                          const tDisciplineOptions& options)
-    : library(library), options(options), host(library, clock), callsThatMadeIt(host.calls()),
-      lock(clock.minOffsetPpb(), clock.maxOffsetPpb()), spacing(options.measureOverNs),
-      tuningNotes(tune(host, options.tuning)), later(host, options.later),
-      inForcePpb(clock.offsetPpb())
+    : library(library), options(options), tuned(readDocuments(library, options)),
+      servo(library, clock,
+            tFineServo::factorFor(options.factor, tFineServo::limitOf(clock),
+                                  tuned.documents.widestThreshold()),
+            tuned.documents.first()),
+      callsThatMadeIt(servo.calls()), spacing(options.measureOverNs), inForcePpb(clock.offsetPpb())
 {
-    tuningNotes.insert(tuningNotes.end(), later.notes().begin(), later.notes().end());
+    if (servo.factor() == options.factor) return;
+    tuned.notes.push_back(fmt::format("resolution {} ppb: limits and thresholds allow no finer one",
+                                      1.0 / servo.factor()));
+}
+
+tDiscipline::tTuned tDiscipline::readDocuments(const tServoLibrary& library,
+                                               const tDisciplineOptions& options)
+{
+    tStillClock still;
+    tServoHost trial(library, still);
+    tNotes notes = tune(trial, options.tuning);
+    tLaterDocuments later(trial, options.later);
+    notes.insert(notes.end(), later.notes().begin(), later.notes().end());
+    return {std::move(notes), std::move(later)};
 }
 
 tStep tDiscipline::take(const tPair& pair)
@@ -21,7 +40,7 @@ tStep tDiscipline::take(const tPair& pair)
     step.dryRun = options.dryRun;
     step.heldBack = spacing.holdsBack(pair.elapsedNs);
     if (!step.heldBack) hand(pair, step);
-    step.locked = lock.locked();
+    step.locked = servo.locked();
     step.inForcePpb = inForcePpb;
     step.steps = steps;
     step.locksLost = locksLost;
@@ -32,17 +51,19 @@ tStep tDiscipline::take(const tPair& pair)
 void tDiscipline::hand(const tPair& pair, tStep& step)
 {
     try {
-        host.adjustTime(pair.referenceNs, pair.clockNs);
+        step.event = servo.adjustTime(pair.referenceNs, pair.clockNs);
     } catch (...) {
         step.failure = std::current_exception();
     }
-    step.calls = host.calls();
+    step.calls = servo.calls();
     followOrders(step);
     if (step.failure) return;
-    step.event = lock.observe(step.calls);
-    spacing.given(pair.elapsedNs, step.event, lock.measuring());
+    spacing.given(pair.elapsedNs, step.event, servo.measuring());
     if (step.event == kLockLost) ++locksLost;
-    step.tuning = later.observe(host, pair.elapsedNs, lock.locked());
+    const auto change = tuned.documents.observe(pair.elapsedNs, servo.locked());
+    if (!change) return;
+    servo.writeParameters(change->parameters);
+    step.tuning = change->text;
 }
 
 void tDiscipline::followOrders(tStep& step)
@@ -58,23 +79,20 @@ void tDiscipline::followOrders(tStep& step)
 
 void tDiscipline::clearHistory()
 {
-    host.clearHistory();
-    if (lock.locked()) ++locksLost;
-    lock.restart();
+    const bool wasLocked = servo.locked();
+    servo.clearHistory();
+    if (wasLocked) ++locksLost;
     spacing.restart();
 }
 
 tNotes tDiscipline::retune()
 {
-    tStillClock still;
-    tServoHost trial(library, still);
-    tNotes notes = tune(trial, options.tuning);
-    tLaterDocuments anew(trial, options.later);
-    notes.insert(notes.end(), anew.notes().begin(), anew.notes().end());
-    host.writeConfig(trial.readConfig()); // all keys: what is no longer in a document goes back
-    anew.takeOver(later);
-    later = anew;
-    return notes;
+    tTuned anew = readDocuments(library, options);
+    servo.requireThreshold(anew.documents.widestThreshold());
+    servo.writeParameters(anew.documents.first());
+    anew.documents.takeOver(tuned.documents);
+    tuned = std::move(anew);
+    return tuned.notes;
 }
 
 void begin(const tDiscipline& discipline, const std::string& scenario, iStepObserver& observers)

@@ -4,8 +4,7 @@
 #include "loop/tLaterDocuments.h"
 #include "loop/tMeasureSpacing.h"
 #include "loop/tStep.h"
-#include "servo/tLockObserver.h"
-#include "servo/tServoHost.h"
+#include "servo/tFineServo.h"
 #include "servo/tuning.h"
 
 #include <string>
@@ -16,6 +15,7 @@ namespace dravikHost {
 // What every verb that disciplines a clock has.
 struct tDisciplineOptions {
     int32_t maxFrequencyOffsetPpb = 0;
+    int factor = tFineServo::kFinest; // at most so many parts of a ppb are ordered
     int64_t measureOverNs = 0;
     std::vector<tLaterDocument> later; // in the order of their times
     std::string csv;                   // "": none; "-": stdout
@@ -33,29 +33,34 @@ public:
 
     // The calls that made the servo, and what is to be known of its documents.
     const tHostCalls& firstCalls() const { return callsThatMadeIt; }
-    const tNotes& notes() const { return tuningNotes; }
+    const tNotes& notes() const { return tuned.notes; }
 
     tStep take(const tPair& pair);
 
     // Lets the servo measure anew, as if it had just been made, with its tuning.
     void clearHistory();
 
-    // Reads all documents again, on a servo of its own first: if it throws std::runtime_error, all
-    // is as it was. Returns what is to be known of them.
+    // Reads all documents again: if it throws std::runtime_error, all is as it was. Returns what is
+    // to be known of them.
     tNotes retune();
 
 private:
+    // All documents of the run, as they are taken by a servo of their own, and so in real units.
+    struct tTuned {
+        tNotes notes;
+        tLaterDocuments documents;
+    };
+    static tTuned readDocuments(const tServoLibrary& library, const tDisciplineOptions& options);
+
     void hand(const tPair& pair, tStep& step);
     void followOrders(tStep& step);
 
     const tServoLibrary& library;
     const tDisciplineOptions& options;
-    tServoHost host;
+    tTuned tuned;
+    tFineServo servo;
     tHostCalls callsThatMadeIt;
-    tLockObserver lock;
     tMeasureSpacing spacing;
-    tNotes tuningNotes;
-    tLaterDocuments later;
     double inForcePpb;
     int64_t steps = 0;
     int64_t locksLost = 0;

@@ -4,35 +4,43 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
+
 namespace dravikHost {
 
 // Every document is applied once before the first pair: a file that would be refused in the middle
 // of a run is refused at its start.
 tLaterDocuments::tLaterDocuments(tServoHost& servo, const std::vector<tLaterDocument>& options)
+    : firstTuning(tServoParameters::of(servo.readConfig()))
 {
-    if (options.empty()) return;
-    firstTuning = servo.readConfig();
-    for (const tLaterDocument& option : options)
-        documents.push_back({option, applyConfigFile(servo, option.file, found)});
-    servo.writeConfig(firstTuning);
+    for (const tLaterDocument& option : options) {
+        applyConfigFile(servo, option.file, found);
+        documents.push_back({option, tServoParameters::of(servo.readConfig())});
+    }
 }
 
-std::string tLaterDocuments::observe(tServoHost& servo, int64_t elapsedNs, bool locked)
+double tLaterDocuments::widestThreshold() const
+{
+    double widest = firstTuning.snapTimeThreshold;
+    for (const tDocument& document : documents)
+        widest = std::max(widest, document.parameters.snapTimeThreshold);
+    return widest;
+}
+
+std::optional<tTuningChange> tLaterDocuments::observe(int64_t elapsedNs, bool locked)
 {
     if (!locked) {
         lockedSinceNs.reset();
-        if (applied == 0) return "";
+        if (applied == 0) return std::nullopt;
         applied = 0;
-        servo.writeConfig(firstTuning);
-        return "tuned as at the start";
+        return tTuningChange{firstTuning, "tuned as at the start"};
     }
     if (!lockedSinceNs) lockedSinceNs = elapsedNs;
     if (applied == documents.size() ||
         elapsedNs - *lockedSinceNs < documents[applied].option.afterNs)
-        return "";
+        return std::nullopt;
     const tDocument& next = documents[applied++];
-    servo.writeConfig(next.text);
-    return fmt::format("tuned by {}", next.option.file);
+    return tTuningChange{next.parameters, fmt::format("tuned by {}", next.option.file)};
 }
 
 } // namespace dravikHost

@@ -33,6 +33,14 @@ std::string tServoParameters::documentText() const
     return document.lines();
 }
 
+std::string tServoParameters::exactText() const
+{
+    tJsonObject document;
+    for (size_t i = 0; i < zvckmservo_kParameterCount; ++i)
+        document.add(zvckmservo_parameters[i].key, this->*kMembers[i]);
+    return document.line();
+}
+
 tServoParameters tServoParameters::of(const std::string& document)
 {
     const tJson root = parseJson(document);

@@ -17,6 +17,9 @@ struct tServoParameters {
     // A document with all of them, six digits each, a line for each key.
     std::string documentText() const;
 
+    // As many digits as it takes to read the same values back.
+    std::string exactText() const;
+
     // Of a document with all eleven keys, as the plug-in gives it out. Throws std::runtime_error.
     static tServoParameters of(const std::string& document);
 };

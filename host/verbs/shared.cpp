@@ -24,6 +24,17 @@ tLaterDocument parseLater(const std::string& text)
             text.substr(equals + 1)};
 }
 
+// The coarsest power of two that is as fine.
+int factorOf(const std::string& resolution)
+{
+    const double ppb =
+        parseWithin({"--resolution", kFrequency, "", "0.015625ppb", "1ppb", ""}, resolution);
+    int factor = 1;
+    while (factor * ppb < 1)
+        factor *= 2;
+    return factor;
+}
+
 void addLater(std::vector<tLaterDocument>& later, const std::string& text)
 {
     const tLaterDocument document = parseLater(text);
@@ -99,6 +110,13 @@ void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline)
                      {"--measure-over", kDuration, "0ns", "0ns", "24h",
                       "Least time over which the frequency is\nmeasured; pairs between are held "
                       "back"});
+    const auto takeResolution = [&factor = discipline.factor](const std::string& text) {
+        factor = tFineServo::kFinest;
+        if (text != "finest") factor = factorOf(text);
+    };
+    options.parsed("--resolution", kFrequency.placeholder, takeResolution,
+                   "Of orders, down to 0.015625ppb; 1ppb shows the\nservo the clock as it is",
+                   "finest");
     options.repeatable(
         "--then", "AFTER=FILE",
         [&later = discipline.later](const std::string& text) { addLater(later, text); },

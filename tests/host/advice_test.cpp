@@ -91,7 +91,7 @@ void expectLine(const tAdviceRow& row)
 TEST(LoopAdvice, tellsWhatNeedsNoNoise)
 {
     using p = tServoParameters;
-    const tServoParameters slow = law(1e-4, 1.01);
+    const tServoParameters slow = law(1e-6, 1.01);
     const tAdviceRow kRows[] = {
         {"! frequencyLockGain 1.001 sets the frequency +1000.000 ppm off, beyond most clocks' "
          "limit",
@@ -115,11 +115,13 @@ TEST(LoopAdvice, tellsWhatNeedsNoNoise)
          "dB)\n",
          {}},
         {"  3 dB bandwidth above half the rate of pairs, gain peaking 9.54 dB", law(1, 2)},
-        {"  orders are whole ppb: without noise the error may stay within 1.471 ns\n", law(2, 1.17),
-         0.125},
-        {"! gain too small to act: no error below snapTimeThreshold, 1 us, makes half of 1 ppb",
+        {"  orders are in steps of 0.015625 ppb: without noise the error may stay within 0.02298 "
+         "ns\n",
+         law(2, 1.17), 0.125},
+        {"! gain too small to act: no error below snapTimeThreshold, 1 us, makes half of 0.015625 "
+         "ppb",
          slow},
-        {"! gain too small to correct the frequency: a lasting error has to reach 500 us",
+        {"! gain too small to correct the frequency: a lasting error has to reach 781.2 us",
          with(&p::snapTimeThreshold, 1e-5, slow)},
     };
     for (const tAdviceRow& row : kRows)
@@ -131,8 +133,9 @@ TEST(LoopAdvice, foretellsWhatSimulationsShow)
     const tServoParameters tight = with(&tServoParameters::spikeFilterGrowthFactor, 1.4,
                                         with(&tServoParameters::spikeFilterEnabled, 1));
     const tAdviceRow kRows[] = {
-        {"! orders in whole ppb, from which the law starts again, raise its error to 32", //
-         law(0.05, 1.02), 1, 5},
+        {"! orders in steps of 0.015625 ppb, from which the law starts again, raise its "
+         "error to 2.7",
+         law(0.01, 1.02), 0.0625, 5},
         {"! these locks are lost by the spike filter", tight, 1, 50},
     };
     for (const tAdviceRow& row : kRows)
