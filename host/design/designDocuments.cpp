@@ -1,6 +1,6 @@
 #include "design/designDocuments.h"
 
-#include "design/tLoopGains.h"
+#include "design/kalmanDesign.h"
 #include "maths/patternSearch.h"
 
 #include <fmt/format.h>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "design/tLoopGains.h"
+#include "design/kalmanDesign.h"
 #include "design/tNoiseModel.h"
 #include "design/tTrial.h"
 #include "servo/tServoParameters.h"

@@ -1,8 +1,8 @@
 #include "design/loopAdvice.h"
 
+#include "design/kalmanDesign.h"
 #include "design/tLoopAnalysis.h"
 #include "design/tLoopForecast.h"
-#include "design/tLoopGains.h"
 #include "design/tTrial.h"
 #include "text/quantity.h"
 

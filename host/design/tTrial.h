@@ -1,6 +1,6 @@
 #pragma once
 
-#include "design/tLoopGains.h"
+#include "design/kalmanDesign.h"
 #include "design/tNoiseModel.h"
 #include "servo/tServoLibrary.h"
 

@@ -17,6 +17,7 @@ tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
             tuned.documents.first()),
       callsThatMadeIt(servo.calls()), spacing(options.measureOverNs), inForcePpb(clock.offsetPpb())
 {
+    if (options.selfTune) selfTuning.emplace(servo, clock);
     if (servo.factor() == options.factor) return;
     tuned.notes.push_back(fmt::format("resolution {} ppb: limits and thresholds allow no finer one",
                                       1.0 / servo.factor()));
@@ -38,8 +39,12 @@ tStep tDiscipline::take(const tPair& pair)
     tStep step;
     step.pair = pair;
     step.dryRun = options.dryRun;
-    step.heldBack = spacing.holdsBack(pair.elapsedNs);
-    if (!step.heldBack) hand(pair, step);
+    try {
+        step.heldBack = !isToBeHanded(pair, step);
+        if (!step.heldBack) hand(pair, step);
+    } catch (...) {
+        step.failure = std::current_exception();
+    }
     step.locked = servo.locked();
     step.inForcePpb = inForcePpb;
     step.steps = steps;
@@ -47,19 +52,37 @@ tStep tDiscipline::take(const tPair& pair)
     return step;
 }
 
+bool tDiscipline::isToBeHanded(const tPair& pair, tStep& step)
+{
+    if (!selfTuning) return !spacing.holdsBack(pair.elapsedNs);
+    const auto advice = selfTuning->prepare(pair.elapsedNs, pair.errorNs());
+    step.calls = selfTuning->orders();
+    followOrders(step);
+    step.belief = selfTuning->belief();
+    step.tuning = selfTuning->note();
+    if (advice == tSelfTuning::kMeasureAnew) clearHistory();
+    return advice != tSelfTuning::kLeaveOut;
+}
+
 // What the clock was asked is part of the step also if the plug-in then failed.
 void tDiscipline::hand(const tPair& pair, tStep& step)
 {
+    std::exception_ptr failure;
     try {
         step.event = servo.adjustTime(pair.referenceNs, pair.clockNs);
     } catch (...) {
-        step.failure = std::current_exception();
+        failure = std::current_exception();
     }
-    step.calls = servo.calls();
+    const tHostCalls& calls = servo.calls();
+    step.calls.insert(step.calls.end(), calls.begin(), calls.end());
     followOrders(step);
-    if (step.failure) return;
+    if (failure) std::rethrow_exception(failure);
     spacing.given(pair.elapsedNs, step.event, servo.measuring());
     if (step.event == kLockLost) ++locksLost;
+    if (selfTuning) {
+        selfTuning->follow(pair.errorNs(), step.event, calls);
+        return;
+    }
     const auto change = tuned.documents.observe(pair.elapsedNs, servo.locked());
     if (!change) return;
     servo.writeParameters(change->parameters);
@@ -83,6 +106,12 @@ void tDiscipline::clearHistory()
     servo.clearHistory();
     if (wasLocked) ++locksLost;
     spacing.restart();
+    if (selfTuning) selfTuning->restart();
+}
+
+void tDiscipline::wait(int64_t elapsedNs)
+{
+    if (selfTuning) selfTuning->coast(elapsedNs);
 }
 
 tNotes tDiscipline::retune()

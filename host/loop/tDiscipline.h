@@ -4,6 +4,7 @@
 #include "loop/tLaterDocuments.h"
 #include "loop/tMeasureSpacing.h"
 #include "loop/tStep.h"
+#include "selftune/tSelfTuning.h"
 #include "servo/tFineServo.h"
 #include "servo/tuning.h"
 
@@ -19,7 +20,8 @@ struct tDisciplineOptions {
     int64_t measureOverNs = 0;
     std::vector<tLaterDocument> later; // in the order of their times
     std::string csv;                   // "": none; "-": stdout
-    bool dryRun = false;               // no order reaches the clock
+    bool selfTune = false;
+    bool dryRun = false; // no order reaches the clock
     tTuning tuning;
     std::string library;
 };
@@ -37,6 +39,9 @@ public:
 
     tStep take(const tPair& pair);
 
+    // There was no pair by then. A clock that is tuned from within is let run at its mean rate.
+    void wait(int64_t elapsedNs);
+
     // Lets the servo measure anew, as if it had just been made, with its tuning.
     void clearHistory();
 
@@ -52,6 +57,7 @@ private:
     };
     static tTuned readDocuments(const tServoLibrary& library, const tDisciplineOptions& options);
 
+    bool isToBeHanded(const tPair& pair, tStep& step);
     void hand(const tPair& pair, tStep& step);
     void followOrders(tStep& step);
 
@@ -59,6 +65,7 @@ private:
     const tDisciplineOptions& options;
     tTuned tuned;
     tFineServo servo;
+    std::optional<tSelfTuning> selfTuning;
     tHostCalls callsThatMadeIt;
     tMeasureSpacing spacing;
     double inForcePpb;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "selftune/tBelief.h"
 #include "servo/tHostCall.h"
 #include "servo/tLockObserver.h"
 #include "sources/iPairSource.h"
@@ -14,18 +15,19 @@ namespace dravikHost {
 // What a servo made of one pair, and how its clock stands after it.
 struct tStep {
     tPair pair{};
-    bool heldBack = false;      // for a longer measurement: the servo did not see it
-    bool dryRun = false;        // no order reaches the clock: steps and frequencies are only wishes
-    tLeftOut leftOut;           // samples so far, of a live source
-    tHostCalls calls;           // that the servo made
+    bool heldBack = false; // the servo did not see it: for a longer measurement, or not believed
+    bool dryRun = false;   // no order reaches the clock: steps and frequencies are only wishes
+    tLeftOut leftOut;      // samples so far, of a live source
+    tHostCalls calls;      // that the servo made
     std::exception_ptr failure; // of the servo; what stands below is of the pair before
     tLockEvent event = kNothingNew;
     bool locked = false;
-    int64_t stepNs = 0;    // by which the clock was stepped
-    double inForcePpb = 0; // offset of the clock's rate from here on
-    int64_t steps = 0;     // so far; in a dry run there are none
-    int64_t locksLost = 0; // so far
-    std::string tuning;    // what became of the servo's tuning, in words; mostly ""
+    int64_t stepNs = 0;            // by which the clock was stepped
+    double inForcePpb = 0;         // offset of the clock's rate from here on
+    int64_t steps = 0;             // so far; in a dry run there are none
+    int64_t locksLost = 0;         // so far
+    std::optional<tBelief> belief; // of self-tuning
+    std::string tuning;            // what became of the servo's tuning, in words; mostly ""
 };
 
 // The reference says nothing.

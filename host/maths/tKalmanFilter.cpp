@@ -18,6 +18,15 @@ void tKalmanFilter::predict(double seconds, const tCovariance& added)
                   p.xy + seconds * p.yy + added.xy, p.yy + added.yy};
 }
 
+void tKalmanFilter::move(double phaseBy, double frequencyBy, const tCovariance& doubt)
+{
+    phase += phaseBy;
+    frequency += frequencyBy;
+    covariance.xx += doubt.xx;
+    covariance.xy += doubt.xy;
+    covariance.yy += doubt.yy;
+}
+
 tKalmanFilter::tGains tKalmanFilter::update(double innovation, double noiseVariance)
 {
     const tCovariance p = covariance;

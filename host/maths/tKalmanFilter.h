@@ -25,6 +25,9 @@ struct tKalmanFilter {
 
     void predict(double seconds, const tCovariance& added);
 
+    // The clock is elsewhere and runs otherwise by so much, as far as is known.
+    void move(double phaseBy, double frequencyBy, const tCovariance& doubt);
+
     // Takes a measurement that differs from the phase by the innovation.
     tGains update(double innovation, double noiseVariance);
 };

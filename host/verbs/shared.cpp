@@ -122,6 +122,9 @@ void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline)
         [&later = discipline.later](const std::string& text) { addLater(later, text); },
         "A further document once the lock has held\nso long; repeatable");
     options.text("--csv", "FILE", discipline.csv, "Every pair and host call; - is stdout");
+    options.flag("--self-tune", discipline.selfTune,
+                 "No document: learn noise and oscillator from\nthe pairs, and tune the servo all "
+                 "the while");
     addTuningOptions(options, discipline.tuning);
     options.library(discipline.library);
 }

@@ -2,9 +2,9 @@
 
 #include "design/designDocuments.h"
 #include "design/estimateNoise.h"
+#include "design/kalmanDesign.h"
 #include "design/loopAdvice.h"
 #include "design/tLoopAnalysis.h"
-#include "design/tLoopGains.h"
 #include "design/tTrial.h"
 #include "host/stepFixture.h"
 #include "maths/tNoise.h"

@@ -1,0 +1,98 @@
+#include "selftune/tWanderBank.h"
+
+#include <cmath>
+
+namespace dravikHost {
+
+namespace {
+
+constexpr double kLowestRatio = 3e-5; // each next one is twice as large, up to 4
+constexpr double kChange = 1e-3;      // chance that the ratio is another one at the next pair
+
+// How likely a measurement is that is off by so much, squared, in variances foreseen: Student's
+// distribution of seven degrees of freedom, which an outlier does not persuade.
+double likelihood(double square, double variance)
+{
+    const double tail = 1 + square / 7;
+    return 1 / (tail * tail * tail * tail * std::sqrt(variance));
+}
+
+} // namespace
+
+tWanderBank::tWanderBank() { shares.fill(1.0 / kModels); }
+
+void tWanderBank::begin(const tKalmanFilter& start, double seconds)
+{
+    interval = seconds;
+    filters.fill(start);
+    double ratio = kLowestRatio;
+    for (double& each : wander) {
+        each = ratio / (seconds * std::sqrt(seconds));
+        ratio *= 2;
+    }
+}
+
+void tWanderBank::predict(double seconds)
+{
+    for (size_t i = 0; i < kModels; ++i)
+        filters[i].predict(seconds, disturbance(0, wander[i], seconds));
+}
+
+void tWanderBank::take(double phaseNs, double noiseVariance)
+{
+    for (size_t i = 0; i < kModels; ++i) {
+        const double innovation = phaseNs - filters[i].phase;
+        const double variance = filters[i].covariance.xx + 1;
+        shares[i] *= likelihood(innovation * innovation / (variance * noiseVariance), variance);
+        filters[i].update(innovation, 1);
+    }
+    normalise();
+    for (double& share : shares)
+        share = (1 - kChange) * share + kChange / kModels;
+}
+
+void tWanderBank::move(double phaseNs, double frequencyPpb, const tCovariance& doubt)
+{
+    for (tKalmanFilter& filter : filters)
+        filter.move(phaseNs, frequencyPpb, doubt);
+}
+
+// In whole octaves, as the models are. What comes in at the edge was never looked at.
+void tWanderBank::noiseGrew(double times)
+{
+    constexpr double kNever = 1e-6;
+    constexpr double kHalfOctave = 1.41421356;
+    const auto shift = [this](size_t from, size_t to) {
+        for (size_t i = 0; i + 1 < kModels; ++i) {
+            const size_t at = from < to ? kModels - 1 - i : i;
+            shares[at] = shares[at + from - to];
+        }
+        shares[from < to ? 0 : kModels - 1] = kNever;
+    };
+    for (; times > kHalfOctave; times /= 2)
+        shift(1, 0);
+    for (; times < 1 / kHalfOctave; times *= 2)
+        shift(0, 1);
+    normalise();
+}
+
+// The mean on a logarithmic scale, straight between the powers of two.
+double tWanderBank::ratio() const
+{
+    double place = 0;
+    for (size_t i = 0; i < kModels; ++i)
+        place += shares[i] * static_cast<double>(i);
+    const double whole = std::floor(place);
+    return std::ldexp(kLowestRatio * (1 + place - whole), static_cast<int>(whole));
+}
+
+void tWanderBank::normalise()
+{
+    double sum = 0;
+    for (const double share : shares)
+        sum += share;
+    for (double& share : shares)
+        share /= sum;
+}
+
+} // namespace dravikHost
