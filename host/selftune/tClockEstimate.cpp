@@ -65,6 +65,11 @@ void tClockEstimate::wait(int64_t elapsedNs)
     bank.predict(passed);
 }
 
+double tClockEstimate::secondsSincePair(int64_t elapsedNs) const
+{
+    return pairNs ? secondsOf(elapsedNs - *pairNs) : 0;
+}
+
 // Of the noise, in ppb per root second.
 double tClockEstimate::wanderShare() const
 {

@@ -46,6 +46,7 @@ public:
     double phaseNs() const { return static_cast<double>(baseNs) + filter.phase; }
     double frequencyPpb() const { return filter.frequency; }
     double secondsPerPair() const { return pace; } // mostly
+    double secondsSincePair(int64_t elapsedNs) const;
     double jumpNs() const { return lastJumpNs; }
     const tKalmanFilter::tGains& gains() const { return latestGains; } // of the latest good pair
     tBelief belief() const;

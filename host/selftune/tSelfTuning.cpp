@@ -71,8 +71,10 @@ void tSelfTuning::follow(int64_t errorNs, tLockEvent event, const tHostCalls& ca
 
 bool tSelfTuning::coast(int64_t elapsedNs)
 {
+    constexpr double kLate = 1.5; // spacings
     ownOrders.clear();
     if (isCoasting || !servo.locked()) return false;
+    if (estimate.secondsSincePair(elapsedNs) < kLate * estimate.secondsPerPair()) return false;
     isCoasting = true;
     estimate.wait(elapsedNs);
     order(inForcePpb - estimate.frequencyPpb());

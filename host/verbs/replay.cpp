@@ -7,6 +7,7 @@
 #include <fmt/format.h>
 
 #include <memory>
+#include <stdexcept>
 
 namespace dravikHost {
 
@@ -19,8 +20,8 @@ struct tReplay : tDisciplineOptions {
 
 std::string scenarioText(const tRecording& recording, const char* mode, const tReplay& options)
 {
-    return fmt::format("replay: {}, {} measurements from {};\n        {}; {}", recording.name,
-                       recording.pairs.size(), recording.format, mode,
+    return fmt::format("replay: {}, {} measurements from {};\n        {}; {}; {}", recording.name,
+                       recording.pairs.size(), recording.format, mode, tuningText(options),
                        tServoLibrary::find(options.library));
 }
 
@@ -64,7 +65,14 @@ std::function<void()> addReplay(tOptionSet& options)
                  "loop; else pairs as recorded, verbatim");
     addFreeRunningOption(options, replay->trace);
     addDisciplineOptions(options, *replay);
-    options.finally([replay] { requireOneInput(replay->tuning); });
+    options.finally([replay, options] {
+        requireOneTuning(options, *replay);
+        if (replay->selfTune && !replay->reDiscipline) {
+            throw std::invalid_argument(
+                "--self-tune: needs --re-discipline, as verbatim the orders "
+                "have no effect to learn from");
+        }
+    });
     return [replay] { run(*replay); };
 }
 

@@ -35,8 +35,8 @@ std::string scenarioText(const tRun& options, const tServoLibrary& library)
 {
     const std::string start =
         options.clock == "soft" ? ", " + options.initialError.text() : std::string();
-    return fmt::format("run: clock {}{}; reference {}; {}", options.clock, start, options.reference,
-                       library.path);
+    return fmt::format("run: clock {}{}; reference {}; {}; {}", options.clock, start,
+                       options.reference, tuningText(options.discipline), library.path);
 }
 
 // What is read on demand is silent only when readings fail.
@@ -104,7 +104,7 @@ void addClockOptions(tOptionSet& options, tRun& run)
 // What would have no effect is a mistake.
 void requireConsistency(const tOptionSet& options, const tRun& run)
 {
-    requireOneInput(run.discipline.tuning);
+    requireOneTuning(options, run.discipline);
     if (run.reference == run.clock)
         throw std::invalid_argument("--clock: " + run.clock + " is its own reference");
     if (options.given("--interval") && !isReadOnDemand(run.reference))
@@ -115,6 +115,15 @@ void requireConsistency(const tOptionSet& options, const tRun& run)
                                         ": only the soft clock starts as one likes");
         }
     }
+}
+
+// Nobody knows the noise beforehand: who names no tuning leaves it to the program.
+void tuneItself(const tOptionSet& options, tDisciplineOptions& discipline)
+{
+    const auto given = [&options](const char* name) { return options.given(name); };
+    if (!given("--config") && !given("--then") && !given("--metadata") &&
+        !given("--reference-type") && !given("--measure-over"))
+        discipline.selfTune = true;
 }
 
 void addGuardOptions(tOptionSet& options, tRun& run)
@@ -167,7 +176,10 @@ std::function<void()> addRun(tOptionSet& options)
     addGuardOptions(options, *run);
     addSilenceOptions(options, *run);
     addWatcherOptions(options, *run);
-    options.finally([run, options] { requireConsistency(options, *run); });
+    options.finally([run, options] {
+        requireConsistency(options, *run);
+        tuneItself(options, run->discipline);
+    });
     return [run] { dravikHost::run(*run); };
 }
 

@@ -101,6 +101,28 @@ void requireOneInput(const tTuning& tuning)
         throw std::invalid_argument("--config: the standard input is taken by --metadata");
 }
 
+void requireOneTuning(const tOptionSet& options, const tDisciplineOptions& discipline)
+{
+    requireOneInput(discipline.tuning);
+    if (!discipline.selfTune) return;
+    for (const char* const option :
+         {"--config", "--then", "--metadata", "--reference-type", "--measure-over"}) {
+        if (!options.given(option)) continue;
+        throw std::invalid_argument(std::string("--self-tune: ") + option +
+                                    " says how to tune; it is one or the other");
+    }
+}
+
+std::string tuningText(const tDisciplineOptions& discipline)
+{
+    const tTuning& tuning = discipline.tuning;
+    if (discipline.selfTune) return "self-tuned";
+    if (tuning.configFile) return "tuned by " + *tuning.configFile;
+    if (tuning.metaDataFile) return "tuned for what " + *tuning.metaDataFile + " tells";
+    if (tuning.referenceType) return "tuned for the type '" + *tuning.referenceType + "'";
+    return "with the built-in parameters";
+}
+
 void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline)
 {
     options.quantity(discipline.maxFrequencyOffsetPpb,

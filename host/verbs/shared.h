@@ -14,6 +14,12 @@ namespace dravikHost {
 void addTuningOptions(tOptionSet& options, tTuning& tuning);
 void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline);
 
+// What would have no effect, or two things say differently, is a mistake.
+void requireOneTuning(const tOptionSet& options, const tDisciplineOptions& discipline);
+
+// "self-tuned", "tuned by a.json" and the like.
+std::string tuningText(const tDisciplineOptions& discipline);
+
 // Files that may both be the standard input, which has one text to give.
 void requireOneInput(const tTuning& tuning);
 

@@ -103,9 +103,9 @@ void run(const tSimulation& options)
     tSimulatedSource source(clock, scenario, noise, options.seed);
     const std::string file = options.scenario.empty() ? "" : ", scenario " + options.scenario;
     runInMadeTime(library, clock, source,
-                  fmt::format("simulate: clock {}{}, seed {}; {}",
+                  fmt::format("simulate: clock {}{}, seed {}; {}; {}",
                               tInitialError{first.stepNs, first.frequencyPpb}.text(), file,
-                              options.seed, library.path),
+                              options.seed, tuningText(options), library.path),
                   options);
 }
 
@@ -125,7 +125,7 @@ std::function<void()> addSimulate(tOptionSet& options)
     options.text("--scenario", "FILE", simulation->scenario,
                  "What is simulated, and changes on the way");
     options.finally([simulation, options] {
-        requireOneInput(simulation->tuning);
+        requireOneTuning(options, *simulation);
         checkScenario(options, *simulation);
     });
     return [simulation] { run(*simulation); };

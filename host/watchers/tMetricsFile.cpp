@@ -6,6 +6,7 @@
 
 #include <cmath>
 #include <stdexcept>
+#include <vector>
 
 namespace dravikHost {
 
@@ -62,7 +63,7 @@ std::string tMetricsFile::text(const tSilence& now) const
 {
     const double unknown = std::nan("");
     const double errorNs = now.holdoverNs ? now.errorNs.value_or(unknown) : 0;
-    const tMetric metrics[] = {
+    std::vector<tMetric> metrics = {
         {"dravik_offset_seconds", "gauge", "Clock minus reference, as measured last.",
          pairs > 0 ? secondsOf(latest.pair.errorNs()) : unknown},
         {"dravik_frequency_offset", "gauge", "Offset of the clock's rate in force, a fraction.",
@@ -82,6 +83,22 @@ std::string tMetricsFile::text(const tSilence& now) const
         {"dravik_samples_unusable_total", "counter", "Samples of the reference not usable.",
          static_cast<double>(now.leftOut.unusable)},
     };
+    if (latest.belief) {
+        const tBelief& belief = *latest.belief;
+        metrics.insert(
+            metrics.end(),
+            {{"dravik_noise_seconds", "gauge",
+              "Deviation of a measurement, as self-tuning believes.", secondsOf(belief.noiseNs)},
+             {"dravik_wander", "gauge",
+              "Random walk of the oscillator's rate, a fraction per root second, as "
+              "self-tuning believes.",
+              belief.wanderPpb * 1e-9},
+             {"dravik_gain", "gauge",
+              "Share of what was not foreseen that is taken for the clock's.", belief.gain},
+             {"dravik_expected_error_seconds", "gauge",
+              "Deviation of the clock's error while locked, as self-tuning believes.",
+              secondsOf(belief.errorNs)}});
+    }
     std::string text;
     for (const tMetric& metric : metrics) {
         const std::string value =

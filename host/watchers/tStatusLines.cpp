@@ -21,6 +21,14 @@ int stateOf(const tStep& step)
     return step.stepNs != 0 ? 1 : 0;
 }
 
+// Times in ns, as in the rest of the line.
+std::string beliefText(const std::optional<tBelief>& belief)
+{
+    if (!belief) return "";
+    return fmt::format(" noise {:.3g} wander {:.3g} gain {:.3g} expected {:.3g}", belief->noiseNs,
+                       belief->wanderPpb, belief->gain, belief->errorNs);
+}
+
 } // namespace
 
 void tStatusLines::see(const tStep& step)
@@ -35,9 +43,10 @@ void tStatusLines::see(const tStep& step)
 
 void tStatusLines::printPair(const tStep& step)
 {
-    console.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}{}\n",
+    console.print(fmt::format("{} offset {:>10} s{} freq {:>+7.0f}{}{}\n",
                               headText(step.pair.elapsedNs), step.pair.errorNs(), stateOf(step),
-                              0 - step.inForcePpb, newlyLeftOut(step.leftOut)));
+                              0 - step.inForcePpb, beliefText(step.belief),
+                              newlyLeftOut(step.leftOut)));
 }
 
 void tStatusLines::printStretch(const tStep& step)
@@ -46,10 +55,10 @@ void tStatusLines::printStretch(const tStep& step)
     figures.add(step.pair, step.inForcePpb);
     if (!lineNs) lineNs = elapsedNs;
     if (elapsedNs - *lineNs < *intervalNs) return;
-    console.print(fmt::format("{} rms {:>4.0f} max {:>4.0f} freq {:>+7.0f} +/- {:>3.0f}{}\n",
+    console.print(fmt::format("{} rms {:>4.0f} max {:>4.0f} freq {:>+7.0f} +/- {:>3.0f}{}{}\n",
                               headText(elapsedNs), figures.rmsNs(), figures.peakNs(),
                               0 - figures.meanPpb(), figures.deviationPpb(),
-                              newlyLeftOut(step.leftOut)));
+                              beliefText(step.belief), newlyLeftOut(step.leftOut)));
     lineNs = elapsedNs;
     figures = {};
 }
