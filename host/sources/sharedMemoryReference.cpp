@@ -1,6 +1,7 @@
 #include "sources/iReference.h"
 
 #include "clocks/systemTime.h"
+#include "sources/tSamplePace.h"
 #include "text/quantity.h"
 
 #include <fmt/format.h>
@@ -42,6 +43,7 @@ private:
     unsigned char* segment = nullptr;
     bool wide = false; // time_t of 64 bits
     int64_t unusableCount = 0;
+    tSamplePace pace;
 };
 
 // The members of the segment, by their offsets in bytes. Reference is the true time of an event
@@ -155,9 +157,8 @@ tSharedMemoryReference::~tSharedMemoryReference() { (void)shmdt(segment); }
 // Nobody tells when a sample comes.
 std::optional<tReferenceSample> tSharedMemoryReference::next(int64_t atMostNs)
 {
-    constexpr int64_t kPollNs = 10'000'000;
     if (const auto sample = take()) return sample;
-    nap(std::min(atMostNs, kPollNs));
+    nap(std::min(atMostNs, pace.napNs(static_cast<int64_t>(rawTimeNs()))));
     return take();
 }
 
@@ -171,6 +172,7 @@ std::optional<tReferenceSample> tSharedMemoryReference::take()
     if (word(valid) == 0) return std::nullopt;
     const auto sample = sampleInSegment(word, wide);
     __atomic_store_n(wordAt(valid), 0U, __ATOMIC_RELEASE); // taken
+    pace.taken(static_cast<int64_t>(rawTimeNs()));
     if (!sample) ++unusableCount;
     return sample;
 }

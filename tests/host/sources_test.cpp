@@ -3,6 +3,7 @@
 #include "sources/iReference.h"
 #include "sources/recordedSources.h"
 #include "sources/tLiveSource.h"
+#include "sources/tSamplePace.h"
 #include "sources/tSimulatedSource.h"
 #include "support/failureOf.h"
 #include "text/quantity.h"
@@ -465,6 +466,22 @@ TEST(MeasurementError, isNoiseAndNowAndThenAnOutlier)
     EXPECT_NEAR(1000, above, 100);
     EXPECT_NEAR(1000, below, 100);
     EXPECT_NEAR(25, squares / 18'000, 1);
+}
+
+TEST(Sources, lookForASampleWhenItIsDue)
+{
+    tSamplePace pace;
+    const int64_t ms = 1'000'000;
+    for (const int64_t takenMs : {0, 1000, 2050, 3000, 4000}) {
+        EXPECT_EQ(10 * ms, pace.napNs(takenMs * ms));
+        pace.taken(takenMs * ms);
+    }
+    EXPECT_EQ(931 * ms, pace.napNs(4000 * ms)); // 950 is the shortest, and a fiftieth before
+    EXPECT_EQ(10 * ms, pace.napNs(4925 * ms));
+    EXPECT_EQ(10 * ms, pace.napNs(9000 * ms));
+    for (int i = 1; i <= 4; ++i)
+        pace.taken((4000 + 4 * i) * ms);
+    EXPECT_EQ(4 * ms, pace.napNs(4016 * ms)); // never less often than they come
 }
 
 } // namespace
