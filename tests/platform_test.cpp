@@ -284,6 +284,7 @@ TEST(String, CapacitiesAndContents)
     EXPECT_STREQ("ab", text.getText());
     text.reserve(1000, s);
     const char* const before = text.getText();
+    text.reserve(999, s);
     text.assign(std::string(1000, 'x').c_str(), 1000, s);
     EXPECT_EQ(before, text.getText()) << "what fits stays in place";
     text.assign(before + 998, 2, s);
