@@ -27,6 +27,8 @@ sed 's/1e-25/-0/' zeros > negative
 printf '1e200\n0\n' > large
 yes 0 | head -n 1000 > long
 head -n 999 long > few
+printf 'ptp4l[%d.0]: rms   50 max   80 freq  +1000 +/-  20\n' 1 2 > summaries
+head -n 4 trace.csv > unlocked
 check() { # NAME STATUS PATTERN OPTIONS...
     local name=$1 status=$2 pattern=$3 found=0
     shift 3
@@ -43,6 +45,7 @@ done << 'END'
 from the lock on  |0|^trace.csv: measured error, 89 points from 10\.000 s to 99\.000 s$|trace.csv
 its figures       |0|^mean -2\.921 ns, RMS 28\.[0-9]+ ns, peak 40 ns, peak to peak 70 ns$|trace.csv
 its lock          |0|^locked after 10 s, lock lost 0 times$|trace.csv
+before the lock   |0|^never locked$|unlocked
 a part of it      |0|2 points from 20\.000 s to 21\.000 s$|trace.csv --from 20s --to 21s
 a gap             |0|^longest stretch without a gap: 59 points$|trace.csv
 no gap            |0|^ +8 s +8 |trace.csv --from 41s
@@ -63,6 +66,7 @@ out of range      |1|^dravik-host: large cannot be read: line 1 is an error of y
 no such mask      |2|--mask|trace.csv --mask g8273.2-e
 mask and edition  |3|^mask g8273.2-c: ITU-T G.8273.2, second edition of October 2020 with amendments 1 .* and 2 .*class C$|trace.csv --mask g8273.2-c
 mask of a TC      |3|^mask g8273.3-b: ITU-T G.8273.3, second edition of October 2020; class B$|trace.csv --mask g8273.3-b
+mask of summaries |1|^dravik-host: summaries cannot be held to a mask$|summaries --mask 802.1as
 mask held         |0|^mask g8273.2-d +max .TE_L. 5 ns +held +0 ns$|long --interval 1s --mask g8273.2-d
 free-running      |3|^mask 802.1as +TDEV 5 ns per s of tau up to 10 s, free-running clock +broken +35.12 ns at 1 s$|trace.csv --mask 802.1as
 mask broken       |3|^mask g8273.2-c +max .TE. 30 ns +broken +40 ns$|trace.csv --mask g8273.2-c

@@ -45,6 +45,20 @@ expect "a host of another's name" "$wanted" \
 expect "none of them" "dravik-host: the standard input has no source 'eth2', but 'ptp4l'" \
     "$(daemon ptp4l 'master ' '' | messages --source eth2 | tail -n 1)"
 
+# Summaries alone are refused, with the setting of their program that prints each measurement.
+while IFS='|' read -r program setting; do
+    expect "summaries of $program" "dravik-host: the standard input has summaries only; $setting" "$(
+        printf "$program"'[%d.0]: rms   50 max   80 freq  +1000 +/-  20\n' 1 2 | sed 's/phc2sys[^:]*:/& eth0/' | messages)"
+done << 'END'
+phc2sys|phc2sys prints each measurement with -u 0
+dravik-host|run prints each measurement with --status 0
+ptp4l|ptp4l prints each measurement with summary_interval -7 (phc2sys with -u 0)
+END
+
+expect "time that starts anew" "dravik-host: the standard input: the time starts anew, as after a reboot, so there are 2 stretches
+dravik-host: the standard input: only the longest stretch is used, 3 of 5 measurements" \
+    "$(printf 'ptp4l[%d.0]: master offset 5 s2 freq +1 path delay 5\n' 10 11 1 2 3 | messages)"
+
 refclocks() {
     cat << END
 ====================================================================
