@@ -109,9 +109,14 @@ void tDiscipline::clearHistory()
     if (selfTuning) selfTuning->restart();
 }
 
-void tDiscipline::wait(int64_t elapsedNs)
+tSilence tDiscipline::wait(int64_t elapsedNs)
 {
-    if (selfTuning) selfTuning->coast(elapsedNs);
+    tSilence silence;
+    silence.elapsedNs = elapsedNs;
+    silence.dryRun = options.dryRun;
+    if (selfTuning && selfTuning->coast(elapsedNs)) silence.calls = selfTuning->orders();
+    if (!options.dryRun && !silence.calls.empty()) inForcePpb = silence.calls.back().ppb;
+    return silence;
 }
 
 tNotes tDiscipline::retune()
@@ -137,12 +142,17 @@ void disciplineAll(tDiscipline& discipline, iPairSource& source, const std::stri
     begin(discipline, scenario, observers);
     std::exception_ptr failure;
     try {
-        while (const auto pair = source.next())
-            show(discipline.take(*pair), observers);
+        while (const auto moment = source.next()) {
+            if (moment->pair) {
+                show(discipline.take(*moment->pair), observers);
+            } else {
+                observers.see(discipline.wait(moment->elapsedNs));
+            }
+        }
     } catch (...) {
         failure = std::current_exception();
     }
-    observers.end("");
+    observers.end(source.remarks());
     if (failure) std::rethrow_exception(failure);
 }
 

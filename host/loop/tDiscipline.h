@@ -39,8 +39,8 @@ public:
 
     tStep take(const tPair& pair);
 
-    // There was no pair by then. A clock that is tuned from within is let run at its mean rate.
-    void wait(int64_t elapsedNs);
+    // There was no pair by then.
+    tSilence wait(int64_t elapsedNs);
 
     // Lets the servo measure anew, as if it had just been made, with its tuning.
     void clearHistory();

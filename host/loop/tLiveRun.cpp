@@ -16,7 +16,7 @@ tLiveRun::tLiveRun(const tServoLibrary& library, iClock& clock, tSignals& signal
       discipline(library, guarded, options.discipline), sanity(options.sanityLimitPpb)
 {}
 
-void tLiveRun::run(const std::string& scenario, iLiveSource& source)
+void tLiveRun::run(const std::string& scenario, iPairSource& source)
 {
     begin(discipline, scenario, observers);
     std::exception_ptr failure;
@@ -94,9 +94,13 @@ void tLiveRun::silence(int64_t elapsedNs)
         observers.note(elapsedNs, latestNs ? "reference is silent: holding the frequency"
                                            : "no sample from the reference yet");
     }
-    const bool inHoldover = isSilent && latestNs;
-    observers.see(inHoldover ? tSilence{elapsedNs, lengthNs, estimate.errorNs(lengthNs), leftOut}
-                             : tSilence{elapsedNs, {}, {}, leftOut});
+    tSilence silence = discipline.wait(elapsedNs);
+    silence.leftOut = leftOut;
+    if (isSilent && latestNs) {
+        silence.holdoverNs = lengthNs;
+        silence.errorNs = estimate.errorNs(lengthNs);
+    }
+    observers.see(silence);
 }
 
 void tLiveRun::reload(int64_t elapsedNs)

@@ -29,7 +29,7 @@ public:
              const tLiveRunOptions& options, iStepObserver& observers);
 
     // Until the source ends.
-    void run(const std::string& scenario, iLiveSource& source);
+    void run(const std::string& scenario, iPairSource& source);
 
 private:
     void requireStep(int64_t deltaNs) const;

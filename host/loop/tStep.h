@@ -36,6 +36,8 @@ struct tSilence {
     std::optional<int64_t> holdoverNs{}; // since the last pair, once that is a holdover
     std::optional<double> errorNs{};     // by how far the clock may be off, one deviation; if known
     tLeftOut leftOut{};                  // samples so far
+    tHostCalls calls{};                  // orders to let the clock run on by itself
+    bool dryRun = false;                 // as of a step
 };
 
 // Somebody who watches a clock under discipline. Nobody asks a watcher what to do next.

@@ -17,16 +17,6 @@ struct tPair {
     int64_t errorNs() const { return static_cast<int64_t>(clockNs - referenceNs); }
 };
 
-// Where pairs come from, one after the other.
-class iPairSource
-{
-public:
-    virtual ~iPairSource() = default;
-
-    // Blocks until the next pair is due; nothing at the end.
-    virtual std::optional<tPair> next() = 0;
-};
-
 // Samples of a reference that became no pair, so far.
 struct tLeftOut {
     int64_t outOfDate = 0; // from before the latest order to the clock, or from the future
@@ -35,24 +25,25 @@ struct tLeftOut {
     int64_t all() const { return outOfDate + unusable; }
 };
 
-// Now, and what there is.
-struct tLiveMoment {
-    int64_t elapsedNs; // since the start, by CLOCK_MONOTONIC_RAW
+// A time, and the pair that came then, if any.
+struct tMoment {
+    int64_t elapsedNs; // since the start; in real time by CLOCK_MONOTONIC_RAW
     std::optional<tPair> pair;
     tLeftOut leftOut{};
 };
 
-// Where pairs come from at the pace of real time, or do not.
-class iLiveSource
+// Where pairs come from.
+class iPairSource
 {
 public:
-    virtual ~iLiveSource() = default;
+    virtual ~iPairSource() = default;
 
-    // Waits for the next pair, but for 100 ms at the most; nothing at the end.
-    virtual std::optional<tLiveMoment> next() = 0;
+    // Waits for the next pair, but for 100 ms at the most in real time; in time of its own making
+    // a moment without a pair is one at which a pair was due. Nothing at the end.
+    virtual std::optional<tMoment> next() = 0;
 
     // What people should know of it in the end; "": nothing.
-    virtual std::string remarks() const = 0;
+    virtual std::string remarks() const { return ""; }
 };
 
 } // namespace dravikHost

@@ -2,14 +2,15 @@
 
 namespace dravikHost {
 
-std::optional<tPair> tRecordedSource::next()
+std::optional<tMoment> tRecordedSource::next()
 {
     if (index == recording.pairs.size()) return std::nullopt;
     if (index > 0 && recording.pairs[index - 1].orderedPpb)
         clock.showOffset(*recording.pairs[index - 1].orderedPpb);
     const tRecordedPair& pair = recording.pairs[index++];
     clock.showTime(pair.clockNs);
-    return tPair{pair.elapsedNs, pair.referenceNs, pair.clockNs, pair.trueErrorNs};
+    return tMoment{pair.elapsedNs,
+                   tPair{pair.elapsedNs, pair.referenceNs, pair.clockNs, pair.trueErrorNs}};
 }
 
 tFreeRunningSource::tFreeRunningSource(const tRecording& recording, tFreeRunningClock& clock)
@@ -18,7 +19,7 @@ tFreeRunningSource::tFreeRunningSource(const tRecording& recording, tFreeRunning
     requireCorrections(recording);
 }
 
-std::optional<tPair> tFreeRunningSource::next()
+std::optional<tMoment> tFreeRunningSource::next()
 {
     if (index == recording.pairs.size()) return std::nullopt;
     const tRecordedPair& pair = recording.pairs[index];
@@ -34,7 +35,7 @@ std::optional<tPair> tFreeRunningSource::next()
     std::optional<double> trueErrorNs;
     if (pair.trueErrorNs)
         trueErrorNs = clock.aheadOfNs(nominalNs) - (pair.errorNs - *pair.trueErrorNs);
-    return tPair{pair.elapsedNs, pair.referenceNs, clockNs, trueErrorNs};
+    return tMoment{pair.elapsedNs, tPair{pair.elapsedNs, pair.referenceNs, clockNs, trueErrorNs}};
 }
 
 } // namespace dravikHost

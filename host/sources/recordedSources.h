@@ -16,7 +16,7 @@ public:
         : recording(recording), clock(clock)
     {}
 
-    std::optional<tPair> next() override;
+    std::optional<tMoment> next() override;
 
 private:
     const tRecording& recording;
@@ -34,7 +34,7 @@ public:
     // time. Throws std::runtime_error if the recording does not tell all corrections.
     tFreeRunningSource(const tRecording& recording, tFreeRunningClock& clock);
 
-    std::optional<tPair> next() override;
+    std::optional<tMoment> next() override;
 
 private:
     const tRecording& recording;

@@ -18,7 +18,7 @@ tLiveSource::tLiveSource(iLiveClock& clock, iReference& reference, const tSignal
 
 // A signal may also come between the test and the wait, where it interrupts nothing: hence naps.
 // A sample from before the latest order describes a clock that has changed since.
-std::optional<tLiveMoment> tLiveSource::next()
+std::optional<tMoment> tLiveSource::next()
 {
     constexpr int64_t kNapNs = 100'000'000;
     if (!ordered) ordered = crossRead();
@@ -26,19 +26,19 @@ std::optional<tLiveMoment> tLiveSource::next()
     const auto sample = reference.next(std::clamp<int64_t>(leftNs, 0, kNapNs));
     if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
         return std::nullopt;
-    if (!sample) return tLiveMoment{elapsedNs(), {}, leftOut()};
-    const tMoment now = crossRead();
+    if (!sample) return tMoment{elapsedNs(), {}, leftOut()};
+    const tReading now = crossRead();
     const bool even = ranEvenly(now);
     const bool upToDate =
         sample->systemNs >= ordered->reading.systemNs && sample->systemNs <= now.reading.systemNs;
     if (even && upToDate) {
         const tPair pair = pairAt(*sample, now);
         ordered.reset();
-        return tLiveMoment{pair.elapsedNs, pair, leftOut()};
+        return tMoment{pair.elapsedNs, pair, leftOut()};
     }
     ++outOfDate;
     if (!even) ordered = now;
-    return tLiveMoment{now.elapsedNs, {}, leftOut()};
+    return tMoment{now.elapsedNs, {}, leftOut()};
 }
 
 std::string tLiveSource::remarks() const
@@ -56,14 +56,14 @@ int64_t tLiveSource::elapsedNs() const
     return static_cast<int64_t>(options.rawNs() - startRawNs);
 }
 
-tLiveSource::tMoment tLiveSource::crossRead()
+tLiveSource::tReading tLiveSource::crossRead()
 {
     const tCrossReading reading = clock.crossRead();
     return {elapsedNs(), reading};
 }
 
 // Whether the machine's clock was left alone by others, who may step it.
-bool tLiveSource::ranEvenly(const tMoment& now) const
+bool tLiveSource::ranEvenly(const tReading& now) const
 {
     constexpr int64_t kReadingNs = 1'000'000;
     constexpr int64_t kFastest = 1000; // 1000 ppm
@@ -73,7 +73,7 @@ bool tLiveSource::ranEvenly(const tMoment& now) const
 }
 
 // The clock has run evenly since it was last ordered anything.
-tPair tLiveSource::pairAt(const tReferenceSample& sample, const tMoment& now) const
+tPair tLiveSource::pairAt(const tReferenceSample& sample, const tReading& now) const
 {
     const tCrossReading& from = ordered->reading;
     const tCrossReading& to = now.reading;

@@ -9,7 +9,7 @@ namespace dravikHost {
 
 // Pairs measured on this machine, at the pace of real time: what a reference says, and what the
 // clock showed at that moment.
-class tLiveSource : public iLiveSource
+class tLiveSource : public iPairSource
 {
 public:
     struct tOptions {
@@ -22,28 +22,28 @@ public:
     tLiveSource(iLiveClock& clock, iReference& reference, const tSignals& signals,
                 const tOptions& options);
 
-    std::optional<tLiveMoment> next() override;
+    std::optional<tMoment> next() override;
     std::string remarks() const override;
 
 private:
-    struct tMoment {
+    struct tReading {
         int64_t elapsedNs;
         tCrossReading reading;
     };
 
     int64_t elapsedNs() const;
     tLeftOut leftOut() const;
-    tMoment crossRead();
-    bool ranEvenly(const tMoment& now) const;
-    tPair pairAt(const tReferenceSample& sample, const tMoment& now) const;
+    tReading crossRead();
+    bool ranEvenly(const tReading& now) const;
+    tPair pairAt(const tReferenceSample& sample, const tReading& now) const;
 
     iLiveClock& clock;
     iReference& reference;
     const tSignals& signals;
     tOptions options;
     uint64_t startRawNs;
-    std::optional<tMoment> ordered; // since when the clock has not been ordered anything
-    int64_t outOfDate = 0;          // samples
+    std::optional<tReading> ordered; // since when the clock has not been ordered anything
+    int64_t outOfDate = 0;           // samples
 };
 
 } // namespace dravikHost

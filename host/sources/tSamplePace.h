@@ -7,8 +7,8 @@
 
 namespace dravikHost {
 
-// When to look for the next sample where nobody tells that one has come: seldom until shortly before
-// it is due, by the shortest of the latest spacings, and often from then on.
+// When to look for the next sample where nobody tells that one has come: seldom until shortly
+// before it is due, by the shortest of the latest spacings, and often from then on.
 class tSamplePace
 {
 public:

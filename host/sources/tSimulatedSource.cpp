@@ -30,17 +30,15 @@ tSimulatedSource::tSimulatedSource(tSimulatedClock& clock, tScenario phases, tNo
 {}
 
 // Numbers are drawn for a pair that does not come too, so that silence does not change the noise.
-std::optional<tPair> tSimulatedSource::next()
+std::optional<tMoment> tSimulatedSource::next()
 {
-    for (;;) {
-        const int64_t intervalNs = now.measurement.intervalNs;
-        if (elapsedNs + intervalNs >= now.measurement.durationNs) return std::nullopt;
-        elapsedNs += intervalNs;
-        if (elapsedNs > 0) clock.advance(intervalNs);
-        enterPhases();
-        const tPair pair = measure();
-        if (comes()) return pair;
-    }
+    const int64_t intervalNs = now.measurement.intervalNs;
+    if (elapsedNs + intervalNs >= now.measurement.durationNs) return std::nullopt;
+    elapsedNs += intervalNs;
+    if (elapsedNs > 0) clock.advance(intervalNs);
+    enterPhases();
+    const tPair pair = measure();
+    return tMoment{elapsedNs, comes() ? std::optional(pair) : std::nullopt};
 }
 
 void tSimulatedSource::enterPhases()

@@ -20,7 +20,7 @@ public:
     // pair to pair. What comes beside that noise has the seed.
     tSimulatedSource(tSimulatedClock& clock, tScenario scenario, tNoise& noise, uint64_t seed = 0);
 
-    std::optional<tPair> next() override;
+    std::optional<tMoment> next() override;
 
 private:
     void enterPhases();

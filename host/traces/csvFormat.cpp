@@ -44,6 +44,10 @@ private:
         kColumns
     };
     using tFields = std::array<std::string, kColumns>;
+    struct tOrder {
+        int64_t elapsedNs;
+        double ppb;
+    };
 
     static int columnOf(const std::string& title);
     static bool isHeader(std::string_view line);
@@ -53,6 +57,7 @@ private:
     static std::optional<tHostCall> callIn(const tFields& fields);
     tLine readCall(const tFields& fields, tRecordingBuilder& builder);
     std::string cutShort(const tFields& fields);
+    void averageOrders(tRecordingBuilder& builder, int64_t untilNs);
     void endPair(tRecordingBuilder& builder);
 
     std::string header;
@@ -65,6 +70,7 @@ private:
     double lowestPpb = 0;
     double highestPpb = 0;
     std::optional<double> orderedPpb;
+    std::vector<tOrder> orders;       // since the last pair; one may come while none does
     std::optional<double> initialPpb; // before anything was ordered
 };
 
@@ -193,6 +199,7 @@ tLine tCsvFormat::readPair(const tFields& fields, tRecordingBuilder& builder)
         return tLine::unread("no number in true_error_ns, step_ns or frequency_ppb");
     const std::string cut = cutShort(fields);
     if (!cut.empty()) return tLine::unread(cut);
+    averageOrders(builder, *elapsedNs);
     endPair(builder);
     tRecordedPair pair{};
     pair.elapsedNs = *elapsedNs;
@@ -241,6 +248,7 @@ tLine tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
         break;
     case kSetFrequency:
         orderedPpb = call->ppb;
+        orders.push_back({secondsIn(fields[kElapsed]).value_or(0), call->ppb});
         if (builder.last() != nullptr) builder.last()->orderedPpb = call->ppb;
         break;
     case kStepTime:
@@ -250,6 +258,22 @@ tLine tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
         break;
     }
     return {tLine::kFrame, ""};
+}
+
+// From pair to pair a clock has one rate here: if it was ordered another one in between, the mean.
+void tCsvFormat::averageOrders(tRecordingBuilder& builder, int64_t untilNs)
+{
+    tRecordedPair* const last = builder.last();
+    if (last != nullptr && orders.size() > 1) {
+        double sum = 0;
+        for (size_t i = 0; i < orders.size(); ++i) {
+            const int64_t endNs = i + 1 < orders.size() ? orders[i + 1].elapsedNs : untilNs;
+            sum += orders[i].ppb * static_cast<double>(endNs - orders[i].elapsedNs);
+        }
+        const auto passedNs = static_cast<double>(untilNs - orders.front().elapsedNs);
+        if (passedNs > 0) last->orderedPpb = sum / passedNs;
+    }
+    orders.clear();
 }
 
 // What the calls of the pair before say of its state.

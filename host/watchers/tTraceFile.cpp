@@ -31,6 +31,11 @@ void tTraceFile::see(const tStep& step)
     if (step.failure) file->flush();
 }
 
+void tTraceFile::see(const tSilence& silence)
+{
+    if (file) addCalls(silence.elapsedNs, silence.calls, silence.dryRun);
+}
+
 void tTraceFile::addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held)
 {
     for (const tHostCall& call : calls) {

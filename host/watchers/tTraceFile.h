@@ -17,8 +17,8 @@ public:
 
     void begin(const std::string& scenario, const tHostCalls& calls) override;
     void see(const tStep& step) override;
+    void see(const tSilence& silence) override;
     void end(const std::string& remarks) override;
-    using iStepObserver::see;
 
 private:
     void addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held);

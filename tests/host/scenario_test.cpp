@@ -28,8 +28,8 @@ tPairs pairsOf(const std::string& text)
                           oscillator, 1000, noise, 5);
     tSimulatedSource source(clock, scenario, noise, 5);
     tPairs pairs;
-    while (const auto pair = source.next())
-        pairs.push_back(*pair);
+    while (const auto moment = source.next())
+        if (moment->pair) pairs.push_back(*moment->pair);
     return pairs;
 }
 

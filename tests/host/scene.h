@@ -29,7 +29,7 @@ private:
 
 // A clock 3 ms ahead, 20 ppm fast and steered within 100 ppm, beside a perfect reference. A second
 // passes for each letter of the script; most are plain.
-struct tScene : iLiveSource {
+struct tScene : iPairSource {
     tFailingClock clock{kStartNs + 3'000'000, 20'000, 100'000};
     tPair pair{0, kStartNs, kStartNs + 3'000'000, {}};
     const char* script = "";
@@ -48,12 +48,12 @@ struct tScene : iLiveSource {
         pair.clockNs = clock.timeNs();
         return pair;
     }
-    std::optional<tLiveMoment> next() override
+    std::optional<tMoment> next() override
     {
         if (*script == '\0') return std::nullopt;
         const bool silent = *script == '~';
         second(*script++);
-        return tLiveMoment{pair.elapsedNs, silent ? std::nullopt : std::optional(pair)};
+        return tMoment{pair.elapsedNs, silent ? std::nullopt : std::optional(pair)};
     }
     std::string remarks() const override { return "two left out"; }
 };

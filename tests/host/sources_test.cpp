@@ -71,8 +71,8 @@ protected:
         return {clock, reference, signals, {offsetNs, durationNs, rawTime}};
     }
     // A sample from so long after the raw clock's 0, which comes after a time.
-    std::optional<tLiveMoment> sampleOf(iLiveSource& source, int64_t systemNs, int64_t passNs,
-                                        int64_t jumpNs = 0)
+    std::optional<tMoment> sampleOf(iPairSource& source, int64_t systemNs, int64_t passNs,
+                                    int64_t jumpNs = 0)
     {
         reference.passNs = passNs;
         reference.jumpNs = jumpNs;
@@ -436,7 +436,7 @@ TEST(FreeRunningSource, takesTheRecordedCorrectionsOutAndPutsItsOwnIn)
         clock.setOffsetPpb(orderedPpb);
         tFreeRunningSource source(made, clock);
         for (const int64_t seconds : {0, 2, 3}) {
-            const auto pair = source.next();
+            const auto pair = source.next()->pair;
             const int64_t errorNs = 100 + (10 + orderedPpb) * seconds;
             EXPECT_EQ(seconds * kSecondNs, pair->elapsedNs);
             EXPECT_NEAR(errorNs, pair->errorNs(), 1);
