@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <limits>
 #include <numeric>
 #include <stdexcept>
 
@@ -153,10 +154,10 @@ public:
     // A coarse grid finds the right hill, the search its top.
     std::vector<double> top() const
     {
-        std::vector<double> best = {-8, -8};
-        double least = cost(best);
-        for (const double white : {-12, -8, -4, 0, 4}) {
-            for (const double walk : {-14, -12, -10, -8, -6, -4, -2, 0, 2}) {
+        std::vector<double> best;
+        double least = std::numeric_limits<double>::infinity();
+        for (double white = kLeastWhite; white <= kMostWhite; white += 4) {
+            for (double walk = kLeastWalk; walk < kMostWalk; walk += 2) {
                 const double value = cost({white, walk});
                 if (!(value < least)) continue;
                 least = value;
@@ -172,8 +173,6 @@ public:
     double wanderAtFoot(const std::vector<double>& top, double direction) const
     {
         constexpr double kStep = 0.1;
-        constexpr double kLeastWalk = -14; // as the grid has it
-        constexpr double kMostWalk = 4;
         const double most = cost(top) + kFall / likelihood.measurements();
         std::vector<double> place = top;
         place[1] = std::max(place[1], kLeastWalk);
@@ -209,6 +208,12 @@ public:
 private:
     // Of twice the logarithm, one time in twenty: chi-squared with one degree of freedom.
     static constexpr double kFall = 3.84;
+
+    // Logarithms of ratios; what lies beyond them shows no more in any trace.
+    static constexpr double kLeastWhite = -12;
+    static constexpr double kMostWhite = 4;
+    static constexpr double kLeastWalk = -14;
+    static constexpr double kMostWalk = 4;
 
     tLikelihood& likelihood;
     double interval;

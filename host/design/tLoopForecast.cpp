@@ -158,7 +158,7 @@ tLoopForecast forecastLoop(const tServoLibrary& library, const tServoParameters&
     const tNoiseModel model = usualModel(interval, noiseNs);
     tLoopForecast forecast;
     forecast.noiseNs = noiseNs;
-    forecast.seenNs = noiseNs * std::hypot(1, loop.noiseGain);
+    forecast.seenNs = std::hypot(noiseNs, noiseNs * loop.noiseGain);
     forecast.linearNs = linearErrorNs(loop, model);
     forecast.roundedNs = roundedErrorNs(library, parameters, loop, model);
     const double astrayNs = kRootTwo * noiseNs * loop.takeUp / interval;

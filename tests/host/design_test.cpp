@@ -9,6 +9,8 @@
 #include "host/stepFixture.h"
 #include "maths/tNoise.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <cmath>
 #include <stdexcept>
@@ -272,6 +274,7 @@ TEST(Trial, isLongEnoughForTheLoop)
         const tTrialOptions options = trialFor({1, ki}, noiseOf(interval, 1, 1, 1));
         EXPECT_EQ(settling, options.settlingPairs) << ki;
         EXPECT_EQ(counted, options.countedPairs) << ki;
+        EXPECT_EQ(32U, options.seeds);
     }
 }
 
@@ -292,6 +295,24 @@ TEST(Trial, showsWhatTheLoopMakesOfNoise)
         EXPECT_NEAR(465 / interval, noisy.lostPerHour, 150 / interval);
     }
     EXPECT_THROW(runTrial(library(), "{", noiseOf(1, 50, 0, 0), {1, 1, 1}), std::runtime_error);
+}
+
+// On every machine, as documents quote such figures: of trials in ns (RMS, tail and peak) and locks
+// lost per hour; of starts how many never lock and fail, locks lost early and late, and ns RMS.
+TEST(Trial, isTheSameEverywhere)
+{
+    const tNoiseModel model{500'000'000, 200, 30, 20, 0.04, 2000, 7};
+    const std::string document = law(1.1, 2).documentText();
+    const tTrialResult held = runTrial(library(), document, model, {10, 301, 2});
+    EXPECT_EQ("393.58 1287.3 2778.1 243.09",
+              fmt::format("{:.5g} {:.5g} {:.5g} {:.5g}", held.rmsNs, held.tailNs, held.peakNs,
+                          held.lostPerHour));
+    for (const auto& [pairs, measureOverNs, figures] :
+         {std::tuple(9, 0, "1 4 0 4 1065.7"), {15, 1'000'000'000, "0 4 4 8 537.47"}}) {
+        const auto found = runStarts(library(), document, model, {pairs, 30, measureOverNs});
+        EXPECT_EQ(figures, fmt::format("{} {} {} {} {:.5g}", found.neverLocked, found.failed,
+                                       found.lostEarly, found.lostLate, found.rmsNs));
+    }
 }
 
 struct tAdviceRow {

@@ -130,6 +130,7 @@ TEST(LiveRun, endsRatherThanStep)
         EXPECT_NE(std::string::npos, reason.find(refused ? row.refusal : "")) << reason;
         EXPECT_EQ(refused, live.latest.failure != nullptr);
         EXPECT_EQ(row.orders, live.scene.clock.orders);
+        EXPECT_EQ(live.scene.clock.offsetPpb(), live.latest.inForcePpb);
     }
 }
 
