@@ -29,6 +29,20 @@ yes 0 | head -n 1000 > long
 head -n 999 long > few
 printf 'ptp4l[%d.0]: rms   50 max   80 freq  +1000 +/-  20\n' 1 2 > summaries
 head -n 4 trace.csv > unlocked
+printf '%se-9\n' 0 1 8 27 64 125 216 343 512 > cubes
+expect "table, and JSON" "" "$({ metrics cubes --interval 500ms && metrics cubes --interval 500ms --json; } | diff - <(cat << 'END'
+cubes: measured error, 9 points from 0.000 s to 4.000 s
+mean +144 ns, RMS 222.9 ns, peak 512 ns, peak to peak 512 ns
+       tau        n       ADEV      OADEV       MDEV       TDEV       MTIE
+    500 ms        1  3.795e-08  3.795e-08  3.795e-08   10.95 ns     169 ns
+       1 s        2  7.332e-08  7.200e-08  7.048e-08   40.69 ns     296 ns
+       2 s        4  1.358e-07  1.358e-07          -          -     448 ns
+{"points": 9, "from": 0, "to": 4, "mean": 1.44e-07, "rms": 2.2285122092253987e-07, "peak": 5.12e-07, "peakToPeak": 5.12e-07, "timeToLock": null, "locksLost": null, "interval": 0.5, "stretch": 9, "stability": [
+  {"n": 1, "tau": 0.5, "adev": 3.794733192202055e-08, "oadev": 3.794733192202055e-08, "mdev": 3.794733192202055e-08, "tdev": 1.0954451150103322e-08, "mtie": 1.69e-07},
+  {"n": 2, "tau": 1, "adev": 7.332121111929344e-08, "oadev": 7.200000000000001e-08, "mdev": 7.04840407468244e-08, "tdev": 4.069397989875162e-08, "mtie": 2.96e-07},
+  {"n": 4, "tau": 2, "adev": 1.3576450198781714e-07, "oadev": 1.3576450198781714e-07, "mdev": null, "tdev": null, "mtie": 4.4800000000000004e-07}], "format": "a column of phase", "source": "", "unread": 0, "events": 0}
+END
+))"
 check() { # NAME STATUS PATTERN OPTIONS...
     local name=$1 status=$2 pattern=$3 found=0
     shift 3
@@ -53,7 +67,6 @@ as JSON           |0|^\{"points": 89, "from": 10, "to": 99, .*"locksLost": 0, "i
 a limit broken    |3|^dravik-host: peak<40ns does not hold: it is 40 ns$|trace.csv --assert peak<=40ns --assert peak<40ns
 two broken        |3|^dravik-host: rms<1ns .*; locks-lost>0 does not hold: it is 0$|trace.csv --assert rms<1ns --assert locks-lost>0
 without its slope |0|^mean .* peak to peak 136.9 ns$|trace.csv --remove-slope
-numbers           |0|^numbers: measured error, 3 points from 0\.000 s to 1\.000 s$|numbers --interval 500ms
 a frequency       |0|^numbers: measured error, 4 points|numbers --interval 1s --frequency
 no slope          |1|^dravik-host: one measurement has no slope$|trace.csv --from 20s --to 20s --remove-slope
 nothing selected  |1|^dravik-host: trace.csv has no measurement in that time$|trace.csv --from 1h

@@ -104,6 +104,10 @@ TEST(LoopAdvice, tellsWhatNeedsNoNoise)
          "us, "
          "beyond snapTimeThreshold, 1 us: the lock never holds",
          with(&p::frequencyLockGain, 1.00001), 0.0625},
+        {"! frequencyLockGain 1.000000954 sets the frequency +0.001 ppm off: the error goes to "
+         "953.7 "
+         "ns, beyond snapTimeThreshold, 953.7 ns: never locks",
+         with(&p::frequencyLockGain, 1 + 0x1p-20, with(&p::snapTimeThreshold, 0x1p-20))},
         {"  frequencyLockGain 1.0000001 sets the frequency +0.100 ppm off: each lock begins with "
          "an "
          "error of up to 100 ns\n",

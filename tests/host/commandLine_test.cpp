@@ -43,13 +43,15 @@ std::function<void()> addVerb(tOptionSet& options)
 {
     const tOption flag = options.flag("--flag", given.flag, "");
     options.quantity(given.timeNs, {"--time", kDuration, "2us", "1us", "1ms", "How long"});
-    options.quantity(given.wholeNs, {"--whole", kDuration, "", "-1s", "1s", ""});
-    options.quantity(given.share, {"--share", kRatio, "", "0%", "100%", ""});
-    options.text("--kind", "KIND", given.kind, "").oneOf({"one", "two"}).excludes(flag);
-    options.text("-a,--also", "TEXT", given.also, "").needs(flag).showDefault();
+    options.quantity(given.wholeNs, {"--whole", kDuration, "", "-1s", "1s", "In all"});
+    options.quantity(given.share, {"--share", kRatio, "", "0%", "100%", "A part"});
+    options.text("--kind", "KIND", given.kind, "One of the kinds, of which there are two more.")
+        .oneOf({"one", "two"})
+        .excludes(flag);
+    options.text("-a,--also-known-by-the-name", "TEXT", given.also, "").needs(flag).showDefault();
     options.texts("files", "FILE", given.files, "").require();
     options.parsed("-p,--parsed", "NUMBER", takeNumber, "", "7");
-    options.repeatable("--number", "NUMBER", takeNumber, "");
+    options.repeatable("--number", "NUMBER", takeNumber, "Repeatable");
     options.finally([options] {
         if (options.given("--whole") && given.share == 1) throw std::invalid_argument("not both");
     });
@@ -115,7 +117,7 @@ TEST(CommandLine, refusesWhatIsWrong)
         {2, "--time: 1 required TIME missing", {"probe", "a", "--time"}},
         {2, "--kind: three not in {one,two}", {"probe", "a", "--kind", "three"}},
         {2, "--flag excludes --kind", {"probe", "a", "--kind", "one", "--flag"}},
-        {2, "--also requires --flag", {"probe", "a", "-a", "x"}},
+        {2, "--also-known-by-the-name requires --flag", {"probe", "a", "-a", "x"}},
         {2, "--parsed: 0 is refused", {"probe", "a", "-p", "0"}},
         {2, "not both", {"probe", "a", "--whole", "1s", "--share", "100%"}},
         {1, "it failed", {"probe", "a", "--flag", "-a", "fail"}},
@@ -141,9 +143,26 @@ TEST(CommandLine, helps)
     const tOutcome help = runWith({"probe", "--help"});
     EXPECT_EQ(0, help.status);
     EXPECT_FALSE(given.ran);
-    for (const char* const piece : {"--time TIME", "2us", "How long", "as before", "NUMBER", "7",
-                                    "3 a limit of metrics is not held.\n"})
-        EXPECT_NE(std::string::npos, help.out.find(piece)) << piece << "\n" << help.out;
+    const size_t begin = help.out.find("Positionals");
+    EXPECT_EQ(R"(Positionals:
+  files FILE ...                  (required)
+
+Options:
+  -h,--help                       Print this help message and exit
+  --flag                          (not with --kind)
+  --time TIME                     How long (default 2us)
+  --whole TIME                    In all
+  --share PERCENT                 A part
+  --kind KIND                     One of the kinds, of which there are two more.
+                                  (one of one, two; not with --flag)
+  -a,--also-known-by-the-name TEXT
+                                  (default as before; needs --flag)
+  -p,--parsed NUMBER              (default 7)
+  --number NUMBER                 Repeatable
+
+)",
+              help.out.substr(begin, help.out.find("Values") - begin));
+    EXPECT_NE(std::string::npos, help.out.find("3 a limit of metrics is not held.\n"));
 }
 
 } // namespace
