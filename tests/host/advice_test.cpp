@@ -104,7 +104,7 @@ TEST(LoopAdvice, tellsWhatNeedsNoNoise)
          "us, "
          "beyond snapTimeThreshold, 1 us: the lock never holds",
          with(&p::frequencyLockGain, 1.00001), 0.0625},
-        {"! frequencyLockGain 1.000000954 sets the frequency +0.001 ppm off: the error goes to "
+        {"! frequencyLockGain 1.000000954 sets the frequency +0.954 ppm off: the error goes to "
          "953.7 "
          "ns, beyond snapTimeThreshold, 953.7 ns: never locks",
          with(&p::frequencyLockGain, 1 + 0x1p-20, with(&p::snapTimeThreshold, 0x1p-20))},
@@ -164,7 +164,7 @@ TEST(LoopForecast, comesNearToRunsOfAnHour)
         {{}, 0.0625, 150, 0.6, 1.3, "186.1 110.2 106.4; true 0.5106 1.009; 4.7e-06 562.5 false"},
         {{}, 1, 500, 310, 375, "798.9 623.1 619.6; true 1 343.8; 9.6e-06 0 false"},
         {{}, 1, 100, 1e-6, 2e-6, "159.8 124.6 123.9; true 0 1.401e-06; 2e-06 0 false"}, // seldom
-        {{}, 1, 50, 0, 1e-9, "79.89 62.32 61.98; true 0 2.179e-32; 9.6e-07 0 false"},
+        {{}, 2, 0.1, 0, 1e-9, "0.2928 1.179 1.63; true 0 0; 3.6e-09 0 false"},
         {kTight, 1, 50, 10, 90, "79.89 62.32 61.98; true 0.755 39.6; 9.6e-07 0 true"},
         {slow, 1, 300, 5, 20, "302.3 37.16 114.3; true 0.8704 10.25; 6.2e-05 43000 false"},
         {never, 1, 50, 0, 1e-9, "79.89 62.32 8.71e+07; false 0 2.179e-32; 9.6e-07 0 false"},

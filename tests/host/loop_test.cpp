@@ -201,13 +201,14 @@ TEST(Discipline, isTunedAnewAsAWholeOrNotAtAll)
 
 TEST(Discipline, appliesLaterDocumentsAnewWhenTunedAnew)
 {
-    const tTestFile quiet("quiet.json", R"({"snapTimeThreshold": 1})");
+    const tTestFile quiet("quiet.json", R"({"snapTimeThreshold": 1, "gain": 2})");
     tScene scene;
     tDisciplineOptions options;
     options.later = {{2 * kSecondNs, quiet.path}};
     tDiscipline discipline(library(), scene.clock, options);
     for (const char* marks : {"-----t-", "t-"}) { // in a lock from the fourth pair on
-        discipline.retune();
+        EXPECT_EQ(tNotes{quiet.path + ": gain is not a key and sets nothing"}, discipline.retune());
+        EXPECT_EQ(1U, discipline.notes().size());
         for (; *marks != '\0'; ++marks)
             EXPECT_EQ(*marks == 't', !discipline.take(scene.second()).tuning.empty()) << marks;
     }
