@@ -29,6 +29,8 @@ yes 0 | head -n 1000 > long
 head -n 999 long > few
 printf 'ptp4l[%d.0]: rms   50 max   80 freq  +1000 +/-  20\n' 1 2 > summaries
 head -n 4 trace.csv > unlocked
+printf 'phc2sys[%d.0]: CLOCK_REALTIME rms %d max 60 freq +1 +/- 1 delay 5 +/- 0\n' 1 10 2 20 3 30 > sums
+printf 'time,offset\n0,1\n1,-3\n2,2\n' > columns
 printf '%se-9\n' 0 1 8 27 64 125 216 343 512 > cubes
 expect "table, and JSON" "" "$({ metrics cubes --interval 500ms && metrics cubes --interval 500ms --json; } | diff - <(cat << 'END'
 cubes: measured error, 9 points from 0.000 s to 4.000 s
@@ -67,6 +69,9 @@ as JSON           |0|^\{"points": 89, "from": 10, "to": 99, .*"locksLost": 0, "i
 a limit broken    |3|^dravik-host: peak<40ns does not hold: it is 40 ns$|trace.csv --assert peak<=40ns --assert peak<40ns
 two broken        |3|^dravik-host: rms<1ns .*; locks-lost>0 does not hold: it is 0$|trace.csv --assert rms<1ns --assert locks-lost>0
 without its slope |0|^mean .* peak to peak 136.9 ns$|trace.csv --remove-slope
+of summaries      |0|^mean not known, RMS 21.6 ns, peak 60 ns, peak to peak not known$|sums
+no mask of them   |1|^dravik-host: summaries cannot be held to a mask$|sums --mask g8273.2-a
+in a unit         |0|^mean .0 ns, RMS 2.16 us, peak 3 us, peak to peak 5 us$|columns --unit us
 a frequency       |0|^numbers: measured error, 4 points|numbers --interval 1s --frequency
 no slope          |1|^dravik-host: one measurement has no slope$|trace.csv --from 20s --to 20s --remove-slope
 nothing selected  |1|^dravik-host: trace.csv has no measurement in that time$|trace.csv --from 1h

@@ -86,6 +86,14 @@ c,1700003531419999977,1700003531420000000
 d,1700003532919999985,1700003532920000000
 END
 )"
+sums() { printf "$1[%d.000]: ${2}rms 10 max 20 freq +100 +/- 10 delay 5 +/- 0\n" 1 2; }
+expect "summaries only" "dravik-host: the standard input has summaries only; ptp4l prints each measurement with summary_interval -7 (phc2sys with -u 0)
+dravik-host: the standard input has summaries only; phc2sys prints each measurement with -u 0
+dravik-host: the standard input has summaries only; run prints each measurement with --status 0" \
+    "$(sums ptp4l '' | messages; sums phc2sys 'CLOCK_REALTIME ' | messages; sums dravik-host '' | messages)"
+expect "time that goes back" "dravik-host: the standard input: the time starts anew, as after a reboot, so there are 2 stretches
+dravik-host: the standard input: only the longest stretch is used, 3 of 4 measurements" \
+    "$(printf 'ptp4l[%d.000]: master offset 9 s2 freq +0 path delay 5\n' 10 3 4 5 | messages)"
 expect "no trace" "dravik-host: the standard input is no trace of a known kind; it begins with 'reference_ns,clock'" \
     "$(echo "reference_ns,clock" | messages)"
 expect "no measurement" "dravik-host: the standard input looks like CSV with reference_ns and clock_ns, but has no measurement; it begins with 'reference_ns,clock_ns'" \
