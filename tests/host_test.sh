@@ -85,6 +85,7 @@ table << END
 scenario beside it  |2|--noise: not with --scenario|simulate --scenario $scratch/typo --noise 1ns
 scenario misspelt   |1|typo:1: unknown statement 'clok'; did|simulate --scenario $scratch/typo
 unknown option      |2|^dravik-host: .*--speed|simulate --speed 1
+stray argument      |2|^dravik-host: unknown argument x$|show x
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 rate above 100 %    |2|--outlier-rate: '101%' is not within|simulate --outlier-rate 101%
 negative seed       |2|--seed: '-1'|simulate --seed -1

@@ -96,6 +96,8 @@ expect "then quiet" 1 "$(grep -c 'tuned by quiet.json' simulated)"
 "${host[@]}" tune --from-pi 0.1,1e-7 > pi.json
 expect "without a noise" "0.1 1.000001 1e-06 0" "$(key phaseLockGain pi.json) $(key phaseLockCoefficientA pi.json) $(
     key snapTimeThreshold pi.json) $(key spikeFilterEnabled pi.json)"
+"${host[@]}" tune --from-pi 0.7,0.3 --noise 100ns | cmp -s - <("${host[@]}" tune --from-pi 0.7,0.3)
+expect "with half a noise" 0 $?
 "${host[@]}" tune --from-pi 0.7,0.3 --noise 100ns --interval 1s > pi.json
 expect "with a noise" "1.2e-06 1" "$(key snapTimeThreshold pi.json) $(key spikeFilterEnabled pi.json)"
 
@@ -108,6 +110,7 @@ done << 'END'
 2|A trace, or --noise, --wander and --interval, or --from-pi is required|--noise 1ns
 2|--from-pi: '1,-1' is not KP,KI|--from-pi 1,-1
 2|--from-pi: '0,1' is not KP,KI|--from-pi 0,1
+2|--from-pi: '1,0' is not KP,KI|--from-pi 1,0
 2|--from-pi: '1,1,1' is not KP,KI|--from-pi 1,1,1
 2|--quick: several documents take files|--noise 1ns --wander 1ppb --interval 1s --quick -
 2|--from-pi: a trace has no say in it|trace.csv --from-pi 1,1

@@ -156,7 +156,7 @@ tLoopForecast forecastLoop(const tServoLibrary& library, const tServoParameters&
     constexpr double kFewer = 0.1; // of the locks lost, if advice is to be worth it
     const tLoopAnalysis loop(parameters, interval);
     const tNoiseModel model = usualModel(interval, noiseNs);
-    tLoopForecast forecast;
+    tLoopForecast forecast{};
     forecast.noiseNs = noiseNs;
     forecast.seenNs = std::hypot(noiseNs, noiseNs * loop.noiseGain);
     forecast.linearNs = linearErrorNs(loop, model);

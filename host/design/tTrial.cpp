@@ -103,7 +103,7 @@ tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
                       const tNoiseModel& model, const tTrialOptions& options)
 {
     const tServoParameters parameters = tServoParameters::of(document);
-    tTrialResult result;
+    tTrialResult result{};
     double squares = 0;
     double eighths = 0;
     int64_t lost = 0;
@@ -134,7 +134,7 @@ tStartResult runStarts(const tServoLibrary& library, const std::string& document
 {
     constexpr uint64_t kOffsetNs = 1'000'000;
     const tServoParameters parameters = tServoParameters::of(document);
-    tStartResult result;
+    tStartResult result{};
     double squares = 0;
     const int64_t half = options.pairs / 2;
     for (uint64_t i = 0; i < options.starts; ++i) {

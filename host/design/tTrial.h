@@ -21,10 +21,10 @@ struct tTrialOptions {
 };
 
 struct tTrialResult {
-    double rmsNs = 0;  // of the true error
-    double tailNs = 0; // its eighth moment's root, which rare large errors rule
-    double peakNs = 0;
-    double lostPerHour = 0; // locks
+    double rmsNs;  // of the true error
+    double tailNs; // its eighth moment's root, which rare large errors rule
+    double peakNs;
+    double lostPerHour; // locks
 };
 
 // Throws std::runtime_error if the document is refused.
@@ -40,11 +40,11 @@ struct tStartOptions {
 };
 
 struct tStartResult {
-    int64_t neverLocked = 0; // starts, of all
-    int64_t failed = 0;      // starts that missed the lock, or lost it in their first half
-    int64_t lostEarly = 0;   // locks, in the first half of the pairs
-    int64_t lostLate = 0;    // in the second half
-    double rmsNs = 0;        // of the true error, in the second half
+    int64_t neverLocked; // starts, of all
+    int64_t failed;      // starts that missed the lock, or lost it in their first half
+    int64_t lostEarly;   // locks, in the first half of the pairs
+    int64_t lostLate;    // in the second half
+    double rmsNs;        // of the true error, in the second half
 };
 
 tStartResult runStarts(const tServoLibrary& library, const std::string& document,

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <iterator>
 #include <numeric>
 #include <stdexcept>
 
@@ -119,8 +120,8 @@ std::vector<size_t> averagings(const tSeries& series, std::optional<double> tSta
 double largestMeanNs(const tSeries& series, size_t points)
 {
     const size_t n = std::min(points, series.phase.size());
-    std::vector<double> sums(series.phase.size() + 1, 0);
-    std::partial_sum(series.phase.begin(), series.phase.end(), sums.begin() + 1);
+    std::vector<double> sums = {0};
+    std::partial_sum(series.phase.begin(), series.phase.end(), std::back_inserter(sums));
     double largest = 0;
     for (size_t end = n; end < sums.size(); ++end)
         largest = std::max(largest, std::fabs(sums[end] - sums[end - n]));

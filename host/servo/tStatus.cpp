@@ -31,7 +31,7 @@ extern "C" bool hostReallocJson(zverr_Status* status, uint32_t size)
     char* const grown = static_cast<char*>(std::realloc(status->json, size));
     if (grown == nullptr) return false;
     if (first) std::memcpy(grown, "{}", sizeof "{}");
-    const uint32_t kept = first ? 2 : status->capacity - 1; // all but the old end mark
+    const uint32_t kept = first ? sizeof "{}" : status->capacity - 1; // all but the old end mark
     std::memset(grown + kept, 0, size - 1 - kept);
     grown[size - 1] = kEndMark;
     status->json = grown;

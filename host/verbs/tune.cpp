@@ -222,8 +222,8 @@ private:
 
     double interval;
     std::array<tServoParameters, 2> columns;
-    std::array<tTrialResult, 2> results;
-    std::array<tStartResult, 2> starts;
+    std::array<tTrialResult, 2> results{};
+    std::array<tStartResult, 2> starts{};
 };
 
 // quick.json, quick2.json, quick3.json

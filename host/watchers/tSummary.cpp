@@ -78,12 +78,6 @@ std::string tSummary::text() const
            lockText() + errorText() + frequencyText() + callsText() + warningText();
 }
 
-double tSummary::shareUnlocked() const
-{
-    const int64_t sinceNs = firstLockNs ? lastElapsedNs - *firstLockNs : 0;
-    return sinceNs > 0 ? static_cast<double>(unlockedNs) / static_cast<double>(sinceNs) : 0;
-}
-
 std::string tSummary::lockText() const
 {
     if (!firstLockNs) return fmt::format("lock        never; missed {}\n", times(locksMissed));
@@ -137,9 +131,11 @@ std::string tSummary::warningText() const
                            locksMissed > 0 ? kAdvice : "");
     }
     if (locksLost == 0) return "";
+    const double share =
+        static_cast<double>(unlockedNs) / static_cast<double>(lastElapsedNs - *firstLockNs);
     return fmt::format(
         "WARNING     the lock did not hold: lost {}, {:.3g} % of the time without it\n{}",
-        times(locksLost), shareUnlocked() * 100, kAdvice);
+        times(locksLost), share * 100, kAdvice);
 }
 
 } // namespace dravikHost

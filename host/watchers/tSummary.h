@@ -43,7 +43,6 @@ private:
     std::string frequencyText() const;
     std::string callsText() const;
     std::string warningText() const;
-    double shareUnlocked() const;
 
     tConsole& console;
     bool dryRun = false;

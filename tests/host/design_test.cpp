@@ -3,7 +3,6 @@
 #include "design/designDocuments.h"
 #include "design/estimateNoise.h"
 #include "design/kalmanDesign.h"
-#include "design/loopAdvice.h"
 #include "design/tLoopAnalysis.h"
 #include "design/tTrial.h"
 #include "host/stepFixture.h"
@@ -11,7 +10,6 @@
 
 #include <fmt/format.h>
 
-#include <algorithm>
 #include <cmath>
 #include <stdexcept>
 
@@ -313,70 +311,6 @@ TEST(Trial, isTheSameEverywhere)
         EXPECT_EQ(figures, fmt::format("{} {} {} {} {:.5g}", found.neverLocked, found.failed,
                                        found.lostEarly, found.lostLate, found.rmsNs));
     }
-}
-
-struct tAdviceRow {
-    const char* line;
-    tServoParameters parameters;
-    double interval = 1;
-    double noiseNs = 0; // 0: not known
-};
-
-tServoParameters filtered(double growth)
-{
-    tServoParameters parameters;
-    parameters.spikeFilterEnabled = 1;
-    parameters.spikeFilterGrowthFactor = growth;
-    return parameters;
-}
-
-TEST(LoopAdvice, hasALineForEachMatter)
-{
-    const tAdviceRow kRows[] = {
-        {"at one pair every 125 ms:", {}, 0.125},
-        {"  like a PI controller with kp 0.7 and ki 0.3 per second and pair", law(0.7, 10 / 7.0)},
-        {"! C is 0.9, below 1: frequency is forgotten, so an oscillator that is 1 ppm off keeps "
-         "the clock 181.8 ns off",
-         law(0.55, 2, 1, 0.9)},
-        {"! C is 1.5, above 1: frequency runs away", law(0.55, 2, 1, 1.5)},
-        {"  stable", law(0.55, 2, 1, 0.9)},
-        {"  stable below 2.424 s", {}, 0.125},
-        {"! unstable: at most 2.424 s from pair to pair, or a smaller gain", {}, 2.5},
-        {"! unstable at any interval", law(0.55, 0.5)},
-        {"! damping 0.13; settles within 16.16 s, overshoots by 71 %", {}, 0.125},
-        {"! damping 0.38; settles within 12.37 s, overshoots by 61 %", law(0.525, 2.2)},
-        {"  damping 0.43; settles within 11.53 s, overshoots by 54 %", {}},
-        {"  damping 0.82; settles within 7.65 s, overshoots by 30 %", law(0.7, 10 / 7.0)},
-        {"! too quick: alternates from pair to pair; settles within 2 s, overshoots by 100 %",
-         law(1, 2)},
-        {"  passes 224 % of the noise on to the clock", law(1, 2)},
-        {"  passes 40 % of the noise on to the clock, 20.24 ns", law(0.1846, 1.1018), 1, 50},
-        {"  snapTimeThreshold, 1 us, is 12.5 deviations of what it is compared with", {}, 1, 50},
-        {"! snapTimeThreshold, 1 us, is 1.3 deviations of what it is compared with: the lock is "
-         "lost about 344 times an hour",
-         {},
-         1,
-         500},
-        {"! better a snapTimeThreshold of 3.1 us, 3.1e-06 in the document", {}, 1, 160},
-        {"  spike filter off", {}, 1, 50},
-        {"  spike filter limits to 3.0 mean steps of the noise, 169.3 ns per pair", filtered(3), 1,
-         50},
-        {"! spike filter limits to 1.4 mean steps of the noise, 78.99 ns per pair, which it cuts "
-         "into: the loop is slowed",
-         filtered(1.4), 1, 50},
-    };
-    for (const tAdviceRow& row : kRows) {
-        const auto noise = row.noiseNs > 0 ? std::optional(row.noiseNs) : std::nullopt;
-        const std::string found = "\n" + loopAdvice(library(), row.parameters, row.interval, noise);
-        EXPECT_NE(std::string::npos, found.find("\n" + std::string(row.line) + "\n"))
-            << row.line << found;
-    }
-    const auto lines = [](const std::string& text) {
-        return std::count(text.begin(), text.end(), '\n');
-    };
-    EXPECT_EQ(3, lines(loopAdvice(library(), {}, 2.5, 50.0))); // nothing more on what is not stable
-    EXPECT_EQ(7, lines(loopAdvice(library(), {}, 1, std::nullopt)));
-    EXPECT_EQ(9, lines(loopAdvice(library(), {}, 1, 50.0)));
 }
 
 } // namespace

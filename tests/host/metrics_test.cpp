@@ -83,6 +83,7 @@ TEST(Series, areSummedAndFlattened)
 {
     EXPECT_EQ((std::vector<double>{0, 1, 0, 4}), phaseOf({0.5, {2, -2, 8}}).phase);
     EXPECT_EQ((std::vector<double>{1, 3, -1, 1}), withoutSlope({1, {1, 5, 3, 7}}).phase);
+    EXPECT_EQ((std::vector<double>{3, 3}), withoutSlope({1, {3, 5}}).phase);
     EXPECT_EQ((std::vector<double>{3}), withoutSlope({1, {3}}).phase);
 }
 

@@ -1,6 +1,9 @@
 #include "host/stepFixture.h"
 #include "watchers/tMetricsFile.h"
+#include "watchers/tReport.h"
 
+#include <cstdlib>
+#include <fcntl.h>
 #include <functional>
 #include <regex>
 #include <stdexcept>
@@ -97,6 +100,36 @@ TEST(MetricsFile, failsAtTheFirstFileOnly)
     });
     const std::string reason = " s  cannot write " + inTheWay + ": Is a directory\n";
     EXPECT_EQ("     2.000" + reason + "     6.000" + reason, text);
+}
+
+// What a terminal gets of one step or silence: a line, and when the console goes, its end.
+template <typename Moment> std::string progressOf(const Moment& moment)
+{
+    const tDescriptor terminal(posix_openpt(O_RDWR | O_NOCTTY));
+    EXPECT_EQ(0, grantpt(terminal.get()) + unlockpt(terminal.get()));
+    const tDescriptor line(open(ptsname(terminal.get()), O_RDWR | O_NOCTTY));
+    const tDescriptor before(dup(STDERR_FILENO));
+    dup2(line.get(), STDERR_FILENO);
+    {
+        tConsole console(false);
+        tReport(console).see(moment);
+    }
+    dup2(before.get(), STDERR_FILENO);
+    std::string text(100, '\0');
+    text.resize(static_cast<size_t>(read(terminal.get(), text.data(), text.size())));
+    return text;
+}
+
+TEST(Report, showsProgressOnATerminal)
+{
+    const auto line = [](const std::string& text) { return "\r\x1b[K" + text + "\r\x1b[K"; };
+    EXPECT_EQ(line("     1.000 s  locked, error +250 ns"), progressOf(stepAt(1, 250, true, 0)));
+    EXPECT_EQ(line("    12.500 s  not locked, error -3 us"),
+              progressOf(stepAt(12.5, -3000, false, 0)));
+    tSilence silence{nsOfSeconds(9), nsOfSeconds(4), 340.0};
+    EXPECT_EQ(line("     9.000 s  holdover for 4 s, error about 340 ns"), progressOf(silence));
+    silence.errorNs.reset();
+    EXPECT_EQ(line("     9.000 s  holdover for 4 s, error unknown"), progressOf(silence));
 }
 
 } // namespace
