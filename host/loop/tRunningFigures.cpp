@@ -16,19 +16,12 @@ void tRunningFigures::add(const tPair& pair, double orderedPpb)
     sumOfSquares += difference * difference;
 }
 
-double tRunningFigures::rmsNs() const
-{
-    return pairs == 0 ? 0 : std::sqrt(squares / static_cast<double>(pairs));
-}
+double tRunningFigures::rmsNs() const { return std::sqrt(squares / static_cast<double>(pairs)); }
 
-double tRunningFigures::meanPpb() const
-{
-    return pairs == 0 ? 0 : firstPpb + sum / static_cast<double>(pairs);
-}
+double tRunningFigures::meanPpb() const { return firstPpb + sum / static_cast<double>(pairs); }
 
 double tRunningFigures::deviationPpb() const
 {
-    if (pairs == 0) return 0;
     const double mean = sum / static_cast<double>(pairs);
     return std::sqrt(std::max(0.0, sumOfSquares / static_cast<double>(pairs) - mean * mean));
 }

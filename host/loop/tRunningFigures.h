@@ -6,7 +6,7 @@
 
 namespace dravikHost {
 
-// Errors and frequencies over a stretch of a run.
+// Errors and frequencies over a stretch of a run: its figures are of one pair at least.
 class tRunningFigures
 {
 public:

@@ -85,6 +85,8 @@ TEST(LoopAnalysis, knowsWhereStabilityEnds)
         EXPECT_EQ(0, outside.settling);
         EXPECT_EQ(row.stable > 0, tLoopAnalysis(row.parameters, row.stable).stable);
     }
+    for (const auto& [interval, marginal] : {std::pair(1.0, true), {1.99, true}, {2, false}})
+        EXPECT_EQ(marginal, tLoopAnalysis(law(1, 1), interval).marginal) << interval;
 }
 
 TEST(LoopGains, becomeALaw)
