@@ -168,6 +168,14 @@ TEST(LoopAdvice, hasALineForEachMatter)
          law(0.01, 1.02), 0.0625, 5},
         {"! snapTimeThreshold, 10 ns, is 0.0 deviations of what it is compared with: never locks",
          with(&p::snapTimeThreshold, 1e-8), 1, 5e6},
+        {"! the frequency is measured over one pair, through the noise, and 51.1 % of starts fail: "
+         "use --measure-over 562.5ms\n",
+         {},
+         0.0625,
+         150},
+        {"! the frequency is measured over one pair, through the noise, and 87.0 % of starts fail: "
+         "use --measure-over 43s\n",
+         with(&p::snapTimeThreshold, 2e-6, law(0.02, 1.01)), 1, 300},
         {"! these locks are lost by the spike filter", filtered(1.4), 1, 50},
     };
     for (const tAdviceRow& row : kRows)
@@ -280,8 +288,8 @@ TEST(NoiseEstimate, saysWhatItCannotTell)
 TEST(Design, refusesWhatNoClockIsLike)
 {
     for (const tNoiseModel& model :
-         {tNoiseModel{86'400'000'000'000, 1e9, 0.1, 0}, tNoiseModel{1'000'000, 1e9, 0.1, 0},
-          tNoiseModel{86'400'000'000'000, 1, 0.1, 1e6}})
+         {tNoiseModel{86'400'000'000'000, 1e9, 0.1, 0}, tNoiseModel{1'000'000'000, 8.1e8, 0.1, 0},
+          tNoiseModel{1'000'000, 1e9, 0.1, 0}, tNoiseModel{86'400'000'000'000, 1, 0.1, 1e6}})
         EXPECT_THROW(designDocuments(library(), model), std::runtime_error);
 }
 
