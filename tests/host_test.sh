@@ -36,18 +36,9 @@ table() { # rows of NAME|STATUS|PATTERN|ARGUMENTS on stdin
 echo '{"snapTimeThreshold": 10}' > "$scratch/blunt.json"
 bad="simulate --outlier-rate 1% --outlier-size 5us"
 table << END
-frequency measured  |0|^ +1\.000 s  frequency measured: \+12\.0.. ppm off|simulate
-clock stepped       |0|^ +2\.000 s  stepped by -1\.012 ms$|simulate
-locked on pair four |0|^ +3\.000 s  locked, error [+-][0-9]+ ns$|simulate
 lock kept           |0|^lock        after 3\.000 s, lost 0 times, missed 0 times; 297 of 297 pairs locked since$|simulate
-small error         |0|^error       RMS [1-4][0-9](\.[0-9]+)? ns, peak|simulate
 behind and slow     |0|^error       RMS [1-4][0-9](\.[0-9]+)? ns|simulate --initial-offset -3ms --frequency-error -12ppm
-no step below 1 us  |0|^ +2\.000 s  no step needed|simulate --initial-offset 0 --frequency-error 0
 outlier loses lock  |0|^ +162\.000 s  lock lost, error -5\.[0-9]+ us$|$bad
-lock regained       |0|^ +170\.000 s  locked|$bad
-losses counted      |0|lost 2 times|$bad
-out of reach        |0|^ +3\.000 s  frequency at its limit, -500\.000 ppm$|simulate --frequency-error 600ppm
-real time           |0|^pairs       [1-8] in 0\.[0-9]+ s$|run --duration 1s
 version             |0|^dravik-host [0-9]+\.[0-9]+\.[0-9]+$|--version
 help                |0|^refused document; 2 wrong usage; 3 a limit of metrics is not held\.$|simulate --help
 tuned before pair 1 |0|^ +2\.000 s  no step needed, error \+1\.012 ms|simulate --config $scratch/blunt.json
@@ -196,6 +187,7 @@ expect "no folder" "dravik-host: cannot write /none/a.svg: No such file or direc
 # inspects the buffer of the host's status: new, filled, grown, and asked to shrink.
 cat > "$scratch/bad.c" << 'END'
 #include "zvckmservo/servo.h"
+#include <stdlib.h>
 #include <string.h>
 static int wellFormed(const zverr_Status* s)
 {
@@ -206,11 +198,11 @@ static int wellFormed(const zverr_Status* s)
 void zvckmservo_adjustTime(zvckmservo_HostTable* h, uint64_t r, uint64_t c, zverr_Status* s)
 {
     (void)r, (void)c;
-    if (!s->reallocJson(s, 1) || strcmp(s->json, "{}") || !wellFormed(s)) s->code = -2;
+    if (!s->reallocJson(s, 1) || strcmp(s->json, "{}") || !wellFormed(s)) abort();
     h->setFrequency(2000000000, s);
     const uint32_t size = s->capacity + 100;
-    if (!wellFormed(s) || !s->reallocJson(s, size) || s->capacity != size) s->code = -3;
-    if (!s->reallocJson(s, 9) || s->capacity != size || !wellFormed(s)) s->code = -4;
+    if (!wellFormed(s) || !s->reallocJson(s, size) || s->capacity != size) abort();
+    if (!s->reallocJson(s, 9) || s->capacity != size || !wellFormed(s)) abort();
 }
 void zvckmservo_initialize(zvckmservo_HostTable* h, zverr_Status* s) { (void)h, (void)s; }
 void zvckmservo_finalize(zvckmservo_HostTable* h) { (void)h; }

@@ -83,10 +83,7 @@ no negative zero  |0|"peak": 0, |negative --interval 1s --json
 out of range      |1|^dravik-host: large cannot be read: line 1 is an error of years$|large --interval 1s
 no such mask      |2|--mask|trace.csv --mask g8273.2-e
 mask and edition  |3|^mask g8273.2-c: ITU-T G.8273.2, second edition of October 2020 with amendments 1 .* and 2 .*class C$|trace.csv --mask g8273.2-c
-mask of a TC      |3|^mask g8273.3-b: ITU-T G.8273.3, second edition of October 2020; class B$|trace.csv --mask g8273.3-b
 mask of summaries |1|^dravik-host: summaries cannot be held to a mask$|summaries --mask 802.1as
-mask held         |0|^mask g8273.2-d +max .TE_L. 5 ns +held +0 ns$|long --interval 1s --mask g8273.2-d
-free-running      |3|^mask 802.1as +TDEV 5 ns per s of tau up to 10 s, free-running clock +broken +35.12 ns at 1 s$|trace.csv --mask 802.1as
 mask broken       |3|^mask g8273.2-c +max .TE. 30 ns +broken +40 ns$|trace.csv --mask g8273.2-c
 not judged        |3|^mask g8273.2-a +cTE 50 ns, mean over 1000 s +not judged +2.712 ns; needs 1000 s of data, has 59 s$|trace.csv --mask g8273.2-a
 not judged, status|3|^dravik-host: limits of masks not judged: 1$|few --interval 1s --mask g8273.2-d

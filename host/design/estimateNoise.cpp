@@ -156,12 +156,14 @@ public:
     {
         std::vector<double> best;
         double least = std::numeric_limits<double>::infinity();
-        for (double white = kLeastWhite; white <= kMostWhite; white += 4) {
-            for (double walk = kLeastWalk; walk < kMostWalk; walk += 2) {
-                const double value = cost({white, walk});
+        for (int white = kLeastWhite; white <= kMostWhite; white += 4) {
+            for (int walk = kLeastWalk; walk < kMostWalk; walk += 2) {
+                const std::vector<double> place(
+                    {static_cast<double>(white), static_cast<double>(walk)});
+                const double value = cost(place);
                 if (!(value < least)) continue;
                 least = value;
-                best = {white, walk};
+                best = place;
             }
         }
         patternSearch([this](const auto& place) { return cost(place); }, best, {1, 1}, 5);
@@ -175,7 +177,7 @@ public:
         constexpr double kStep = 0.1;
         const double most = cost(top) + kFall / likelihood.measurements();
         std::vector<double> place = top;
-        place[1] = std::max(place[1], kLeastWalk);
+        place[1] = std::max<double>(place[1], kLeastWalk);
         double step = kStep;
         while (true) {
             place[1] += direction * step;
@@ -210,10 +212,10 @@ private:
     static constexpr double kFall = 3.84;
 
     // Logarithms of ratios; what lies beyond them shows no more in any trace.
-    static constexpr double kLeastWhite = -12;
-    static constexpr double kMostWhite = 4;
-    static constexpr double kLeastWalk = -14;
-    static constexpr double kMostWalk = 4;
+    static constexpr int kLeastWhite = -12;
+    static constexpr int kMostWhite = 4;
+    static constexpr int kLeastWalk = -14;
+    static constexpr int kMostWalk = 4;
 
     tLikelihood& likelihood;
     double interval;

@@ -1,5 +1,6 @@
 #include "clocks/tSteeredClock.h"
 #include "host/stepFixture.h"
+#include "servo/configDocument.h"
 #include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
 #include "servo/tServoParameters.h"
@@ -150,6 +151,14 @@ TEST_F(ServoHost, readsBackItsParameters)
               failureOf([] { tServoParameters::of(R"({"frequencyLockGain": "1"})"); }));
     EXPECT_EQ(100, withinBounds(zvckmservo_kSpikeFilterHistorySize, 1e3));
     EXPECT_EQ(-10, withinBounds(zvckmservo_kPhaseLockCoefficientC, -11));
+}
+
+TEST(Refusal, showsAPayloadThatSaysNoPlace)
+{
+    for (const char* const payload :
+         {"no details", R"({"file": "dravik/tServo"})", R"({"file": "dravik/tServo", "line": "1"})",
+          R"({"line": 1})", R"({"file": 1, "line": 1})"})
+        EXPECT_EQ(payload, refusalText(R"({"phaseLockGain": 20})", payload));
 }
 
 TEST(Status, keepsTheFirstFailure)

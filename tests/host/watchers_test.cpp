@@ -122,14 +122,14 @@ template <typename Moment> std::string progressOf(const Moment& moment)
 
 TEST(Report, showsProgressOnATerminal)
 {
-    const auto line = [](const std::string& text) { return "\r\x1b[K" + text + "\r\x1b[K"; };
-    EXPECT_EQ(line("     1.000 s  locked, error +250 ns"), progressOf(stepAt(1, 250, true, 0)));
-    EXPECT_EQ(line("    12.500 s  not locked, error -3 us"),
-              progressOf(stepAt(12.5, -3000, false, 0)));
-    tSilence silence{nsOfSeconds(9), nsOfSeconds(4), 340.0};
-    EXPECT_EQ(line("     9.000 s  holdover for 4 s, error about 340 ns"), progressOf(silence));
-    silence.errorNs.reset();
-    EXPECT_EQ(line("     9.000 s  holdover for 4 s, error unknown"), progressOf(silence));
+    for (const auto& [found, text] :
+         {std::pair(progressOf(stepAt(1, 250, true, 0)), "     1.000 s  locked, error +250 ns"),
+          {progressOf(stepAt(12.5, -3000, false, 0)), "    12.500 s  not locked, error -3 us"},
+          {progressOf(tSilence{nsOfSeconds(9), nsOfSeconds(4), 340.0}),
+           "     9.000 s  holdover for 4 s, error about 340 ns"},
+          {progressOf(tSilence{nsOfSeconds(9), nsOfSeconds(4)}),
+           "     9.000 s  holdover for 4 s, error unknown"}})
+        EXPECT_EQ("\r\x1b[K" + std::string(text) + "\r\x1b[K", found);
 }
 
 } // namespace
