@@ -53,10 +53,10 @@ oscillator with 3 ppb of white noise at 1 s and at most 2.37 ppb of wander per r
 measurements of 52.57 ns every 999.4 ms;
 oscillator with 8.85 ppb of white noise at 1 s and at most 2.37 ppb of wander per root second
     --measure-over 2.9982s --config QUICK --then 20.9874s=DOCUMENT
-== steps.csv --wander 20ppb --outlier-size 5us --outlier-rate 0.5%
+== steps.csv --wander 20ppb --frequency-noise 3ppb --outlier-size 5us --outlier-rate 0.5%
 measurements in steps of 1 us whose noise the steps hide, taken as 50 ns every 1 s, 0.5 % of outliers of 5 us;
-oscillator with white noise that cannot be told from the measurements' and 20 ppb of wander per root second
-    --measure-over 3s --config QUICK --then 21s=DOCUMENT
+oscillator with 3 ppb of white noise at 1 s and 20 ppb of wander per root second
+    --measure-over 3s --config QUICK --then 28s=DOCUMENT
 == still.csv
 measurements whose noise cannot be told from the oscillator's every 1 s;
 oscillator with 20.9 ppb of white noise at 1 s and at most 0.324 ppb of wander per root second
