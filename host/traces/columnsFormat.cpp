@@ -62,16 +62,16 @@ private:
     double phaseNs = 0; // of a frequency
 };
 
-constexpr std::array<std::string_view, 11> kTimeNames = {
-    "time", "t",        "elapsed", "elapsed_time", "timestamp", "epoch",
-    "date", "datetime", "utc",     "mjd",          "date_time"};
-constexpr std::array<std::string_view, 13> kErrorNames = {
+constexpr std::array kTimeNames = {"time",      "t",     "elapsed",  "elapsed_time",
+                                   "timestamp", "epoch", "date",     "datetime",
+                                   "utc",       "mjd",   "date_time"};
+constexpr std::array kErrorNames = {
     "tie",          "te",          "time_error", "time_interval_error", "x",
     "phase",        "phase_error", "offset",     "clock_offset",        "time_offset",
     "phase_offset", "error",       "phase_data"};
 
 template <size_t size>
-bool isOneOf(const std::string& name, const std::array<std::string_view, size>& names)
+bool isOneOf(const std::string& name, const std::array<const char*, size>& names)
 {
     return std::find(names.begin(), names.end(), name) != names.end();
 }
@@ -235,8 +235,8 @@ std::optional<int64_t> tColumnsFormat::momentOf(const std::string& field, char b
     const auto number = numberOf(field, between);
     if (!number) return moments.ofIso(field);
     if (!(std::fabs(*number) * timeUnitNs < kMostNs)) return std::nullopt;
-    const auto ns = exactNsOf(field, between, std::max<int64_t>(std::llround(timeUnitNs), 1));
-    if (!ns) return std::nullopt;
+    if (timeUnitNs < 1) return std::llround(*number * timeUnitNs);
+    const auto ns = exactNsOf(field, between, std::llround(timeUnitNs));
     return static_cast<int64_t>(ns->whole) + std::llround(ns->fraction);
 }
 

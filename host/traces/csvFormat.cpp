@@ -74,9 +74,9 @@ private:
     std::optional<double> initialPpb; // before anything was ordered
 };
 
-constexpr std::array<std::string_view, 9> kTitles = {"reference_ns",  "clock_ns",      "elapsed_s",
-                                                     "true_error_ns", "frequency_ppb", "step_ns",
-                                                     "kind",          "call",          "value"};
+constexpr std::array kTitles = {"reference_ns",  "clock_ns",      "elapsed_s",
+                                "true_error_ns", "frequency_ppb", "step_ns",
+                                "kind",          "call",          "value"};
 
 // What a field says that may be empty; nothing if it is neither that nor a finite number.
 template <typename Number> std::optional<std::optional<Number>> optionalIn(std::string_view field)

@@ -17,7 +17,7 @@ bool begins(std::string_view line, std::string_view with)
 }
 
 template <size_t size>
-bool beginsWithOneOf(std::string_view line, const std::array<std::string_view, size>& beginnings)
+bool beginsWithOneOf(std::string_view line, const std::array<const char*, size>& beginnings)
 {
     return std::any_of(beginnings.begin(), beginnings.end(),
                        [line](std::string_view with) { return begins(line, with); });
@@ -60,9 +60,8 @@ bool isUnstamped(std::string_view line)
 
 bool isChronycTracking(std::string_view line)
 {
-    static constexpr std::array<std::string_view, 6> kNames = {"Reference ID", "Ref time (UTC)",
-                                                               "System time",  "Last offset",
-                                                               "RMS offset",   "Residual freq"};
+    static constexpr std::array kNames = {"Reference ID", "Ref time (UTC)", "System time",
+                                          "Last offset",  "RMS offset",     "Residual freq"};
     return contains(line, " : ") && beginsWithOneOf(line, kNames);
 }
 

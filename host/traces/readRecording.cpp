@@ -11,6 +11,7 @@
 #include <memory>
 #include <new>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 namespace dravikHost {
@@ -54,11 +55,9 @@ public:
     std::string failure; // why the file cannot be read at all
 
     // How much the lines are like those of the format, though none is a measurement.
-    int64_t likeness() const
+    std::pair<int, int64_t> likeness() const
     {
-        constexpr int64_t kMost = 1'000'000; // lines
-        const int64_t rank = frames > 0 ? 2 : failure.empty() ? 0 : 1;
-        return rank * kMost + std::min(related, kMost - 1);
+        return {frames > 0 ? 2 : failure.empty() ? 0 : 1, related};
     }
 };
 
@@ -137,7 +136,7 @@ std::string refusalOf(std::string_view text, const std::vector<tTrial>& trials)
     std::string first;
     for (size_t i = 0; i < std::min(lines.size(), kShown); ++i)
         first += fmt::format("{}'{}'", i == 0 ? "" : ", ", printable(lines[i]));
-    if (closest.likeness() == 0)
+    if (closest.likeness() == std::pair(0, int64_t{0}))
         return fmt::format("is no trace of a known kind; it begins with {}", first);
     return fmt::format("looks like {}, but has no measurement; {}", closest.format->name(),
                        closest.reasons.empty()

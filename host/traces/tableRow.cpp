@@ -4,9 +4,9 @@
 #include "traces/lineShape.h"
 
 #include <algorithm>
-#include <array>
 #include <cctype>
 #include <cmath>
+#include <iterator>
 
 namespace dravikHost {
 
@@ -173,7 +173,7 @@ std::optional<double> unitNsOf(const std::string& unit)
         std::string_view name;
         double ns;
     };
-    constexpr std::array<tUnitName, 25> kUnits = {{
+    constexpr tUnitName kUnits[] = {
         {"s", 1e9},         {"sec", 1e9},          {"secs", 1e9},
         {"second", 1e9},    {"seconds", 1e9},      {"ms", 1e6},
         {"msec", 1e6},      {"milliseconds", 1e6}, {"us", 1e3},
@@ -183,11 +183,12 @@ std::optional<double> unitNsOf(const std::string& unit)
         {"psec", 1e-3},     {"picoseconds", 1e-3}, {"min", 60e9},
         {"h", 3600e9},      {"d", 86400e9},        {"day", 86400e9},
         {"days", 86400e9},
-    }};
+    };
     const std::string lower = lowerCase(unit);
-    const auto* const found = std::find_if(
-        kUnits.begin(), kUnits.end(), [&](const tUnitName& known) { return known.name == lower; });
-    return found == kUnits.end() ? std::nullopt : std::optional(found->ns);
+    const auto* const found =
+        std::find_if(std::begin(kUnits), std::end(kUnits),
+                     [&](const tUnitName& known) { return known.name == lower; });
+    return found == std::end(kUnits) ? std::nullopt : std::optional(found->ns);
 }
 
 } // namespace dravikHost

@@ -38,8 +38,19 @@ struct tReadRow {
     double latestNs;
     int64_t elapsedNs; // from the first to the last
     const char* source;
-    int64_t unread;
+    const char* unread = ""; // the lines not used, and why the first of them are not
+    int64_t events = 0;
 };
+
+std::string unreadOf(const tRecording& recording)
+{
+    if (recording.unreadLines == 0) return "";
+    std::string text = std::to_string(recording.unreadLines);
+    for (const tUnreadLine& line : recording.firstUnread)
+        text += (&line == &recording.firstUnread[0] ? ": " : ", ") + std::to_string(line.number) +
+                " " + line.why;
+    return text;
+}
 
 // What is read, with the sign that is positive for a clock that is ahead.
 const tReadRow kRead[] = {
@@ -48,28 +59,28 @@ const tReadRow kRead[] = {
      "ptp4l[11.250]: port 1: UNCALIBRATED to SLAVE\n"
      "ptp4l[11.300]: a sentence that ends in an offset 9 s2 freq +5 path delay 500\n"
      "ptp4l[11.500]: master offset 7 s2 freq +5 path delay 500\n",
-     2, -23, 7, 1'250'000'000, "ptp4l", 0},
+     2, -23, 7, 1'250'000'000, "ptp4l", "", 2},
     {"behind a date",
      "2024-05-06 10:11:00.123 ptp4l[6.202]: selected /dev/ptp1 as PTP clock\n"
      "2024-05-06 10:11:08.750 ptp4l[6.829]: master offset -4 s2 freq +0 path delay 1\n"
      "2024-05-06 10:11:09.751 ptp4l[7.829]: master offset -5 s2 freq +0 path delay 1\n",
-     2, -4, -5, 1'000'000'000, "ptp4l", 0},
+     2, -4, -5, 1'000'000'000, "ptp4l", "", 1},
     {"an instance", "ptp4l[1.0]: [ptp4l.1.config:6] master offset -1 s2 freq +0 path delay 1\r\n",
-     1, -1, -1, 0, "ptp4l ptp4l.1.config", 0},
+     1, -1, -1, 0, "ptp4l ptp4l.1.config"},
     {"a journal's own stamp",
      "[ 24.066123] h phc2sys[716]: [23.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n"
      "[ 25.266123] h phc2sys[716]: [24.5] CLOCK_REALTIME phc offset 5 s2 freq +1 delay 2\n",
-     2, 4, 5, 1'000'000'000, "phc2sys CLOCK_REALTIME", 0},
+     2, 4, 5, 1'000'000'000, "phc2sys CLOCK_REALTIME"},
     {"a journal without programs", "[24.5] CLOCK_REALTIME phc offset 4 s2 freq +1 delay 2\n", 1, 4,
-     4, 0, "phc2sys CLOCK_REALTIME", 0},
+     4, 0, "phc2sys CLOCK_REALTIME"},
     {"a journal in JSON",
      "{\"MESSAGE\":\"[24.5] swp3 sys offset 4 s2 freq +1 delay "
      "2\",\"SYSLOG_IDENTIFIER\":\"phc2sys\"}\n",
-     1, 4, 4, 0, "phc2sys swp3", 0},
+     1, 4, 4, 0, "phc2sys swp3"},
     {"ts2phc",
      "ts2phc[27.133]: adding tstamp 21.94 to clock /dev/ptp3\n"
      "ts2phc[27.133]: /dev/ptp3 offset 640 s2 freq +5112\n",
-     1, 640, 640, 0, "ts2phc /dev/ptp3", 0},
+     1, 640, 640, 0, "ts2phc /dev/ptp3", "", 1},
     {"damaged lines",
      "ptp4l[1.0]: master offset 1 s2 freq +5 path delay 5\n"
      "ptp4l[2.0]: master offset 1 sX freq +5 path delay 5\n"
@@ -82,26 +93,27 @@ const tReadRow kRead[] = {
      "ptp4l[8.0]: master offset 2 s2 freq +5 path delay 5\n"
      "ptp4l[0.7]: master offset 9 s2 freq +5 path delay 5\n"
      "ptp4l[9.0]: master offset 3 s2 freq +5 path delay 5\n",
-     3, 1, 3, 8'000'000'000, "ptp4l", 8},
+     3, 1, 3, 8'000'000'000, "ptp4l",
+     "8: 2 an unknown state, 3 the offset is no number, 4 the frequency is no number"},
     {"refclocks.log",
      "   Date (UTC) Time         Refid  DP L P  Raw offset   Cooked offset      Disp.\n"
      "2026-02-28 23:59:59.500000 PPS0    0 N 1  4.900000e-07  2.300000e-08  1.000e-06\n"
      "2026-02-28 23:59:59.500000 PPS0    - N -       -       -6.741777e-07  1.000e-06\n"
      "2026-02-30 00:00:00.500000 PPS0    1 N 1  4.900000e-07  1.500000e-08  1.000e-06\n"
      "2026-03-01 00:00:00.750000 PPS0    1 N 1  4.900000e-07 -1.500000e-08  1.000e-06\n",
-     2, -23, 15, 1'250'000'000, "PPS0", 1},
+     2, -23, 15, 1'250'000'000, "PPS0", "1: 4 field 1, '2026-02-30', is not what it should be", 1},
     {"statistics.log of two versions",
      "2017-08-31 16:27:19 192.0.2.1 4.611e-06  3.391e-05  5.239e-06  9.759e-07  9.758e-04 4.9e-04 "
      "3 0 3\n"
      "2017-08-31 16:27:21 192.0.2.1 3.754e-06 -5.693e-06  2.461e-06 -4.123e-07  2.171e-05 1.4e-03 "
      "4 0 3  0.00\n",
-     2, 33'910, -5'693, 2'000'000'000, "192.0.2.1", 0},
+     2, 33'910, -5'693, 2'000'000'000, "192.0.2.1"},
     {"measurements.log",
      "2019-09-05 06:34:59 2001:db8::1 N  2 111 111 1111 10 10 0.66 -3.572e-03  6.332e-02  "
      "1.038e-06  3.204e-04  7.339e-03 C0000265 4B K K\n"
      "2019-09-05 06:35:59 2001:db8::1 N  2 111 101 0000 10 10 0.66  0.000e+00  0.000e+00  "
      "0.000e+00  3.204e-04  7.339e-03 C0000265 4B K K\n",
-     1, 3'572'000, 3'572'000, 0, "2001:db8::1", 0},
+     1, 3'572'000, 3'572'000, 0, "2001:db8::1", "", 1},
     {"tracking.log over servers",
      "2021-11-20 19:14:48 192.0.2.31 3 -764.414 0.056 -1.303e-04 N  1  2.088e-04  4.095e-05  "
      "6.437e-03  1.208e-03  5.108e-03\n"
@@ -110,44 +122,149 @@ const tReadRow kRead[] = {
      "2021-11-20 19:31:53 192.0.2.32 3 -764.418 0.096 -4.869e-04 N  1  3.354e-04  7.768e-05  "
      "9.840e-03  1.408e-03  5.689e-03\n"
      "2021-11-20 19:32:53 192.0.2.32 3 -764.418 0.096 -4.869e-0\n",
-     2, -130'300, -486'900, 1'025'000'000'000, "", 1},
+     2, -130'300, -486'900, 1'025'000'000'000, "",
+     "1: 4 field 7, '-4.869e-0', is not a number as it should be", 1},
     {"loopstats at midnight",
      "50935 86390.031 0.000006019 13.778190 0.000351733 0.013380 6\n"
      "50936 54.031 -0.000006319 13.778290 0.000351733 0.013380 6\n",
-     2, -6'019, 6'319, 64'000'000'000, "", 0},
-    {"loopstats of old", "50935 75440.031 0.000006019 13.778190 6\n", 1, -6'019, -6'019, 0, "", 0},
+     2, -6'019, 6'319, 64'000'000'000, ""},
+    {"loopstats of old", "50935 75440.031 0.000006019 13.778190 6\n", 1, -6'019, -6'019, 0, ""},
     {"peerstats", "48773 10847.650 PPS(0) 961a -0.001605376 0.000000000 0.001424877 0.000958674\n",
-     1, 1'605'376, 1'605'376, 0, "PPS(0)", 0},
+     1, 1'605'376, 1'605'376, 0, "PPS(0)"},
     {"sfptpd",
      "2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n"
      "2016-03-03 10:04:42.413263 [ptp1->system(em1)], offset: 12.3\n",
-     1, 12.375, 12.375, 0, "ptp1->system(em1)", 1},
+     1, 12.375, 12.375, 0, "ptp1->system(em1)", "1: 2 cut short"},
     {"ptpd",
      "# Timestamp, State, Clock ID, One Way Delay, Offset From Master, Slave to Master\n"
      "2015-06-11 13:20:12.123456, lstn, , , , \n"
      "2015-06-11 13:20:13.123456, slv, 0011/01,  0.000010234,  0.000000123,  0.000010000, S\n"
      "2015-06-11 13:20:14.123456, slv, 0011/01,  0.000010234,  0.0000001\n",
-     1, 123, 123, 0, "", 1},
+     1, 123, 123, 0, "", "1: 4 cut short", 1},
     {"CSV of spreadsheets",
      "\xef\xbb\xbf"
      "\"Reference_NS\" ; Clock_NS ; note\r\n"
      "1700000000000000000 ; \"1700000000000000023\" ;\r\n"
      "1700000001000000000;1700000000999999999,25;clock_ns;\r\n",
-     2, 23, -0.75, 1'000'000'000, "", 0},
-    {"TIE with units", "# time [ms]  TIE [us]\n0 1.5\n125 -2\n", 2, 1500, -2000, 125'000'000, "",
-     0},
+     2, 23, -0.75, 1'000'000'000, ""},
+    {"TIE with units", "# time [ms]  TIE [us]\n0 1.5\n125 -2\n", 2, 1500, -2000, 125'000'000, ""},
     {"TIE with decimal commas", "time (s);TIE (ns)\n0,000;11,5\n0,125;13\n0,250;\n", 2, 11.5, 13,
-     125'000'000, "", 1},
-    {"rows unlike their header", "time (s);TIE (ns)\n0 11.5\n1 13\n", 2, 11.5, 13, kSecondNs, "",
-     0},
+     125'000'000, "", "1: 4 no numbers"},
+    {"rows unlike their header", "time (s);TIE (ns)\n0 11.5\n1 13\n", 2, 11.5, 13, kSecondNs, ""},
     {"an offset with its unit",
      "when,timestamp,offset_us\na,2024-05-06T10:00:00Z,12\nb,2024-05-06T10:00:01Z,-14\n", 2, 12'000,
-     -14'000, 1'000'000'000, "", 0},
+     -14'000, 1'000'000'000, ""},
     {"phase with a header",
      "File: a.phd\nType: Phase\nTau: 0.5\n# Header End\n1.2e-9\n# Tau: 2\n-0.9e-9\n", 2, 1.2, -0.9,
-     500'000'000, "", 0},
+     500'000'000, ""},
     {"frequency with a header", "# Type: Frequency\n# Tau: 2\n3e-9\n-4e-9\n", 3, 0, -2,
-     4'000'000'000, "", 0},
+     4'000'000'000, ""},
+    {"breaks in a line, before the delay was told",
+     "phc2sys[1.0]:\nphc2sys[2.0]: a sys offset 1 s2 freq +5 pat\nphc2sys[3.0]: a sys offset 1 s3 "
+     "adj +5 del\n"
+     "phc2sys[4.0]: a sys offset 1 s2 freq +5 path delay\nphc2sys[5.0]: b c d e f offset 2 s0 adj "
+     "+5 x\n"
+     "phc2sys[6.0]: b c d e f offset 3 s3 freq +5\nphc2sys[7.0]: b c d e f offset 4 s2 freq +5 "
+     "delay 3\n"
+     "phc2sys[8.0]: b c d e f offset 5 s2 freq +5\n",
+     3, 2, 4, 2'000'000'000, "phc2sys b c d e f", "4: 2 cut short, 3 cut short, 4 cut short", 1},
+    {"damage to each number",
+     "[1.0] master offset 1 s2 freq +5 path delay 5\n[2.0] master offset 1 s4 freq +5 path delay "
+     "5\n"
+     "[3.0] master offset 1e1 s2 freq +5 path delay 5\n[4.0] master offset 1 s2 freq 5e1 path "
+     "delay 5\n"
+     "[5.0] master offset 1000000000000000000 s2 freq +5 path delay 5\n"
+     "[6.0] master offset 999999999999999 s2 freq +5 path delay 5\n",
+     2, 1, 999'999'999'999'999, 5'000'000'000, "ptp4l",
+     "4: 2 an unknown state, 3 the offset is no number, 4 the frequency is no number"},
+    {"words missing",
+     "ptp4l[1.0]: [a:10] : offset 1 s2 freq +5\nptp4l[2.0]: [a:10] : offset\nptp4l[3.0]: [a:10] : "
+     "offset 1 x\n"
+     "ptp4l[4.0]: [a:10] : offset 1 x freq\nptp4l[5.0]: offset 1 x y\nptp4l[6.0]: offset 1 x y z\n",
+     1, 1, 1, 0, "ptp4l a:10", "3: 2 cut short, 3 cut short, 4 cut short", 2},
+    {"lines of nobody",
+     "ptp4l[1.0]: offset 1 s2 freq +5\nx\n[7 8\n7]\n[7]\n-- Logs begin\na: b\n: \n", 1, 1, 1, 0,
+     "ptp4l", "4: 2 no measurement, 3 no measurement, 4 no measurement", 2},
+    {"a journal in JSON of a container",
+     "{\"log\":\"\",\"message\":\"offset 4 s2 freq +1\",\"_PID\":\"7\"}\n"
+     "{\"log\":\"grep.log:/usr/sbin/ts2phc.1@x-_[24.5]: offset 5 s2 freq +1\"}\n",
+     1, 5, 5, 0, "ts2phc.1@x-_", "1: 1 no time in front of it"},
+    {"what is no program",
+     "7ptp[1.5]: eth0 sys offset 1 s2 freq +1\n[ 2.5 ] eth0 sys offset 2 s2 freq +1\n"
+     "a(b) [2.75] eth0 sys offset 2 s2 freq +1\n [9] [3.5] eth0 sys offset 3 s2 freq +1 [4.5]\n",
+     4, 1, 3, 2'000'000'000, "phc2sys eth0"},
+    {"late lines, an outlier and a restart",
+     "ptp4l[5.0]: offset 1 s2 freq +5\nptp4l[4.0]: offset 2 s2 freq +5\nptp4l[4.0]: offset 3 s2 "
+     "freq +5\n"
+     "ptp4l[3.0]: offset 4 s2 freq +5\nptp4l[6.0]: offset 5 s2 freq +5\nptp4l[6.0]: offset 6 s2 "
+     "freq +5\n"
+     "ptp4l[1.0]: offset 7 s2 freq +5\nptp4l[1.5]: offset 8 s2 freq +5\nptp4l[1.25]: offset 9 s2 "
+     "freq +5\n",
+     4, 1, 8, 2'000'000'000, "ptp4l",
+     "5: 3 time does not advance, 2 time goes back, 4 time goes back"},
+    {"a prefix of five words",
+     "====\nNov 23 08:35:26 host chronyd: 2026-02-28 23:59:59.5 PPS0 0 N 1 4.9e-07 2.3e-08 "
+     "1.0e-06\n"
+     "a b c d e f 2026-02-28 23:59:59.6 PPS0 0 N 1 4.9e-07 2.3e-08 1.0e-06\n"
+     "2026-03-01 00:00:00.75 PPS0 1 N 1 4.9e-07 1.0e+10 1.0e-06\n"
+     "2026-03-01 00:00:01.75 PPS0 1 N 1 4.9e-07 1.5e-08 1.0e-06 x\n"
+     "   Date (UTC) Time     IP Address   Std dev'n Est offset  Offset sd  Diff freq\n",
+     1, -23, -23, 0, "PPS0", "3: 3 no date, 4 no measurement, 5 more fields than there should be",
+     1},
+    {"optional fields of tracking.log that end",
+     "2021-11-20 19:14:48 h 3 -7.4 0.5 -1.3e-04 N 1\n2021-11-20 19:14:49 h 3 -7.4 0.5 -1.3e-04 N\n"
+     "2021-11-20 19:14:50 h 3 -7.4 0.5 -1.3e-04 N 1 2.0e-04\n2021-11-20 19:14:51 h 3 -7.4 0.5 "
+     "-1.3e-04 ? 1\n"
+     "2021-11-20 19:14:52 h 3 -7 0.5e1 -1.3e-04 N 1\n",
+     1, -130'000, -130'000, 0, "",
+     "3: 2 cut short, 3 cut short, 5 field 6, '0.5e1', is not a number as it should be", 1},
+    {"sfptpd beside itself",
+     "2016-03-03 10:04:41.4 ptp1: selected\n2016-03-03 10:04:42.4 a b\nptp1: x\n"
+     "2016-03-03 10:04:43.4 [a->b], offset:  -2.5 , freq-adj: 1.5\n2016-03-03 [a->b], offset: 2.5, "
+     "x\n"
+     "2016-03-03 10:04:44.4 [ab], offset: 2.5, x\n2016-03-03 10:04:45.4 [a->b], offset: 1e18, x\n",
+     1, -2.5, -2.5, 0, "a->b", "5: 2 no measurement, 3 no measurement, 5 no date and time", 1},
+    {"ptpd in seconds, or both",
+     "1434028813.5, slv, c, 1.0, 2.5, 3.0\n2015-06-11 13:20:14, 1434028814.5, slv, c, 1.0, 3.5, "
+     "3.0\n"
+     "1434028815.5, slv, c, 1.0, 2.5\n1434028816.5, slv, c, 1.0, 2, 3\n1434028817.5, slv\nx, slv, "
+     "c, 1.0, 2.5, 3\n"
+     "1434028818.5, pasv, c\n",
+     2, 2.5e9, 3.5e9, 500'000'000, "",
+     "4: 3 cut short, 4 the offset is no number, 5 no measurement", 1},
+    {"CSV with what spreadsheets add",
+     "clock_ns,reference_ns,true_error_ns,elapsed_s\n,, ;\n# "
+     "x\n1005,1000,-2.5,10,,\nclock_ns,reference_ns,true_error_ns,elapsed_s\n"
+     "2005,2000,,10.5,,x\n2005,2000,1\n2005,2000,x,11\n-1,2000,,12\n3,1,,13.5\n",
+     2, 5, 2, 3'500'000'000, "",
+     "4: 6 not as many fields as the header has, 7 not as many fields as the header has, 8 no "
+     "number in true_error_ns, step_ns or frequency_ppb"},
+    {"CSV that is cut in its last time",
+     "kind,value,call,clock_ns,reference_ns\npair,,,99,100\npair,,,210,200.5\npair,,,310,30\nx,,,"
+     "310,300\ncall,x,getTime,,\n"
+     "call,1,got,,\npair,,,1012,1000\n",
+     3, -1, 12, 900, "",
+     "4: 4 cut short, 5 a row of the unknown kind 'x', 6 no call that is known"},
+    {"comments that say something",
+     "# Unit = us\n# TAU0=0.25\n# Type: Phase\n#\n! tau (s)\n1\n-2\n# Tau: 7\n", 2, 1000, -2000,
+     250'000'000, ""},
+    {"one Tau after another", "Tau: 1\nTau 1.0000009\nphase (ns)\n7\n8\n", 2, 7, 8, 1'000'000'900,
+     ""},
+    {"dates alone",
+     "2024-05-06T10:00:00Z 12e-9\n2024-05-06 10:00:01 x\n2024-05-06T10:00:02 -3e-9\n", 2, 12, -3,
+     2'000'000'000, "", "1: 2 no numbers"},
+    {"days", "date,mjd,tie [ns]\n60000.25,1,1\n60000.75,1,2\n", 2, 1, 2, 500'000'000, ""},
+    {"modified Julian days", "mjd,tie [ps]\n60000.25,1000\n60000.75,2000\n", 2, 1, 2,
+     43'200'000'000'000, ""},
+    {"picoseconds", "note,t/ps,tie_ms\na,-1e12,1\nb,500000000000.4,2\nb\nc,1,x\n", 2, 1e6, 2e6,
+     1'500'000'000, "", "2: 4 cut short, 5 no numbers"},
+    {"UTC",
+     "time (utc);phase error (us)\n2024-05-06T10:00:00Z;1\n2024-05-06 10:00:00.25;2,5\n1;1;1\n", 2,
+     1000, 2500, 250'000'000, "", "1: 4 no numbers"},
+    {"too much", "-0.25 -0.5\n9.5e9 1\n1 1e9\n1.5e10 1\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
+     8'500'000'000'250'000'000, "",
+     "3: 2 no time in the column of the time, 3 an error of years, 4 no time in the column of the "
+     "time"},
 };
 
 TEST(Trace, isReadByWhatItsLinesAre)
@@ -160,7 +277,8 @@ TEST(Trace, isReadByWhatItsLinesAre)
         EXPECT_NEAR(row.latestNs, recording.pairs.back().errorNs, 1e-6);
         EXPECT_EQ(row.elapsedNs, recording.pairs.back().elapsedNs);
         EXPECT_EQ(row.source, recording.source);
-        EXPECT_EQ(row.unread, recording.unreadLines);
+        EXPECT_EQ(row.unread, unreadOf(recording));
+        EXPECT_EQ(row.events, recording.events);
     }
 }
 
