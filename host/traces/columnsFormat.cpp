@@ -57,7 +57,7 @@ private:
     std::optional<double> errorUnitNs;
     std::string errorTitle = "the error";
     std::string strangeHeader; // in front of the rows, without an error
-    size_t strangeTitles = 0;
+    size_t strangeTitles{};
     int64_t count = 0;
     double phaseNs = 0; // of a frequency
 };

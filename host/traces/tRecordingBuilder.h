@@ -66,13 +66,13 @@ private:
     // stretch. One measurement alone that lies in the past is late; two in turn are a restart.
     template <typename Measurement> struct tTrack {
         std::vector<Measurement> taken;
-        int64_t firstNs = 0; // of the log
-        int64_t shiftNs = 0; // from the time of the log to the elapsed one
-        int64_t latestNs = 0;
-        int64_t firstGeneration = 0;
-        int64_t generation = 0;
+        int64_t firstNs{}; // of the log
+        int64_t shiftNs{}; // from the time of the log to the elapsed one
+        int64_t latestNs{};
+        int64_t firstGeneration{};
+        int64_t generation{};
         std::optional<Measurement> waiting; // went back
-        int64_t waitingLine = 0;
+        int64_t waitingLine{};
 
         Measurement& last() { return waiting ? *waiting : taken.back(); }
     };
@@ -101,7 +101,7 @@ private:
     int64_t taken = 0;
     std::vector<tSource> sources;
     std::unordered_map<std::string, size_t> indices; // by name and process
-    size_t latest = 0;                               // mostly the next line's as well
+    size_t latest{};                                 // mostly the next line's as well
     int64_t unreadLines = 0;
     std::vector<tUnreadLine> firstUnread;
     int64_t events = 0;
