@@ -321,23 +321,6 @@ struct tRefusedRow {
 const tRefusedRow kRefused[] = {
     {"", " is empty"},
     {"hello world\n", " is no trace of a known kind; it begins with 'hello world'"},
-    {"\x1f\x8b\x08", " is compressed"},
-    {"\xff\xfe"
-     "1",
-     " is text in UTF-16"},
-    {"2015-07-22 05:40:50 -0.037360 1 -0.037434 -37.948 12 5 120\n", " is chrony's rtc.log"},
-    {"2022-05-01 02:01:20 203.0.113.15 * ----- 377 1.00 4.228e+01 -1.575e-04 1.239e-04\n",
-     " is chrony's selection.log"},
-    {"2015-04-19 10:39:48  2.8000e+04  3.6600e-01\n", " is chrony's tempcomp.log"},
-    {"Reference ID    : C0000201 (host2.example)\nStratum : 3\n", "'chronyc tracking'"},
-    {"49213 525.624 127.127.4.1 93 226 00:08:29.606 D\n", " is ntpd's clockstats"},
-    {"50928 2132.543 192.0.2.1 192.0.2.20 3102453281.58 3102453281.58 3102453332.54 "
-     "3102453332.54\n",
-     " is ntpd's rawstats"},
-    {"sample NTP2 1490919281.1 1490919281.0 1490919281.0 0 -20\n", " is ntpshmmon's"},
-    {"source 0 - assert 1490919281.000001234, sequence: 5\n", " is ppstest's"},
-    {"phc_ctl[4117.187]: offset from CLOCK_REALTIME is -37000000251ns\n", " is phc_ctl's"},
-    {"CLOCK_REALTIME phc offset 65 s2 freq -45509 delay 351557\n", "without the time in front"},
     {"reference_ns,clock_ns,clock_ns\n1,2,3\n", "the column clock_ns stands there 2 times"},
     {"reference_ns,clock_ns\n1.7E+18,1.7E+18\n", "a spreadsheet has rounded away"},
     {"reference_ns,clock_ns\nx,1\n", "not used are lines 2 (no number in reference_ns"},
@@ -355,14 +338,8 @@ const tRefusedRow kRefused[] = {
      " looks like chrony's statistics.log, but has no measurement"},
     {"Timestamp, a, b, c, d\n", " is no trace of a known kind"},
     {"phc2sys[1.x]: phc offset 6 s2 freq -4 delay 3\n", "no time in front of it"},
-    {"50935 75440.031 0.000006019 13.778190 6\n"
-     "49213 525.624 127.127.4.1 93 226 00:08:29.606 D\n"
-     "49213 526.624 127.127.4.1 93 226 00:08:30.606 D\n"
-     "49213 527.624 127.127.4.1 93 226 00:08:31.606 D\n",
-     " is mostly ntpd's clockstats"},
     {"Tau: 1\n1\n\n2,5\nx\n", "line 4 is not one number"},
     {"2021-11-20 19:15:00 h 3 -1.4 0.056 -9.303e-04 ?  1 2.0e-04 4.0e-05\n", "(not synchronised)"},
-    {"a\nMS Name/IP address\n<html>\nb\n<html>\n", " is a web page"},
     {"a\n\n b\tc\x7f\nd\ne\n", " begins with 'a', ' b c?', 'd'"},
     {"2026-02-28 23:59:59.5 PPS0 1 Q\n", "looks like chrony's refclocks.log"},
     {"2026-02-28 23:59:59.5 PPS0 x\n", " cannot be read: no column of its header is a time"},
@@ -380,38 +357,45 @@ const tRefusedRow kRefused[] = {
 };
 
 const std::pair<const char*, std::vector<const char*>> kKinds[] = {
-    {"lines of ptp4l", {"a rms 3 max 4 freq +1", "a offset 3 s2 freq +1"}},
-    {"chrony's rtc.log", {" x : RTC fast (s)"}},
-    {"chrony's selection.log", {"S EOpts Reach"}},
-    {"chrony's tempcomp.log", {"Temp.        Comp.", "Date Temp. Comp."}},
-    {"what 'chronyc tracking' prints", {"Last offset     : x"}},
+    {"lines of ptp4l", {"CLOCK_REALTIME rms 3 max 4 freq +1", "a offset 3 s2 freq +1"}},
+    {"chrony's rtc.log",
+     {"2015-07-22 05:40:50 -0.037 1 -0.03 -37.9 12 5 120", " x : RTC fast (s)"}},
+    {"chrony's selection.log",
+     {"2022-05-01 02:01:20 192.0.2.1 * ----- 377 1.00 4e+01 -1e-04 1e-04", "S EOpts Reach"}},
+    {"chrony's tempcomp.log",
+     {"2015-04-19 10:39:48  2.8000e+04  3.6600e-01", "Temp.        Comp.", "Date Temp. Comp."}},
+    {"what 'chronyc tracking' prints", {"Reference ID    : C0000201 (a)", "Last offset     : x"}},
     {"what 'chronyc sources' prints", {"^* a 2 +/- 3us", "#  +/-", "MS Name/IP address"}},
     {"what 'chronyc sourcestats' prints", {"Name/IP Address NP NR"}},
     {"what 'ntpq -p' prints", {" remote  refid  st t when poll reach"}},
+    {"ntpd's rawstats",
+     {"50928 2132.543 192.0.2.1 192.0.2.20 3102453281.58 3102453281.58 3.5 3.5"}},
     {"ntpd's sysstats", {"50928 3600.2 3600 1 2 3 4 5 6 7 8"}},
+    {"ntpd's clockstats: ", {"49213 525.624 127.127.4.1 93 226 00:08:29.606 D"}},
     {"ntpd's clockstats or another", {"50928 3600.2 a zz"}},
     {"ntpshmmon's", {"# ntpshmmon version 1", "sample NTP2 1 2 3"}},
-    {"ppstest's", {"trying PPS source", "found PPS source"}},
-    {"phc_ctl's", {"sudo phc_ctl: x"}},
+    {"ppstest's", {"trying PPS source", "found PPS source", "source 0 - assert 1.5, sequence: 5"}},
+    {"phc_ctl's", {"phc_ctl[4117.187]: offset from CLOCK_REALTIME is -37ns", "sudo phc_ctl: x"}},
     {"pmc's",
      {"\tsending: GET X", "a 0 RESPONSE MANAGEMENT", "offsetFromMaster 3", "master_offset 3"}},
     {"journalctl -o json-pretty", {"\t\"__REALTIME_TIMESTAMP\" : \"1\""}},
     {"journalctl -o export", {"__CURSOR=a", "__REALTIME_TIMESTAMP=1"}},
     {"settings of a network device", {"sys.a 1", "Time stamping parameters for eth0"}},
-    {"a web page", {"<!DOCTYPE html>", "<html>"}},
+    {"a web page", {"<!DOCTYPE html>", "<html>", "a\nMS Name/IP address\n<html>\nb\n<html>"}},
     {"compressed; give '",
-     {"\xfd"
+     {"\x1f\x8b\x08",
+      "\xfd"
       "7zXZ",
       "\x28\xb5\x2f\xfd", "BZh9"}},
     {"an archive", {"PK\x03\x04"}},
     {"a journal", {"LPKSHHRH"}},
-    {"text in UTF-16", {"\xfe\xff"}},
+    {"text in UTF-16", {"\xfe\xff", "\xff\xfe"}},
     {"a program",
      {"\x7f"
       "ELF"}},
 };
-// Each is almost of one of them.
 const char* const kOfNoKind[] = {
+    // though almost of one
     "a offset 3 s2 frq 4",
     "a offset x s2 freq 4",
     "[1.5 offset 3 s2 freq 4",
@@ -432,7 +416,6 @@ const char* const kOfNoKind[] = {
     "remote reach ",
     "refid reach",
     "50928 3600.2 127.127.4.1 9624 0.5",
-
     "50928 x 127.127.4.1 93 226",
     "50928 3600.2 a 9624",
     "50928 3600.2 1.5 zz",
@@ -464,12 +447,27 @@ TEST(Trace, isRefusedByWhatItIs)
 
 TEST(Trace, doesNotMixFormats)
 {
-    std::string text;
-    for (int i = 10; i < 14; ++i)
-        text += "2015-04-19 10:39:" + std::to_string(i) + " h 3 -1.4 0.056 -9.303e-04\n";
-    for (int i = 10; i < 14; ++i)
-        text += "ptp4l[" + std::to_string(i) + ".5]: master offset 1 s2 freq +1 path delay 1\n";
-    EXPECT_NE(std::string::npos, refusalOf(text).find(" mixes "));
+    const struct {
+        const char *line, *other; // the seconds behind them
+        int lines, others;
+        const char* why;
+    } kRows[] = {
+        {"2015-04-19 10:39:{} h 3 -1.4 0.056 -9.303e-04\n", "p[{}.5]: offset 1 s2 freq +1\n", 4, 3,
+         " mixes "},
+        {"2015-04-19 10:39:{} h 3 -1.4 0.056 -9.303e-04\n", "p[{}.5]: offset 1 s2 freq +1\n", 4, 2,
+         ""},
+        {"50935 {}.031 0.06 13.7 6\n", "49213 {}.6 127.127.4.1 93 226\n", 3, 3,
+         " is mostly ntpd's clockstats"},
+        {"50935 {}.031 0.06 13.7 6\n", "49213 {}.6 127.127.4.1 93 226\n", 4, 3, ""},
+        {"50935 {}.031 0.06 13.7 6\n", "49213 {}.6 127.127.4.1 93 226\n", 1, 2, ""},
+    };
+    for (const auto& row : kRows) {
+        std::string text;
+        for (int i = 0; i < row.lines + row.others; ++i)
+            text += fmt::format(fmt::runtime(i < row.lines ? row.line : row.other), 10 + i);
+        EXPECT_EQ(0U, (refusalOf(text) + " ").find(*row.why ? row.why : " "))
+            << text << refusalOf(text);
+    }
 }
 
 TEST(Trace, namesOnlySomeOfManySources)
@@ -494,10 +492,13 @@ TEST(Trace, tellsRunsOfAProgramApart)
         readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21) + line(9, 15));
     ASSERT_EQ(5U, restarted.pairs.size());
     EXPECT_EQ(11 * kSecondNs, restarted.pairs[3].elapsedNs);
+    EXPECT_EQ(11 * kSecondNs + 1, restarted.pairs[4].elapsedNs);
     EXPECT_FALSE(restarted.pairs[2].beginsStretch);
     EXPECT_TRUE(restarted.pairs[4].beginsStretch); // as time went back
     const std::string summary = "host phc2sys[6]: [9.5] CLOCK_REALTIME rms 3 max 4 freq +1 +/- 3\n";
-    EXPECT_EQ(2U, readTraceOf(summary + line(7, 10) + line(7, 11)).pairs.size());
+    const tRecording after = readTraceOf(summary + line(7, 10) + line(7, 11));
+    EXPECT_EQ(2U, after.pairs.size());
+    EXPECT_EQ(std::vector<std::string>{"1 summaries are left out"}, after.notes);
     const std::string why = refusalOf(line(7, 10) + line(8, 10) + line(7, 11) + line(8, 11));
     EXPECT_NE(std::string::npos, why.find("'phc2sys CLOCK_REALTIME (host 7)', "
                                           "'phc2sys CLOCK_REALTIME (host 8)'"));
@@ -524,6 +525,11 @@ TEST(Trace, beginsAStretchAfterAReboot)
     EXPECT_DOUBLE_EQ(1, measured.series.interval);
     keepLongestStretch(recording);
     ASSERT_EQ(8U, recording.pairs.size());
+    EXPECT_FALSE(recording.pairs.front().beginsStretch);
+    EXPECT_EQ(7 * kSecondNs, recording.pairs.back().elapsedNs);
+    keepLongestStretch(recording); // now it is all
+    EXPECT_EQ(std::vector<std::string>{"only the longest stretch is used, 8 of 13 measurements"},
+              recording.notes);
     EXPECT_EQ(0, recording.pairs.front().elapsedNs);
     EXPECT_EQ(-10, recording.pairs.front().errorNs);
 }
@@ -545,9 +551,16 @@ TEST(Trace, readsSummariesAsWhatTheyAre)
     const tRecording recording =
         readTraceOf("ptp4l[1.0]: rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
                     "ptp4l[2.0]: rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[3.0]: rms 4 mux 9 freq +1 +/- 3 delay 237 +/- 0\n");
+                    "ptp4l[3.0]: rms 4 mux 9 freq +1 +/- 3 delay 237 +/- 0\n"
+                    "ptp4l[4.0]: rms -1 max 9 freq\nptp4l[5.0]: rms 5.1 max 4 freq\n"
+                    "ptp4l[6.0]: rms 5 max 4\nptp4l[7.0]: rms 5 max 1000000000000000000 freq\n"
+                    "ptp4l[8.0]: a b c d e f rms 3 max 4 freq\n");
     const tMeasured measured = measure(recording, {});
     EXPECT_EQ(2U, measured.errors.size());
+    EXPECT_EQ(kSecondNs, recording.summaries.back().elapsedNs);
+    EXPECT_EQ("5: 3 no numbers behind rms and max, 4 no numbers behind rms and max, 5 no numbers "
+              "behind rms and max",
+              unreadOf(recording));
     EXPECT_NEAR(std::sqrt((9 + 16) / 2.0) * 1e-9, measured.rms(), 1e-18);
     EXPECT_DOUBLE_EQ(7e-9, measured.peak());
     EXPECT_FALSE(measured.mean());
@@ -558,8 +571,18 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
 {
     tReadOptions options;
     options.unitNs = 1;
-    for (const char* const text : {"0 5\n1 6\n", "0 ,5\n1 ,6\n", "0,0 5,0\n1,0 6,0\n"})
-        EXPECT_EQ(5, readTraceOf(text, options).pairs.front().errorNs) << text;
+    for (const char* const text : {"0 5\n1 6\n", "0 ,5\n1 ,6\n", "0,0 5,0\n1,0 6,0\n",
+                                   "t,tie (ns)\n0,5\n", "t,offset\n0,5\n", "t,x\n0,5\n"}) {
+        const tRecording recording = readTraceOf(text, options);
+        EXPECT_EQ(5, recording.pairs.front().errorNs) << text;
+        EXPECT_TRUE(recording.notes.empty()) << text;
+    }
+    const tRecording seconds = readTraceOf("t,x\n0,5\n1,6\n");
+    EXPECT_EQ(5e9, seconds.pairs.front().errorNs);
+    EXPECT_EQ(
+        std::vector<std::string>{
+            "the column 'x' does not tell its unit, so it is seconds; --unit tells another"},
+        seconds.notes);
     EXPECT_EQ(" has a unit of its own; leave --unit out",
               refusalOf("time (s),tie (us)\n0,5\n1,6\n", options));
 
@@ -572,7 +595,12 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
     ASSERT_EQ(2U, lines.pairs.size());
     EXPECT_EQ(4 * kSecondNs, lines.pairs.back().elapsedNs); // that of the damaged line included
     EXPECT_EQ(" has times of its own; leave --interval out", refusalOf("0 5\n1 6\n", options));
+    options.intervalNs = 1.6;
+    for (const char* const text : {"1\n2\n", "offset 6 s2 freq -4\noffset 6 s2 freq -4\n"})
+        EXPECT_EQ(2, readTraceOf(text, options).pairs.back().elapsedNs) << text;
+    options.intervalNs = 2e9;
     options.frequency = true;
+    EXPECT_NE("", refusalOf("offset 6 s2 freq -4\n", options));
     const tRecording frequency = readTraceOf("1e-9\n-3e-9\n", options);
     ASSERT_EQ(3U, frequency.pairs.size());
     EXPECT_NEAR(-4, frequency.pairs.back().errorNs, 1e-9);
