@@ -108,6 +108,15 @@ TEST(Plot, fitsTheAxisToWhatComesAfterTheStart)
         std::string axis;
     } kRows[] = {
         {"noise alone", {20, -20, 20, -20}, "set ylabel 'phase error, ns'\nset yrange [-24:24]\n"},
+        {"one value", {-2000, -2000}, "phase error, µs'\nset yrange [-2.2:-1.8]\nset label 1 ''"},
+        {"one small value", {5, 5}, "phase error, ns'\nset yrange [4:6]\n"},
+        {"hardly anything", {0, 0, 0, 0, 1}, "phase error, ns'\nset yrange [-0.1:1.1]\n"},
+        {"a start of a quarter",
+         {1e6, 20, 20, 20},
+         "set yrange [18:22]\nset label 1 'cut off: 1 of 4"},
+        {"two decades and no more",
+         {20, 20, 20, 20, -2000},
+         ", \"2 µs\" 2000, \"-2 µs\" -2000)\nset ylabel"},
         {"far from zero",
          {3.7e10, 3.7e10 + 4},
          "phase error, s'\nset yrange [36.9999999996:37.0000000044]"},
@@ -139,11 +148,17 @@ TEST(Plot, fitsTheAxisToWhatComesAfterTheStart)
 
 TEST(Plot, measuresLongTracesInHoursAndDays)
 {
-    for (const auto& [seconds, axis] :
-         {std::pair(17'999, "'time, s'"), {18'000, "'time, h'"}, {432'000, "'time, d'"}}) {
+    const struct {
+        int64_t seconds;
+        const char *axis, *last;
+    } kRows[] = {{17'999, "'time, s'", "\n17999 2 "},
+                 {18'000, "'time, h'", "\n5 2 "},
+                 {431'999, "'time, h'", "\n119.999722 2 "},
+                 {432'000, "'time, d'", "\n5 2 "}};
+    for (const auto& row : kRows) {
         tRecording recording = recordingOf({1, 2});
-        recording.pairs.back().elapsedNs = int64_t{seconds} * 1'000'000'000;
-        EXPECT_NE(std::string::npos, plotScript(recording, {"a.png", ""}).find(axis));
+        recording.pairs.back().elapsedNs = row.seconds * 1'000'000'000;
+        expectScript(plotScript(recording, {"a.png", ""}), {row.last, row.axis}, 1);
     }
 }
 

@@ -63,7 +63,13 @@ TEST(Quantity, isWrittenForPeople)
         {7200e9, "7200 s", "+7200 s"},
         {999999, "1000 us", "+1000 us"},
         {-1e9, "-1 s", "-1 s"},
-        {86400e9, "86400 s", "+86400 s"},
+        {9999.5e9, "10000 s", "+10000 s"},
+        {9.9e23, "990000000000000 s", "+990000000000000 s"},
+        {1e24, "1e+15 s", "+1e+15 s"},
+        {9e-4, "0.9 ps", "+0.9 ps"},
+        {1e-3, "0.001 ns", "+0.001 ns"},
+        {-1e-7, "-0.0001 ps", "-0.0001 ps"},
+        {9e-8, "0 ns", "+0 ns"},
     };
     for (const auto& row : kDurations) {
         EXPECT_EQ(row.text, durationText(row.ns));
@@ -71,7 +77,6 @@ TEST(Quantity, isWrittenForPeople)
     }
     EXPECT_EQ("0 ns", durationText(-0.0));
     EXPECT_EQ("+0 ns", signedDurationText(-9.191e-17));
-    EXPECT_EQ("0.005578 ps", durationText(5.578e-6));
     EXPECT_EQ("out of range", signedDurationText(-INFINITY));
     EXPECT_EQ("out of range", durationText(NAN));
     EXPECT_EQ("-1.5 us", durationText(int64_t{-1500}));
@@ -79,6 +84,7 @@ TEST(Quantity, isWrittenForPeople)
     EXPECT_EQ("+11.980 ppm", offsetText(11980));
     EXPECT_EQ("-0.001 ppm", offsetText(-1));
     EXPECT_EQ("+0.000 ppm", offsetText(-0.4));
+    EXPECT_EQ("-0.001 ppm", offsetText(-0.5));
     EXPECT_EQ("out of range", offsetText(INFINITY));
     EXPECT_EQ("2.125", secondsText(2'125'999'999, 3));
     EXPECT_EQ("0.000000007", secondsText(7, 9));
@@ -101,6 +107,16 @@ TEST(Words, areSplitOff)
     EXPECT_EQ("/dev/ptp0", afterPrefix("phc:/dev/ptp0", "phc:"));
     for (const char* const other : {"phc:", "shm:2", "a phc:x", ""})
         EXPECT_FALSE(afterPrefix(other, "phc:")) << other;
+}
+
+TEST(Words, areGuessedFromAThirdOfTheirLetters)
+{
+    EXPECT_EQ("; did you mean one?", didYouMean("OnE", {"two", "one", "ode"}));
+    for (const char* const word : {"bcdefghijX", "YabcdefghX", "aXcdXfghXi", "abcdef"})
+        EXPECT_EQ("; did you mean abcdefghi?", didYouMean(word, {"b", "abcdefghi"})) << word;
+    for (const char* const word : {"bcdefghijXY", "aXcdXfghXX", "abcde", ""})
+        EXPECT_EQ("", didYouMean(word, {"abcdefghi"})) << word;
+    EXPECT_EQ("", didYouMean("a", {}));
 }
 
 TEST(Words, areNumbersAsAWhole)
