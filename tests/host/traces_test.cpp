@@ -189,8 +189,9 @@ const tReadRow kRead[] = {
      4, 1, 8, 2 * kSecondNs, "p", "5: 3 time does not advance, 2 time goes back, 4 time goes back"},
     {"a prefix of five words",
      "===\nNov 23 08:35:26 host c: 2026-02-28 23:59:59.5 PPS0 0 N 1 4.9e-07 2.3e-08 1.0e-06\n"
-     "a b c d e f 2026-02-28 23:59:59.6 PPS0 0 N 1 4.9e-07 2.3e-08 1.0e-06\n"
-     "2026-03-01 00:00:00.75 PPS0 1 N 1 4.9e-07 1.0e+10 1.0e-06\n"
+     "a b abcdefghij abcd-fghij abcdefg-ij abcd-fg-i 2026-02-28 23:59:59.6 PPS0 0 N 1 4.9e-07 "
+     "2.3e-08 1.0e-06\n"
+     "2026-03-01 00:00:00.75 PPS0 1 N 1 4.9e-07 1.0e+09 1.0e-06\n"
      "2026-03-01 00:00:01.75 PPS0 1 N 1 4.9e-07 1.5e-08 1.0e-06 x\n"
      "   Date (UTC) Time     IP Address   Std dev'n Est offset\n",
      1, -23, -23, 0, "PPS0", "3: 3 no date, 4 no measurement, 5 more fields than there should be",
@@ -248,7 +249,7 @@ const tReadRow kRead[] = {
     {"UTC",
      "time (utc);phase error (us)\n2024-05-06T10:00:00Z;1\n2024-05-06 10:00:00.25;2,5\n1;1;1\n", 2,
      1000, 2500, 250'000'000, "", "1: 4 no numbers"},
-    {"too much", "-0.25 -0.5\n9.5e9 1\n1 1e9\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
+    {"too much", "-0.2500000004 -0.5\n9.5e9 1\n1 1e9\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
      8'500'000'000'250'000'000, "", "2: 2 no time in the column of the time, 3 an error of years"},
 };
 
@@ -301,12 +302,12 @@ TEST(Trace, tellsTheCorrections)
         "call,,,,,getFrequency,3\ncall,,,,,getFrequency,4\npair,0,0,,,,\n"
         "pair,1,1,,,,\ncall,,,,,setFrequency,50\npair,2,2,,-6,,\npair,3,3,,,,\n"
         "call,,,,,setFrequency,-50\npair,4,4,,,,\npair,5,5,,,,\ncall,,,,,setFrequency,49\n"
-        "pair,6,6,8,,,\ncall,,,,,stepTime,-9\npair,7,7,,,,\ncall,,,,,setFrequency,-49\n");
+        "pair,6,6,8,,,\npair,7,7,,,,\ncall,,,,,stepTime,-9\ncall,,,,,setFrequency,-49\n");
     ASSERT_EQ(8U, ours.pairs.size());
     const double kPpb[] = {3, 50, 50, -50, -50, 49, 8, -49};
     for (size_t i = 0; i < 8; ++i) {
         EXPECT_EQ(kPpb[i], ours.pairs[i].orderedPpb) << i;
-        EXPECT_EQ(i == 2 ? -6 : i == 6 ? -9 : 0, ours.pairs[i].stepNs) << i;
+        EXPECT_EQ(i == 2 ? -6 : i == 7 ? -9 : 0, ours.pairs[i].stepNs) << i;
         EXPECT_EQ(i == 7, ours.pairs[i].locked) << i;
     }
 }
@@ -321,7 +322,7 @@ const tRefusedRow kRefused[] = {
     {"reference_ns,clock_ns\n",
      " looks like CSV with reference_ns and clock_ns, but has no measurement; it begins with"},
     {"reference_ns,clock\n", " is no trace of a known kind; it begins with 'reference_ns,clock'"},
-    {"reference_ns,clock_ns,clock_ns\n1,2,3\n", "the column clock_ns stands there 2 times"},
+    {"reference_ns,clock_ns,reference_ns\n1,2,3\n", "the column reference_ns stands there 2 times"},
     {"reference_ns,clock_ns\n1.7E+18,1.7E+18\n", "a spreadsheet has rounded away"},
     {"reference_ns,clock_ns\nx,1\n", "not used are lines 2 (no number in reference_ns"},
     {"elapsed_s,reference_ns,clock_ns\nx,1,2\n", "(elapsed_s is not a time"},
@@ -349,6 +350,8 @@ const tRefusedRow kRefused[] = {
      "'i', "
      "is not a number as it should be), 4 (field 7, '-9.303e+', is not a number as it should be)"},
     {"Tau: 1\nTau: 1.0000011\n1\n2\n", "its Tau of 1.0000011 s is not the interval given"},
+    {"Tau: 1\n1\n1e9\n", "line 3 is an error of years"},
+    {"0= 1 2 3\n", " is no trace of a known kind"},
     {"Tau: 0\n1\n2\n", "no time, and no --interval"},
     {"Tau: 1\n0 1\n1 2\n", "it has a Tau and more than one column"},
     {"Unit: V\n1\n", "its unit 'V' is none of time"},
@@ -427,6 +430,8 @@ TEST(Trace, doesNotMixFormats)
          " mixes "},
         {"2015-04-19 10:39:{} h 3 -1.4 0.056 -9.303e-04\n", "p[{}.5]: offset 1 s2 freq +1\n", 4, 2,
          ""},
+        {"2015-04-19 10:39:{} h 3 -1.4 0.056 -9.303e-04\n", "p[{}.5]: offset 1 s2 freq +1\n", 10,
+         12, " mixes chrony's tracking.log with"},
         {"50935 {}.031 0.06 13.7 6\n", "49213 {}.6 127.127.4.1 93 226\n", 3, 3,
          " is mostly ntpd's clockstats"},
         {"50935 {}.031 0.06 13.7 6\n", "49213 {}.6 127.127.4.1 93 226\n", 4, 3, ""},
