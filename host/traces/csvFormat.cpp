@@ -67,8 +67,8 @@ private:
     bool hasCalls = false;
     tHostCalls calls; // of the last pair
     std::optional<tLockObserver> observer;
-    double lowestPpb = 0;
-    double highestPpb = 0;
+    double lowestPpb{};
+    double highestPpb{};
     std::optional<double> orderedPpb;
     std::vector<tOrder> orders;       // since the last pair; one may come while none does
     std::optional<double> initialPpb; // before anything was ordered

@@ -67,8 +67,8 @@ bool isChronycTracking(std::string_view line)
 
 bool isChronycSources(std::string_view line)
 {
-    const bool row = line.size() > 3 && std::string_view("^=#").find(line[0]) < 3 &&
-                     std::string_view("*+-?x~ ").find(line[1]) < 7 && line[2] == ' ' &&
+    const bool row = line.size() > 3 && contains("^=#", line.substr(0, 1)) &&
+                     contains("*+-?x~ ", line.substr(1, 1)) && line[2] == ' ' &&
                      contains(line, "+/-");
     return row || begins(line, "MS Name/IP address");
 }

@@ -214,7 +214,7 @@ tRecordingBuilder::tSource& tRecordingBuilder::chosen(const std::string& name,
     }
     if (fitting.size() == 1) return *fitting.front();
     if (sources.empty()) throw std::runtime_error(name + " has no measurement");
-    if (fitting.size() > 1) {
+    if (!fitting.empty()) {
         throw std::runtime_error(
             fmt::format("{} has several sources, choose one by --source: {}", name, listOf(names)));
     }

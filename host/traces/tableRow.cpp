@@ -75,7 +75,7 @@ char separatorOf(std::string_view line)
     // "0,125 13,223" has decimal commas, "0.125, 13.223" and "0 ,5" have none.
     const size_t blank = line.find(' ');
     const bool decimal = blank != std::string_view::npos && comma < blank &&
-                         comma + 1 < line.size() && line[comma + 1] != ' ' &&
+                         line[comma + 1] != ' ' &&
                          std::isdigit(static_cast<unsigned char>(line[blank - 1])) != 0 &&
                          line.find(',', blank) != std::string_view::npos;
     return decimal ? kBlanks : ',';

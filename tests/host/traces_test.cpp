@@ -238,6 +238,8 @@ const tReadRow kRead[] = {
      250'000'000, ""},
     {"one Tau after another", "Tau: 1\nTau 1.0000009\nphase (ns)\n7\n8\n", 2, 7, 8, 1'000'000'900,
      ""},
+    {"a remark", "Tau: 1\nnote a=b\n1\n2\n", 2, 1e9, 2e9, kSecondNs, "",
+     "1: 2 in front of the first row"},
     {"dates alone",
      "2024-05-06T10:00:00Z 12e-9\n2024-05-06 10:00:01 x\n2024-05-06T10:00:02 -3e-9\n", 2, 12, -3,
      2 * kSecondNs, "", "1: 2 no numbers"},
@@ -394,7 +396,8 @@ const std::pair<const char*, const char*> kKinds[] = {
      "a rms 3 mux 4 freq\na rms x max 4 freq\na rms 3 max 4\nLast offset\na : b\nx* a +/- 3us\n"
      "^y a +/- 3us\n^*a  +/- 3us\n^* a\n^* \nName/IP Address x\nx NP\n remote  refid  st\n"
      "remote reach \nrefid reach\n50928 3600.2 127.127.4.1 9624 0.5\n50928 x 127.127.4.1 93 226\n"
-     "50928 3600.2 a 9624\n50928 3600.2 1.5 zz\nsample NTP2 1 2\nsource 0\n assert \nmsn 127.127. "
+     "50928 3600.2 a 9624\n50928 3600.2 1.5 zz\nsample NTP2 1 2\n2022-05-01 02:01:20 a * --1-- 377 "
+     "1.0 4e+01 -1e-04 1e-04\nsource 0\n assert \nmsn 127.127. "
      "x"},
 };
 
@@ -514,19 +517,22 @@ TEST(Trace, beginsAStretchAfterAReboot)
 TEST(Trace, beginsAStretchWhereAJournalSaysSo)
 {
     const std::string before = "ptp4l[1.0]: master offset 1 s2 freq +1 path delay 1\n";
-    const std::string after = "ptp4l[9.0]: master offset 2 s2 freq +1 path delay 1\n";
+    const std::string after = "ptp4l[9.0]: master offset 2 s2 freq +1 path delay 1\n"
+                              "ptp4l[9.5]: master offset 2 s2 freq +1 path delay 1\n";
     for (const char* const line : {"-- Reboot --\n", "-- Boot 1f2e3d4c --\n"}) {
         const tRecording recording = readTraceOf(before + line + after);
-        ASSERT_EQ(2U, recording.pairs.size());
+        ASSERT_EQ(3U, recording.pairs.size());
         EXPECT_TRUE(recording.pairs[1].beginsStretch) << line;
+        EXPECT_FALSE(recording.pairs[2].beginsStretch) << line;
+        EXPECT_EQ(500'000'001, recording.pairs[2].elapsedNs); // the gap is of unknown length
     }
 }
 
 TEST(Trace, readsSummariesAsWhatTheyAre)
 {
     const tRecording recording =
-        readTraceOf("ptp4l[1.0]: rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[2.0]: rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n"
+        readTraceOf("ptp4l[1.0]: a b c d e rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
+                    "ptp4l[2.0]: a b c d e rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n"
                     "ptp4l[3.0]: rms 4 mux 9 freq +1 +/- 3 delay 237 +/- 0\n"
                     "ptp4l[4.0]: rms -1 max 9 freq\nptp4l[5.0]: rms 5.1 max 4 freq\n"
                     "ptp4l[6.0]: rms 5 max 4\nptp4l[7.0]: rms 5 max 1000000000000000000 freq\n"
@@ -555,6 +561,8 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
     }
     const tRecording seconds = readTraceOf("t,x\n0,5\n1,6\n");
     EXPECT_EQ(5e9, seconds.pairs.front().errorNs);
+    EXPECT_EQ("columns of time and time error", seconds.format);
+    EXPECT_EQ("a column of phase", readTraceOf("Tau: 1\n1\n").format);
     EXPECT_EQ(
         std::vector<std::string>{
             "the column 'x' does not tell its unit, so it is seconds; --unit tells another"},
@@ -580,6 +588,7 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
     const tRecording frequency = readTraceOf("1e-9\n-3e-9\n", options);
     ASSERT_EQ(3U, frequency.pairs.size());
     EXPECT_NEAR(-4, frequency.pairs.back().errorNs, 1e-9);
+    EXPECT_EQ("a column of fractional frequency", frequency.format);
 }
 
 template <typename Parts> std::string joined(const Parts& parts)
