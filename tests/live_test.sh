@@ -142,6 +142,16 @@ clock,error_ns,ordered_ppb,event
      8.000 s  reference is silent: holding the frequency
      9.000 s  reference is back after 4 s
 left out of the reference's samples: 0 out of date, 3 not usable
+== from the first one on | reading 20ns;ptp ptp;at 90ns silence ptp;at 3500ms resume ptp | --reference phc:ptp --config calm.json --interval 1s --duration 8s
+     5.000 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
+     6.000 s  stepped by -3.06 ms
+     7.000 s  locked, error +0 ns
+left out of the reference's samples: 0 out of date, 4 not usable
+== those of the clock, at first and later | reading 20ns;ptp ptp;at 90ns silence ptp;at 3500ms resume ptp;at 7500ms silence ptp;at 9500ms resume ptp | --clock phc:ptp --interval 1s --duration 12s
+     5.000 s  frequency measured: +0.000 ppm off, now steered by +0.000 ppm
+     6.000 s  no step needed, error +0 ns
+     7.000 s  locked, error +0 ns
+left out of the reference's samples: 0 out of date, 6 not usable
 == no permission | system quirks=p;ptp ptp | --reference phc:ptp --clock realtime --interval 1s
 dravik-host: cannot set the frequency of CLOCK_REALTIME, which takes CAP_SYS_TIME: Operation not permitted
 exit 1

@@ -41,7 +41,6 @@ std::unique_ptr<iReference> openReference(const std::string& name, int64_t inter
     if (const auto path = afterPrefix(name, "sock:")) return socketReference(*path);
     if (const auto path = afterPrefix(name, "phc:")) {
         const auto device = std::make_shared<tPtpDevice>(*path);
-        device->crossRead(); // one that cannot be read at all fails at once
         return clockReference(intervalNs, [device] { return device->crossRead(); });
     }
     return clockReference(intervalNs, readSystemItself);

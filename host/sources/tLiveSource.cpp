@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <system_error>
 
 namespace dravikHost {
 
@@ -27,18 +28,22 @@ std::optional<tMoment> tLiveSource::next()
     if (signals.stopRaised() || (options.durationNs && elapsedNs() >= *options.durationNs))
         return std::nullopt;
     if (!sample) return tMoment{elapsedNs(), {}, leftOut()};
-    const tReading now = crossRead();
-    const bool even = ranEvenly(now);
+    const auto now = crossRead();
+    if (!ordered || !now) {
+        ++unread;
+        return tMoment{elapsedNs(), {}, leftOut()};
+    }
+    const bool even = ranEvenly(*now);
     const bool upToDate =
-        sample->systemNs >= ordered->reading.systemNs && sample->systemNs <= now.reading.systemNs;
+        sample->systemNs >= ordered->reading.systemNs && sample->systemNs <= now->reading.systemNs;
     if (even && upToDate) {
-        const tPair pair = pairAt(*sample, now);
+        const tPair pair = pairAt(*sample, *now);
         ordered.reset();
         return tMoment{pair.elapsedNs, pair, leftOut()};
     }
     ++outOfDate;
     if (!even) ordered = now;
-    return tMoment{now.elapsedNs, {}, leftOut()};
+    return tMoment{now->elapsedNs, {}, leftOut()};
 }
 
 std::string tLiveSource::remarks() const
@@ -49,17 +54,23 @@ std::string tLiveSource::remarks() const
                        samples.outOfDate, samples.unusable);
 }
 
-tLeftOut tLiveSource::leftOut() const { return {outOfDate, reference.unusable()}; }
+tLeftOut tLiveSource::leftOut() const { return {outOfDate, reference.unusable() + unread}; }
 
 int64_t tLiveSource::elapsedNs() const
 {
     return static_cast<int64_t>(options.rawNs() - startRawNs);
 }
 
-tLiveSource::tReading tLiveSource::crossRead()
+// Nothing if the reading fails, as one of a PTP clock may now and then; one that is gone is an end.
+std::optional<tLiveSource::tReading> tLiveSource::crossRead()
 {
-    const tCrossReading reading = clock.crossRead();
-    return {elapsedNs(), reading};
+    try {
+        const tCrossReading reading = clock.crossRead();
+        return tReading{elapsedNs(), reading};
+    } catch (const std::system_error& failure) {
+        if (failure.code() == std::errc::no_such_device) throw;
+        return std::nullopt;
+    }
 }
 
 // Whether the machine's clock was left alone by others, who may step it.

@@ -33,7 +33,7 @@ private:
 
     int64_t elapsedNs() const;
     tLeftOut leftOut() const;
-    tReading crossRead();
+    std::optional<tReading> crossRead();
     bool ranEvenly(const tReading& now) const;
     tPair pairAt(const tReferenceSample& sample, const tReading& now) const;
 
@@ -43,7 +43,8 @@ private:
     tOptions options;
     uint64_t startRawNs;
     std::optional<tReading> ordered; // since when the clock has not been ordered anything
-    int64_t outOfDate = 0;           // samples
+    int64_t outOfDate = 0;          // samples
+    int64_t unread = 0;             // samples, as the clock could not be read then
 };
 
 } // namespace dravikHost
