@@ -80,6 +80,9 @@ stray argument      |2|^dravik-host: unknown argument x$|show x
 no unit             |2|--interval: '12' has no unit; use ns, us, ms, s, min or h|simulate --interval 12
 rate above 100 %    |2|--outlier-rate: '101%' is not within|simulate --outlier-rate 101%
 negative seed       |2|--seed: '-1'|simulate --seed -1
+too fine            |2|--resolution: '0.01ppb' is not within 0.015625ppb to 1ppb|simulate --resolution 0.01ppb
+no such resolution  |2|--resolution: 'best' does not start with a number|replay x --resolution best
+limits too wide     |0|^ +0.000 s  resolution 0.125 ppb: limits and thresholds allow no finer one|simulate --max-frequency-offset 100000ppm
 no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
 another library     |1|libm.* has no zvckmservo_initialize|run --library libm.so.6
 no such file        |1|^dravik-host: cannot read $scratch/none: No such|run --config $scratch/none
@@ -145,6 +148,11 @@ expect "rows of pairs" 300 "$(grep -c '^pair,' "$scratch/1.csv")"
 for call in stepTime getFrequency setFrequency getMaxFrequencyOffset getMinFrequencyOffset; do
     expect "rows of $call" "$(grep -o "$call [0-9]*" "$scratch/1")" \
         "$call $(grep -cE "^call,[0-9.]+,,,,,$call,-?[0-9]+(\.[0-9]{0,5}[1-9])?$" "$scratch/1.csv")"
+done
+for resolution in finest=0.015625 0.3ppb=0.25 1ppb=1; do
+    expect "orders of $resolution" "" "$("${host[@]}" simulate --csv - --resolution "${resolution%=*}" 2> /dev/null |
+        awk -F, -v step="${resolution#*=}" '/setFrequency/ { ++rows; parts = $8 / step; odd += parts % 2 != 0
+            if (parts != int(parts)) print } END { if (!odd || !rows) print "none" }')"
 done
 rows() { "${host[@]}" simulate --duration 3s --csv - "$@" 2> /dev/null; }
 quiet=(--noise 0 --frequency-noise 0 --frequency-wander 0)

@@ -94,6 +94,31 @@ TEST(FineServo, ordersFractions)
     EXPECT_EQ(kLockLost, beside.servo.adjustTime(beside.referenceNs, beside.referenceNs - 1000));
 }
 
+// A law that forgets its last order, so only its own rounding sets one resolution apart from
+// another.
+TEST(FineServo, filtersSpikesAsTheServoItself)
+{
+    tServoParameters parameters;
+    parameters.phaseLockCoefficientC = 0;
+    parameters.spikeFilterEnabled = 1;
+    parameters.spikeFilterMinThreshold = 1e-9; // 100 ns from pair to pair
+    parameters.spikeFilterMaxThreshold = 3e-9;
+    tBeside coarse(1, kStartNs, 0, 500'000, parameters);
+    tBeside fine(64, kStartNs, 0, 500'000, parameters);
+    const auto ordered = [](tBeside& beside, int64_t errorNs) {
+        beside.referenceNs += kIntervalNs;
+        beside.servo.adjustTime(beside.referenceNs,
+                                beside.referenceNs + static_cast<uint64_t>(errorNs));
+        return beside.ordered();
+    };
+    for (tBeside* const each : {&coarse, &fine}) {
+        for (int i = 0; i < 3; ++i)
+            each->next();
+    }
+    for (const int64_t errorNs : {20, 41, 900, 30, -700, 40, 950, -30, -990})
+        EXPECT_NEAR(ordered(coarse, errorNs), ordered(fine, errorNs), 0.52) << errorNs;
+}
+
 TEST(FineServo, knowsItsLimits)
 {
     const struct {
