@@ -55,13 +55,12 @@ tStep tDiscipline::take(const tPair& pair)
 bool tDiscipline::isToBeHanded(const tPair& pair, tStep& step)
 {
     if (!selfTuning) return !spacing.holdsBack(pair.elapsedNs);
-    const auto advice = selfTuning->prepare(pair.elapsedNs, pair.errorNs());
+    const bool handed = selfTuning->prepare(pair.elapsedNs, pair.errorNs());
     step.calls = selfTuning->orders();
-    followOrders(step);
     step.belief = selfTuning->belief();
     step.tuning = selfTuning->note();
-    if (advice == tSelfTuning::kMeasureAnew) clearHistory();
-    return advice != tSelfTuning::kLeaveOut;
+    if (!handed) followOrders(step);
+    return handed;
 }
 
 // What the clock was asked is part of the step also if the plug-in then failed.

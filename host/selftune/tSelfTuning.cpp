@@ -30,7 +30,7 @@ void tSelfTuning::restart()
     writeDocument(tLoopGains::of({}), kWhileAcquiring);
 }
 
-tSelfTuning::tAdvice tSelfTuning::prepare(int64_t elapsedNs, int64_t errorNs)
+bool tSelfTuning::prepare(int64_t elapsedNs, int64_t errorNs)
 {
     ownOrders.clear();
     isCoasting = false;
@@ -40,18 +40,19 @@ tSelfTuning::tAdvice tSelfTuning::prepare(int64_t elapsedNs, int64_t errorNs)
     const tBelief before = estimate.belief();
     const auto event = estimate.take(elapsedNs, errorNs, written ? &*written : nullptr);
     noteText = textOf(event, before);
-    if (event == tClockEstimate::kUseless) return kLeaveOut;
-    if (!lawActs()) return kHandOver;
+    if (event == tClockEstimate::kUseless) return false;
+    if (!lawActs()) return true;
     constexpr double kPairsToReturn = 4;
     const double reachNs = kPairsToReturn * estimate.secondsPerPair() * clock.maxOffsetPpb() / 2;
-    if (std::fabs(estimate.phaseNs()) > reachNs) return kMeasureAnew;
-    if (event == tClockEstimate::kRejected || event == tClockEstimate::kOtherNoise) {
+    const bool isFar = std::fabs(estimate.phaseNs()) > reachNs;
+    if (isFar) stepBack();
+    if (isFar || event == tClockEstimate::kRejected || event == tClockEstimate::kOtherNoise) {
         order(wantedPpb());
-        return kLeaveOut;
+        return false;
     }
     chooseGains();
     prepareLaw(errorNs);
-    return kHandOver;
+    return true;
 }
 
 void tSelfTuning::follow(int64_t errorNs, tLockEvent event, const tHostCalls& calls)
@@ -127,6 +128,14 @@ void tSelfTuning::order(double ppb)
     ownOrders.push_back({kSetFrequency, 0, nowPpb});
     estimate.steered(nowPpb - inForcePpb);
     inForcePpb = nowPpb;
+}
+
+void tSelfTuning::stepBack()
+{
+    const int64_t byNs = -std::llround(estimate.phaseNs());
+    clock.step(byNs);
+    ownOrders.push_back({kStepTime, byNs, 0});
+    estimate.stepped(byNs);
 }
 
 void tSelfTuning::writeDocument(const tLoopGains& gains, double snapTimeThreshold)

@@ -28,10 +28,9 @@ public:
     // Both are borrowed. Writes the document to acquire a lock with. Throws as the servo does.
     tSelfTuning(tFineServo& servo, iClock& clock);
 
-    enum tAdvice { kHandOver, kLeaveOut, kMeasureAnew };
-
-    // Before a pair is given to the servo. May order the clock; throws what the clock throws.
-    tAdvice prepare(int64_t elapsedNs, int64_t errorNs);
+    // Before a pair is given to the servo: whether it is to be. May order the clock, and step it
+    // where its rate cannot bring it back within some pairs; throws what the clock throws.
+    bool prepare(int64_t elapsedNs, int64_t errorNs);
 
     // What the servo did with a pair that it was given.
     void follow(int64_t errorNs, tLockEvent event, const tHostCalls& calls);
@@ -55,6 +54,7 @@ private:
     void chooseGains();
     void prepareLaw(int64_t errorNs);
     void order(double ppb);
+    void stepBack();
     void writeDocument(const tLoopGains& gains, double snapTimeThreshold);
     std::string textOf(tClockEstimate::tEvent event, const tBelief& before) const;
 

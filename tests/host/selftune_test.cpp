@@ -200,10 +200,10 @@ TEST(SelfTuning, acquiresHoldsAndFollows)
     loop.events.clear();
     loop.clock.step(-20'000'000); // which would take minutes at the highest rate
     loop.rmsNs(8);
-    EXPECT_EQ("---.msL.", loop.events);
+    EXPECT_EQ("----....", loop.events);
     EXPECT_EQ(2, loop.latest.steps);
-    EXPECT_EQ(1, loop.latest.locksLost);
-    EXPECT_GT(40, loop.rmsNs(100));
+    EXPECT_EQ(0, loop.latest.locksLost);
+    EXPECT_GT(12, loop.rmsNs(300));
 }
 
 TEST(SelfTuning, coastsAtTheEstimatedRate)
