@@ -14,8 +14,9 @@ trap 'rm -rf "$scratch"' EXIT
 unset DRAVIK_LIBRARY
 cd "$scratch" || exit 1
 
-# The clock starts 3 ms ahead and 12 ppm fast. The second number of errors is the first pair's.
-printf '%s\n' 30 -10 20 -40 0 > errors
+# The clock starts 3 ms ahead and 12 ppm fast. Samples before the first pair have the first of the errors.
+printf "%s\n" 30 -10 20 -40 0 > errors
+printf "%s\n" -10 20 -40 0 30 > readings
 echo '{"snapTimeThreshold": 1e-3}' > calm.json
 cp calm.json live.json
 mkdir folder
@@ -23,7 +24,7 @@ mkdir folder
 figures() { sed -n 's/^dravik_//p' "$@"; }
 replay() { "${EMULATOR:-env}" "$bin/dravik-host" replay "$@" 2> /dev/null; }
 expectRuns << 'END'
-== a line for each pair | ptp ref errors=errors | --reference phc:ref --interval 1s --duration 9s --config calm.json --status 0 --metrics m --csv trace | figures m; grep -c '^# HELP' m; grep -c '^# TYPE' m; tail -3 trace
+== a line for each pair | ptp ref errors=readings | --reference phc:ref --interval 1s --duration 9s --config calm.json --status 0 --metrics m --csv trace | figures m; grep -c '^# HELP' m; grep -c '^# TYPE' m; tail -3 trace
 dravik-host[0.000]: offset    3000010 s0 freq      +0
      1.000 s  frequency measured: +11.970 ppm off, now steered by -11.970 ppm
 dravik-host[1.000]: offset    3011980 s0 freq  +11970
@@ -58,7 +59,7 @@ samples_unusable_total 0
 pair,8.000000000,1000000008000000000,1000000007999999949,-51,,,
 call,8.000000000,,,,,getFrequency,-12064.453125
 call,8.000000000,,,,,setFrequency,-11978.65625
-== lines now and then | ptp ref errors=errors | --reference phc:ref --interval 1s --duration 22s --config calm.json --status 10s
+== lines now and then | ptp ref errors=readings | --reference phc:ref --interval 1s --duration 22s --config calm.json --status 10s
      1.000 s  frequency measured: +11.970 ppm off, now steered by -11.970 ppm
      2.000 s  stepped by -3.012 ms
      3.000 s  locked, error -10 ns
@@ -223,7 +224,7 @@ exit 2
 END
 
 # Its lines are a trace.
-simulatedHost "ptp ref errors=errors" run --reference phc:ref --duration 9s --config calm.json --status 0 > out
+simulatedHost "ptp ref errors=readings" run --reference phc:ref --duration 9s --config calm.json --status 0 > out
 expect "its lines are a trace" 72 "$(replay out | sed -nE 's/^pairs +([0-9]+) .*/\1/p')"
 
 # In real time a run takes its time, shows each line at once, and ends by a signal. Nothing here

@@ -39,7 +39,11 @@ struct tBeside {
         clock.pass(kIntervalNs);
         return servo.adjustTime(referenceNs, clock.timeNs());
     }
-    double ordered() const { return findCall(servo.calls(), kSetFrequency)->ppb; }
+    double ordered() const
+    {
+        const tHostCall* const call = findCall(servo.calls(), kSetFrequency);
+        return call != nullptr ? call->ppb : std::nan("");
+    }
 
     uint64_t referenceNs = kStartNs;
     tSteeredClock clock;

@@ -69,11 +69,11 @@ struct ServoHost : testing::Test {
 std::string told(const tHostCalls& calls)
 {
     std::string text;
-    for (const tHostCall& call : calls)
-        text +=
-            std::string(kHostOperationNames[call.operation]) + " " +
-            decimalText(isOfFrequency(call.operation) ? call.ppb : static_cast<double>(call.ns)) +
-            "; ";
+    for (const tHostCall& call : calls) {
+        const double value =
+            isOfFrequency(call.operation) ? call.ppb : static_cast<double>(call.ns);
+        text += std::string(kHostOperationNames[call.operation]) + " " + decimalText(value) + "; ";
+    }
     return text;
 }
 
