@@ -173,8 +173,8 @@ host calls  getTime 0, stepTime 1, getFrequency 30, setFrequency 30,
 WARNING     the lock did not hold: lost 1 time, 1.5 % of the time without it
             Compare the document with the noise: dravik-host check DOCUMENT --interval TIME
             --noise TIME; or design one: dravik-host tune TRACE
-estimated_error_seconds 6.97442861e-06
-estimated_error_seconds 1.5510187e-05
+estimated_error_seconds 6.98723077e-06
+estimated_error_seconds 1.55229913e-05
 == seldom, but not silent | system | --interval 150ms --holdover-after 50ms --remeasure-after 60ms --duration 1s
      0.150 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
      0.300 s  stepped by -3.002 ms

@@ -24,49 +24,49 @@ expect "by what was given" "" "$(diff - report << 'END'
 measurements of 50 ns every 3 s, 1 % of outliers of 2 us;
 oscillator with 2 ppb of white noise at 1 s and 1 ppb of wander per root second
                             built-in    this one
-error, RMS                  2.863 us    45.21 ns
-error, peak                 12.58 us    323.5 ns
+error, RMS                  2.863 us    45.16 ns
+error, peak                 13.09 us    309.7 ns
 locks lost per hour              129           0
 starts that fail, alone     30 of 30     1 of 30
-kp, 1/s                         0.55      0.1013
-ki, 1/s per pair                0.55     0.01528
-damping                            -        0.77
-settles within                 never     76.23 s
-noise that passes                  -        53 %
-theory: error, RMS                      38.43 ns
+kp, 1/s                         0.55       0.106
+ki, 1/s per pair                0.55      0.0151
+damping                            -        0.82
+settles within                 never     72.21 s
+noise that passes                  -        54 %
+theory: error, RMS                      38.27 ns
 slow to acquire; quicker with further documents, which --quick writes:
-    --measure-over 6s --config QUICK --then 42s=tuned.json
+    --measure-over 6s --config QUICK --then 39s=tuned.json
 END
 )"
 cat > wanted << 'END'
 == trace.csv --quick q.json
-measurements of 51.56 ns every 1 s;
+measurements of 51.58 ns every 1 s;
 oscillator with white noise that cannot be told from the measurements' and 1.01 ppb of wander per root second
-    --measure-over 3s --config q.json --then 22s=DOCUMENT
+    --measure-over 3s --config q.json --then 23s=DOCUMENT
 == short.csv --frequency-noise 3ppb --interval 2s
-measurements of 52.57 ns every 2 s, 0.84 % of outliers of 2.999 us;
-oscillator with 3 ppb of white noise at 1 s and at most 2.37 ppb of wander per root second
+measurements of 52.62 ns every 2 s, 0.84 % of outliers of 3 us;
+oscillator with 3 ppb of white noise at 1 s and at most 2.38 ppb of wander per root second
 ! the trace is too short to tell the wander: 0 to 2.4 ppb per root second are possible;
-! by theory that leaves an error of 22.54 ns to 43.03 ns RMS; take a longer trace or give --wander
-    --measure-over 8s --config QUICK --then 58s=DOCUMENT
+! by theory that leaves an error of 15.45 ns to 43.02 ns RMS; take a longer trace or give --wander
+    --measure-over 14s --config QUICK --then 112s=DOCUMENT
 == short.csv --outlier-rate 0% --interval 999400us
-measurements of 52.57 ns every 999.4 ms;
-oscillator with 8.85 ppb of white noise at 1 s and at most 2.37 ppb of wander per root second
-    --measure-over 2.9982s --config QUICK --then 20.9874s=DOCUMENT
+measurements of 52.62 ns every 999.4 ms;
+oscillator with 8.86 ppb of white noise at 1 s and at most 2.38 ppb of wander per root second
+    --measure-over 2.9982s --config QUICK --then 25.9844s=DOCUMENT
 == steps.csv --wander 20ppb --frequency-noise 3ppb --outlier-size 5us --outlier-rate 0.5%
 measurements in steps of 1 us whose noise the steps hide, taken as 50 ns every 1 s, 0.5 % of outliers of 5 us;
 oscillator with 3 ppb of white noise at 1 s and 20 ppb of wander per root second
-    --measure-over 3s --config QUICK --then 28s=DOCUMENT
+    --measure-over 3s --config QUICK --then 22s=DOCUMENT
 == still.csv
 measurements whose noise cannot be told from the oscillator's every 1 s;
-oscillator with 20.9 ppb of white noise at 1 s and at most 0.324 ppb of wander per root second
+oscillator with 20.8 ppb of white noise at 1 s and at most 0.324 ppb of wander per root second
 == still.csv --noise 3ns --interval 999500us
 measurements of 3 ns every 1 s;
-oscillator with 20.9 ppb of white noise at 1 s and at most 0.324 ppb of wander per root second
+oscillator with 20.8 ppb of white noise at 1 s and at most 0.324 ppb of wander per root second
 == --noise 10us --wander 1ppb --interval 1s -o quiet.json --quick quick.json
 measurements of 10 us every 1 s;
 oscillator with 0.1 ppb of white noise at 1 s and 1 ppb of wander per root second
-    --measure-over 10s --config quick.json --then 89s=quick2.json --then 355s=quiet.json
+    --measure-over 10s --config quick.json --then 95s=quick2.json --then 380s=quiet.json
 END
 sed -n 's/^== //p' wanted | while read -r arguments; do
     echo "== $arguments"

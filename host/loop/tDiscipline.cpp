@@ -112,9 +112,9 @@ tSilence tDiscipline::wait(int64_t elapsedNs)
 {
     tSilence silence;
     silence.elapsedNs = elapsedNs;
-    silence.dryRun = options.dryRun;
-    if (selfTuning && selfTuning->coast(elapsedNs)) silence.calls = selfTuning->orders();
-    if (!options.dryRun && !silence.calls.empty()) inForcePpb = silence.calls.back().ppb;
+    if (!selfTuning || !selfTuning->coast(elapsedNs)) return silence;
+    silence.calls = selfTuning->orders();
+    inForcePpb = silence.calls.back().ppb;
     return silence;
 }
 

@@ -37,7 +37,6 @@ struct tSilence {
     std::optional<double> errorNs{};     // by how far the clock may be off, one deviation; if known
     tLeftOut leftOut{};                  // samples so far
     tHostCalls calls{};                  // orders to let the clock run on by itself
-    bool dryRun = false;                 // as of a step
 };
 
 // Somebody who watches a clock under discipline. Nobody asks a watcher what to do next.

@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <system_error>
 
 namespace dravikHost {
 
@@ -16,8 +17,7 @@ constexpr double kWhileLocked = 0.1;     // s: what is to be believed is decided
 
 } // namespace
 
-tSelfTuning::tSelfTuning(tFineServo& servo, iClock& clock)
-    : servo(servo), clock(clock), inForcePpb(clock.offsetPpb())
+tSelfTuning::tSelfTuning(tFineServo& servo, iClock& clock) : servo(servo), clock(clock)
 {
     restart();
 }
@@ -76,9 +76,13 @@ bool tSelfTuning::coast(int64_t elapsedNs)
     ownOrders.clear();
     if (isCoasting || !servo.locked()) return false;
     if (estimate.secondsSincePair(elapsedNs) < kLate * estimate.secondsPerPair()) return false;
-    isCoasting = true;
     estimate.wait(elapsedNs);
-    order(inForcePpb - estimate.frequencyPpb());
+    try {
+        order(inForcePpb - estimate.frequencyPpb());
+    } catch (const std::system_error&) { // it may be silent itself; then it is asked again later
+        return false;
+    }
+    isCoasting = true;
     return true;
 }
 

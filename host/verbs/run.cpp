@@ -14,6 +14,7 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <iterator>
 #include <memory>
 #include <stdexcept>
 
@@ -120,10 +121,9 @@ void requireConsistency(const tOptionSet& options, const tRun& run)
 // Nobody knows the noise beforehand: who names no tuning leaves it to the program.
 void tuneItself(const tOptionSet& options, tDisciplineOptions& discipline)
 {
-    const auto given = [&options](const char* name) { return options.given(name); };
-    if (!given("--config") && !given("--then") && !given("--metadata") &&
-        !given("--reference-type") && !given("--measure-over"))
-        discipline.selfTune = true;
+    const bool tuned = std::any_of(std::begin(kTuningOptions), std::end(kTuningOptions),
+                                   [&options](const char* name) { return options.given(name); });
+    if (!tuned && !discipline.dryRun) discipline.selfTune = true;
 }
 
 void addGuardOptions(tOptionSet& options, tRun& run)

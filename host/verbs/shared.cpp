@@ -105,8 +105,11 @@ void requireOneTuning(const tOptionSet& options, const tDisciplineOptions& disci
 {
     requireOneInput(discipline.tuning);
     if (!discipline.selfTune) return;
-    for (const char* const option :
-         {"--config", "--then", "--metadata", "--reference-type", "--measure-over"}) {
+    if (discipline.dryRun) {
+        throw std::invalid_argument(
+            "--self-tune: there is nothing to learn from a dry run, whose clock follows no order");
+    }
+    for (const char* const option : kTuningOptions) {
         if (!options.given(option)) continue;
         throw std::invalid_argument(std::string("--self-tune: ") + option +
                                     " says how to tune; it is one or the other");

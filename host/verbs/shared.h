@@ -14,6 +14,10 @@ namespace dravikHost {
 void addTuningOptions(tOptionSet& options, tTuning& tuning);
 void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline);
 
+// Those that say how the servo is tuned.
+constexpr const char* kTuningOptions[] = {"--config", "--then", "--metadata", "--reference-type",
+                                          "--measure-over"};
+
 // What would have no effect, or two things say differently, is a mistake.
 void requireOneTuning(const tOptionSet& options, const tDisciplineOptions& discipline);
 

@@ -33,7 +33,7 @@ void tTraceFile::see(const tStep& step)
 
 void tTraceFile::see(const tSilence& silence)
 {
-    if (file) addCalls(silence.elapsedNs, silence.calls, silence.dryRun);
+    if (file) addCalls(silence.elapsedNs, silence.calls, false);
 }
 
 void tTraceFile::addCalls(int64_t elapsedNs, const tHostCalls& calls, bool held)
