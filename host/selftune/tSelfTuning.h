@@ -61,7 +61,7 @@ private:
     tFineServo& servo;
     iClock& clock;
     tClockEstimate estimate;
-    double inForcePpb = 0; // as last seen
+    double inForcePpb = 0;                        // as last seen
     bool snapped = false;                         // the next pair is the law's first
     double lawErrorNs = 0;                        // the last one that the law remembers
     bool isCoasting = false;                      // ordered already

@@ -43,8 +43,8 @@ private:
     tOptions options;
     uint64_t startRawNs;
     std::optional<tReading> ordered; // since when the clock has not been ordered anything
-    int64_t outOfDate = 0;          // samples
-    int64_t unread = 0;             // samples, as the clock could not be read then
+    int64_t outOfDate = 0;           // samples
+    int64_t unread = 0;              // samples, as the clock could not be read then
 };
 
 } // namespace dravikHost
