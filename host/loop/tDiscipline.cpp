@@ -73,7 +73,7 @@ void tDiscipline::hand(const tPair& pair, tStep& step)
         failure = std::current_exception();
     }
     const tHostCalls& calls = servo.calls();
-    step.calls.insert(step.calls.end(), calls.begin(), calls.end());
+    step.calls.append(calls);
     followOrders(step);
     if (failure) std::rethrow_exception(failure);
     spacing.given(pair.elapsedNs, step.event, servo.measuring());

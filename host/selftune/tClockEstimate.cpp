@@ -128,7 +128,7 @@ tClockEstimate::tEvent tClockEstimate::doubt(double innovation)
 // Gains that are nearly as good as the filter's own are used, so that they need not be changed.
 tClockEstimate::tEvent tClockEstimate::trust(double phaseNs, const tKalmanFilter::tGains* preferred)
 {
-    constexpr double kNear = 0.05;
+    constexpr double kNear = 0.08;
     const double innovation = phaseNs - filter.phase;
     changeNoise(noise.take(innovation * innovation / varianceFactor()));
     bank.take(phaseNs, noise.variance());

@@ -36,12 +36,13 @@ void tNoiseLevel::seeChange(double changeNs)
 
 double tNoiseLevel::take(double square)
 {
+    const double outlier = taken < kStart ? 0 : kOutlier / std::sqrt(inForce);
+    const double floorNs = std::sqrt(floorVariance);
     double levelNs = kLowestNs;
     for (double& share : shares) {
-        const double variance = std::max(levelNs * levelNs, floorVariance);
-        const double tail = 1 + square / (7 * variance);
-        const double outlier = taken < kStart ? 0 : kOutlier / std::sqrt(inForce);
-        share *= 1 / (tail * tail * tail * tail * std::sqrt(variance)) + outlier;
+        const double deviation = std::max(levelNs, floorNs);
+        const double tail = 1 + square / (7 * deviation * deviation);
+        share *= 1 / (tail * tail * tail * tail * deviation) + outlier;
         levelNs *= 2;
     }
     const double believed = believedVariance();

@@ -23,7 +23,7 @@ tWanderBank::tWanderBank() { shares.fill(1.0 / kModels); }
 
 void tWanderBank::begin(const tKalmanFilter& start, double seconds)
 {
-    interval = seconds;
+    passedSeconds = 0;
     filters.fill(start);
     double ratio = kLowestRatio;
     for (double& each : wander) {
@@ -34,8 +34,12 @@ void tWanderBank::begin(const tKalmanFilter& start, double seconds)
 
 void tWanderBank::predict(double seconds)
 {
-    for (size_t i = 0; i < kModels; ++i)
-        filters[i].predict(seconds, disturbance(0, wander[i], seconds));
+    const bool asBefore = seconds == passedSeconds;
+    passedSeconds = seconds;
+    for (size_t i = 0; i < kModels; ++i) {
+        if (!asBefore) added[i] = disturbance(0, wander[i], seconds);
+        filters[i].predict(seconds, added[i]);
+    }
 }
 
 void tWanderBank::take(double phaseNs, double noiseVariance)

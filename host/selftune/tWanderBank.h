@@ -40,10 +40,11 @@ private:
 
     void normalise();
 
-    double interval = 1;
     std::array<tKalmanFilter, kModels> filters{};
-    std::array<double, kModels> wander{}; // by which each filter is widened, per root second
-    tShares shares{};                     // of belief
+    std::array<double, kModels> wander{};     // by which each filter is widened, per root second
+    std::array<tCovariance, kModels> added{}; // in passedSeconds
+    double passedSeconds = 0;
+    tShares shares{}; // of belief
 };
 
 } // namespace dravikHost

@@ -233,6 +233,7 @@ tLine tCsvFormat::readCall(const tFields& fields, tRecordingBuilder& builder)
 {
     const auto call = callIn(fields);
     if (!call) return tLine::unread("no call that is known");
+    if (calls.isFull()) return tLine::unread("more calls than a pair can have");
     hasCalls = true;
     calls.push_back(*call);
     if (fields[kKind] == "held") return {tLine::kFrame, ""};
