@@ -152,29 +152,29 @@ left out of the reference's samples: 1 out of date, 0 not usable
     24.000 s  reference is silent: holding the frequency
 dravik-host[31.000]: holdover for 12 s, error about 478 ns
     60.000 s  reference is back after 41 s
-dravik-host[61.000]: rms  391 max  553 freq  +12450 +/- 164
+dravik-host[61.000]: rms   66 max   80 freq  +11961 +/-  48
     74.000 s  reference is silent: holding the frequency
-dravik-host[91.000]: holdover for 22 s, error about 3.133 us
-dravik-host[121.000]: holdover for 52 s, error about 7.4 us
-dravik-host[151.000]: holdover for 82 s, error about 11.67 us
-dravik-host[181.000]: holdover for 112 s, error about 15.94 us
+dravik-host[91.000]: holdover for 22 s, error about 918.5 ns
+dravik-host[121.000]: holdover for 52 s, error about 2.169 us
+dravik-host[151.000]: holdover for 82 s, error about 3.42 us
+dravik-host[181.000]: holdover for 112 s, error about 4.67 us
    200.000 s  reference is back after 131 s: measuring anew
-   201.000 s  frequency measured: +0.051 ppm off, now steered by -12.040 ppm
-   202.000 s  no step needed, error +1.312 us
-   203.000 s  locked, error +1.332 us
+   201.000 s  frequency measured: +0.037 ppm off, now steered by -12.039 ppm
+   202.000 s  no step needed, error -409 ns
+   203.000 s  locked, error -389 ns
 pairs       34 in 204.000 s
 lock        after 4.000 s, lost 1 time, missed 0 times; 28 of 31 pairs locked since
-error       RMS 500.4 ns, peak 1.383 us, last -213 ns
-            while locked: RMS 290 ns, peak 1.332 us
+error       RMS 143.2 ns, peak 409 ns, last -40 ns
+            while locked: RMS 86.71 ns, peak 389 ns
             (of the clock against the reference as measured, all pairs since the first lock)
-frequency   ordered -13.505 ppm to -11.855 ppm, last -12.538 ppm
-host calls  getTime 0, stepTime 1, getFrequency 30, setFrequency 30,
+frequency   ordered -12.071 ppm to -11.612 ppm, last -11.781 ppm
+host calls  getTime 0, stepTime 1, getFrequency 30, setFrequency 31,
             getMaxFrequencyOffset 1, getMinFrequencyOffset 1
 WARNING     the lock did not hold: lost 1 time, 1.5 % of the time without it
             Compare the document with the noise: dravik-host check DOCUMENT --interval TIME
             --noise TIME; or design one: dravik-host tune TRACE
-estimated_error_seconds 6.98723077e-06
-estimated_error_seconds 1.55229913e-05
+estimated_error_seconds 2.04788167e-06
+estimated_error_seconds 4.54942595e-06
 == seldom, but not silent | system | --interval 150ms --holdover-after 50ms --remeasure-after 60ms --duration 1s
      0.150 s  frequency measured: +12.000 ppm off, now steered by -12.000 ppm
      0.300 s  stepped by -3.002 ms

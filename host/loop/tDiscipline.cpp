@@ -4,13 +4,15 @@
 
 #include <fmt/format.h>
 
+#include <algorithm>
+#include <system_error>
 #include <utility>
 
 namespace dravikHost {
 
 tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
                          const tDisciplineOptions& options)
-    : library(library), options(options), tuned(readDocuments(library, options)),
+    : library(library), options(options), tuned(readDocuments(library, options)), clock(clock),
       servo(library, clock,
             tFineServo::factorFor(options.factor, tFineServo::limitOf(clock),
                                   tuned.documents.widestThreshold()),
@@ -49,6 +51,7 @@ tStep tDiscipline::take(const tPair& pair)
     step.inForcePpb = inForcePpb;
     step.steps = steps;
     step.locksLost = locksLost;
+    meanOrders.add(step);
     return step;
 }
 
@@ -66,6 +69,7 @@ bool tDiscipline::isToBeHanded(const tPair& pair, tStep& step)
 // What the clock was asked is part of the step also if the plug-in then failed.
 void tDiscipline::hand(const tPair& pair, tStep& step)
 {
+    resumeLaw(step);
     std::exception_ptr failure;
     try {
         step.event = servo.adjustTime(pair.referenceNs, pair.clockNs);
@@ -105,17 +109,40 @@ void tDiscipline::clearHistory()
     servo.clearHistory();
     if (wasLocked) ++locksLost;
     spacing.restart();
+    meanOrders.restart();
     if (selfTuning) selfTuning->restart();
 }
 
+// A clock that is silent itself is asked again later.
 tSilence tDiscipline::wait(int64_t elapsedNs)
 {
     tSilence silence;
     silence.elapsedNs = elapsedNs;
-    if (!selfTuning || !selfTuning->coast(elapsedNs)) return silence;
-    silence.calls = selfTuning->orders();
-    inForcePpb = silence.calls.back().ppb;
+    if (options.dryRun) return silence;
+    if (selfTuning) {
+        if (selfTuning->coast(elapsedNs)) silence.calls = selfTuning->orders();
+    } else if (const auto meanPpb = meanOrders.orderFor(elapsedNs)) {
+        try {
+            order(*meanPpb, silence.calls);
+        } catch (const std::system_error&) {
+            meanOrders.restart();
+        }
+    }
+    if (!silence.calls.empty()) inForcePpb = silence.calls.back().ppb;
     return silence;
+}
+
+void tDiscipline::resumeLaw(tStep& step)
+{
+    const tServoParameters& law = servo.parameters();
+    if (const auto ppb = meanOrders.resume(law.phaseLockGain * law.phaseLockCoefficientB))
+        order(*ppb, step.calls);
+}
+
+void tDiscipline::order(double ppb, tHostCalls& calls)
+{
+    clock.setOffsetPpb(std::clamp<double>(ppb, clock.minOffsetPpb(), clock.maxOffsetPpb()));
+    calls.push_back({kSetFrequency, 0, clock.offsetPpb()});
 }
 
 tNotes tDiscipline::retune()

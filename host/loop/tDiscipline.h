@@ -2,6 +2,7 @@
 
 #include "clocks/iClock.h"
 #include "loop/tLaterDocuments.h"
+#include "loop/tMeanOrders.h"
 #include "loop/tMeasureSpacing.h"
 #include "loop/tStep.h"
 #include "selftune/tSelfTuning.h"
@@ -60,14 +61,18 @@ private:
     bool isToBeHanded(const tPair& pair, tStep& step);
     void hand(const tPair& pair, tStep& step);
     void followOrders(tStep& step);
+    void resumeLaw(tStep& step);
+    void order(double ppb, tHostCalls& calls);
 
     const tServoLibrary& library;
     const tDisciplineOptions& options;
     tTuned tuned;
+    iClock& clock;
     tFineServo servo;
     std::optional<tSelfTuning> selfTuning;
     tHostCalls callsThatMadeIt;
     tMeasureSpacing spacing;
+    tMeanOrders meanOrders;
     double inForcePpb;
     int64_t steps = 0;
     int64_t locksLost = 0;

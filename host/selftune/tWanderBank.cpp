@@ -73,10 +73,15 @@ void tWanderBank::noiseGrew(double times)
         }
         shares[from < to ? 0 : kModels - 1] = kNever;
     };
-    for (; times > kHalfOctave; times /= 2)
+    double left = times;
+    while (left > kHalfOctave) {
         shift(1, 0);
-    for (; times < 1 / kHalfOctave; times *= 2)
+        left /= 2;
+    }
+    while (left < 1 / kHalfOctave) {
         shift(0, 1);
+        left *= 2;
+    }
     normalise();
 }
 

@@ -72,7 +72,7 @@ void tFineServo::writeParameters(const tServoParameters& parameters)
     shown.spikeFilterMinThreshold = withinBounds(zvckmservo_kSpikeFilterMinThreshold,
                                                  factor() * parameters.spikeFilterMinThreshold);
     host.writeConfig(shown.exactText());
-    frequencyLockGain = parameters.frequencyLockGain;
+    inForce = parameters;
 }
 
 // Of a measurement that is none, as neither clock moved, the plug-in makes 0 ppb, and measures
@@ -134,15 +134,15 @@ std::optional<tFineServo::tShown> tFineServo::showSecond(uint64_t referenceNs, u
     if (referenceElapsedNs == 0 && clockElapsedNs == 0) return std::nullopt;
     const double inForcePpb = enlarged.clock.offsetPpb();
     const double ratio = (1 + inForcePpb * kPerPpb) * rateOver(referenceElapsedNs, clockElapsedNs) *
-                         frequencyLockGain;
+                         inForce.frequencyLockGain;
     const double lowest = enlarged.minOffsetPpb();
     const double highest = enlarged.maxOffsetPpb();
     const double wanted = std::round(enlarged.factor * ((ratio - 1) / kPerPpb));
     const double target = wanted > highest  ? highest + 1
                           : wanted < lowest ? lowest - 1
                                             : std::max(std::min(wanted, highest - 1), lowest + 1);
-    const double rate =
-        (1 + target * kPerPpb) / (1 + enlarged.enlarged(inForcePpb) * kPerPpb) / frequencyLockGain;
+    const double rate = (1 + target * kPerPpb) / (1 + enlarged.enlarged(inForcePpb) * kPerPpb) /
+                        inForce.frequencyLockGain;
     constexpr double kLongNs = 1e18; // for the digits of the quotient
     const auto passed = [](double ns) { return static_cast<uint64_t>(std::llround(ns)); };
     return tShown{first->shown.referenceNs + passed(rate < 1 ? kLongNs * rate : kLongNs),

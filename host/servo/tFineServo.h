@@ -41,6 +41,8 @@ public:
     // Throws std::runtime_error if a parameter is refused, or the threshold as above.
     void writeParameters(const tServoParameters& parameters);
 
+    const tServoParameters& parameters() const { return inForce; }
+
     // What the plug-in asked of the clock during the last pair, or during initialisation.
     const tHostCalls& calls() const { return realCalls; }
     bool locked() const { return lock.locked(); }
@@ -83,7 +85,7 @@ private:
     tEnlargedClock enlarged;
     tServoHost host;
     tLockObserver lock;
-    double frequencyLockGain = 1;
+    tServoParameters inForce;
     tHostCalls realCalls;
     std::optional<uint64_t> originNs; // the first reference of all
     std::optional<tFirstPair> first;  // of the measurement that goes on

@@ -3,6 +3,7 @@
 #include "host/stepFixture.h"
 #include "loop/tDiscipline.h"
 #include "loop/tHoldoverEstimate.h"
+#include "loop/tMeanOrders.h"
 #include "loop/tSanityCheck.h"
 #include "text/quantity.h"
 
@@ -216,6 +217,24 @@ TEST(Discipline, appliesLaterDocumentsAnewWhenTunedAnew)
     EXPECT_EQ("tuned as at the start", discipline.take(scene.second()).tuning);
     EXPECT_EQ("", discipline.take(scene.second()).tuning);
     EXPECT_EQ(kStepped, discipline.take(scene.second('m')).event);
+}
+
+TEST(MeanOrders, areInForceWhilePairsAreMissing)
+{
+    tMeanOrders orders;
+    for (int i = 0; i < 7; ++i)
+        orders.add(stepAt(i, 10, true, 1000));
+    EXPECT_FALSE(orders.orderFor(nsOfSeconds(60))); // too few are known
+    for (int i = 7; i < 40; ++i)
+        orders.add(stepAt(i, 10 * i, true, 1000 * (i % 2)));
+    EXPECT_FALSE(orders.resume(0.5));
+    EXPECT_FALSE(orders.orderFor(nsOfSeconds(40.4)));
+    EXPECT_EQ(500, orders.orderFor(nsOfSeconds(40.5)));
+    EXPECT_FALSE(orders.orderFor(nsOfSeconds(41)));
+    EXPECT_EQ(500 - 0.5 * 390, orders.resume(0.5)); // what the last error had added
+    EXPECT_FALSE(orders.resume(0.5));
+    orders.add(stepAt(60, 10, false, 0)); // the lock is lost
+    EXPECT_FALSE(orders.orderFor(nsOfSeconds(90)));
 }
 
 } // namespace

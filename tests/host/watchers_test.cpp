@@ -107,16 +107,20 @@ template <typename Moment> std::string progressOf(const Moment& moment)
 {
     const tDescriptor terminal(posix_openpt(O_RDWR | O_NOCTTY));
     EXPECT_EQ(0, grantpt(terminal.get()) + unlockpt(terminal.get()));
-    const tDescriptor line(open(ptsname(terminal.get()), O_RDWR | O_NOCTTY));
-    const tDescriptor before(dup(STDERR_FILENO));
-    dup2(line.get(), STDERR_FILENO);
     {
-        tConsole console(false);
-        tReport(console).see(moment);
+        const tDescriptor line(open(ptsname(terminal.get()), O_RDWR | O_NOCTTY));
+        const tDescriptor before(dup(STDERR_FILENO));
+        dup2(line.get(), STDERR_FILENO);
+        {
+            tConsole console(false);
+            tReport(console).see(moment);
+        }
+        dup2(before.get(), STDERR_FILENO);
     }
-    dup2(before.get(), STDERR_FILENO);
-    std::string text(100, '\0');
-    text.resize(static_cast<size_t>(read(terminal.get(), text.data(), text.size())));
+    std::string text; // until all is read: it may come in pieces
+    char piece[100];
+    for (ssize_t size = 0; (size = read(terminal.get(), piece, sizeof piece)) > 0;)
+        text.append(piece, static_cast<size_t>(size));
     return text;
 }
 
