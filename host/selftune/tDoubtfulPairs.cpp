@@ -5,30 +5,59 @@
 
 namespace dravikHost {
 
+namespace {
+
+constexpr double kMemory = 200; // pairs
+
+// Whether so many squares add up to what noise makes of them: two deviations more, and a little.
+bool isNoise(double squares, double freedom, double noiseVariance)
+{
+    return squares < noiseVariance * (freedom + 2 * std::sqrt(2 * freedom) + 1);
+}
+
+} // namespace
+
 void tDoubtfulPairs::takeGood(const tPoint& point)
 {
     add(point, false);
     inRow = 0;
+    goodSeconds = point.seconds;
 }
 
-// The longer it lasts without an explanation, the more of the latest points have to agree on one,
-// as some few of many will always lie on a line.
+// All pairs of a jump agree from the start. Later, of what began otherwise, half of all have to, as
+// some few of many will always do.
 tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, double noiseVariance)
 {
-    constexpr size_t kLevel = 4;
     constexpr size_t kSloping = 5;
+    constexpr size_t kAfterOthers = 6;
+    const size_t forJump = pointsOfJump();
     add(point, true);
     ++inRow;
-    const size_t half = std::min((inRow + 1) / 2, kKept);
-    if (inRow >= kLevel) {
-        const tVerdict verdict = line(std::max(kLevel, half), false, noiseVariance);
+    const size_t points = inRow <= forJump
+                              ? forJump
+                              : std::max({forJump, kAfterOthers, std::min((inRow + 1) / 2, kKept)});
+    if (inRow >= points) {
+        const tVerdict verdict = level(points, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }
-    if (inRow >= kSloping) {
-        const tVerdict verdict = line(std::max(kSloping, half), true, noiseVariance);
+    if (inRow >= std::max(kSloping, forJump) && inRow <= kKept) {
+        const tVerdict verdict = slope(inRow, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }
     return grownNoise();
+}
+
+// Where outliers are frequent, more of them come in a row by chance.
+size_t tDoubtfulPairs::pointsOfJump() const
+{
+    constexpr size_t kLeast = 4;
+    constexpr size_t kMost = 10;
+    constexpr double kSeldom = 1e-5;
+    size_t points = kLeast;
+    double chance = share * share * share * share;
+    for (; points < kMost && chance > kSeldom; ++points)
+        chance *= share;
+    return points;
 }
 
 void tDoubtfulPairs::forget() { count = inRow = 0; }
@@ -36,37 +65,46 @@ void tDoubtfulPairs::forget() { count = inRow = 0; }
 void tDoubtfulPairs::add(const tPoint& point, bool doubtful)
 {
     entries[count++ % kKept] = {point, doubtful};
+    share += ((doubtful ? 1 : 0) - share) / kMemory;
 }
 
-// The line through the latest points, if they are no farther from it than the noise makes them:
-// the sum of squares within three deviations of what it should be, and a little.
-tDoubtfulPairs::tVerdict tDoubtfulPairs::line(size_t points, bool sloping,
-                                              double noiseVariance) const
+tDoubtfulPairs::tVerdict tDoubtfulPairs::level(size_t points, double noiseVariance) const
 {
-    const double n = static_cast<double>(points);
-    const double now = latest(0).point.seconds;
-    double t = 0, x = 0, tt = 0, tx = 0;
+    const auto n = static_cast<double>(points);
+    double sum = 0;
+    for (size_t i = 0; i < points; ++i)
+        sum += latest(i).point.innovationNs;
+    const double phase = sum / n;
+    double squares = 0;
+    for (size_t i = 0; i < points; ++i) {
+        const double off = latest(i).point.innovationNs - phase;
+        squares += off * off;
+    }
+    if (!isNoise(squares, n - 1, noiseVariance)) return {};
+    return {kJump, phase, 0, 0, 0};
+}
+
+// A line from where the clock was when it was last as foreseen: its phase does not jump.
+tDoubtfulPairs::tVerdict tDoubtfulPairs::slope(size_t points, double noiseVariance) const
+{
+    double tt = 0;
+    double tx = 0;
     for (size_t i = 0; i < points; ++i) {
         const tPoint& each = latest(i).point;
-        const double ago = each.seconds - now;
-        t += ago;
-        x += each.innovationNs;
-        tt += ago * ago;
-        tx += ago * each.innovationNs;
+        const double since = each.seconds - goodSeconds;
+        tt += since * since;
+        tx += since * each.innovationNs;
     }
-    const double spread = n * tt - t * t;
-    const double slope = sloping ? (n * tx - t * x) / spread : 0;
-    const double phase = (x - slope * t) / n;
+    const double slope = tx / tt;
     double squares = 0;
     for (size_t i = 0; i < points; ++i) {
         const tPoint& each = latest(i).point;
-        const double off = each.innovationNs - phase - slope * (each.seconds - now);
+        const double off = each.innovationNs - slope * (each.seconds - goodSeconds);
         squares += off * off;
     }
-    const double freedom = n - (sloping ? 2 : 1);
-    if (!(squares < noiseVariance * (freedom + 3 * std::sqrt(2 * freedom) + 3))) return {};
-    if (!sloping) return {kJump, phase, 0, 0, 0};
-    return {kNewFrequency, phase, slope, noiseVariance * n / spread, 0};
+    if (!isNoise(squares, static_cast<double>(points) - 1, noiseVariance)) return {};
+    const double passed = latest(0).point.seconds - goodSeconds;
+    return {kNewFrequency, slope * passed, slope, noiseVariance / tt, 0};
 }
 
 // Half of the latest points are doubtful, and to both sides; or it goes on for so long that it has

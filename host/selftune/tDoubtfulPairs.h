@@ -39,13 +39,17 @@ private:
 
     void add(const tPoint& point, bool doubtful);
     const tEntry& latest(size_t back) const { return entries[(count - 1 - back) % kKept]; }
-    tVerdict line(size_t points, bool sloping, double noiseVariance) const;
+    size_t pointsOfJump() const;
+    tVerdict level(size_t points, double noiseVariance) const;
+    tVerdict slope(size_t points, double noiseVariance) const;
     tVerdict grownNoise() const;
     double scatter(size_t points) const;
 
     std::array<tEntry, kKept> entries{};
-    size_t count = 0; // ever added since it last forgot
-    size_t inRow = 0; // doubtful ones, at the end
+    size_t count = 0;       // ever added since it last forgot
+    size_t inRow = 0;       // doubtful ones, at the end
+    double goodSeconds = 0; // when the latest good one was
+    double share = 0;       // of doubtful ones, lately
 };
 
 } // namespace dravikHost

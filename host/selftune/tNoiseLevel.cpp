@@ -14,7 +14,7 @@ constexpr double kMemory = 200;        // pairs, of the mean
 constexpr int kStart = 12;             // pairs in which only the levels count
 constexpr double kChange = 1e-4;       // chance that the level is another one at the next pair
 constexpr double kOutlier = 1e-3;      // density of what is no noise, over that of the noise
-constexpr double kFar = 6;             // between variances, which is another noise
+constexpr double kFar = 4;             // between variances, which is another noise
 constexpr int kSure = 4;               // pairs
 
 } // namespace

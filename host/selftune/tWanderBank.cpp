@@ -6,7 +6,7 @@ namespace dravikHost {
 
 namespace {
 
-constexpr double kLowestRatio = 3e-5; // each next one is twice as large, up to 4
+constexpr double kLowestRatio = 3e-5; // each next one is twice as large, up to 16
 constexpr double kChange = 1e-3;      // chance that the ratio is another one at the next pair
 
 // How likely a measurement is that is off by so much, squared, in variances foreseen: Student's

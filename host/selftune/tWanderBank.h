@@ -35,7 +35,7 @@ public:
     double ratio() const;
 
 private:
-    static constexpr size_t kModels = 18;
+    static constexpr size_t kModels = 20;
     using tShares = std::array<double, kModels>;
 
     void normalise();
