@@ -83,6 +83,8 @@ negative seed       |2|--seed: '-1'|simulate --seed -1
 too fine            |2|--resolution: '0.01ppb' is not within 0.015625ppb to 1ppb|simulate --resolution 0.01ppb
 no such resolution  |2|--resolution: 'best' does not start with a number|replay x --resolution best
 limits too wide     |0|^ +0.000 s  resolution 0.125 ppb: limits and thresholds allow no finer one|simulate --max-frequency-offset 100000ppm
+too many hops       |2|--hops: '51' is not 1 to 50|simulate --hops 51
+one text for two    |2|--hops: the standard input is enough|simulate --hops 2 --config -
 no such library     |1|^dravik-host: cannot load the plug-in: $scratch/none|simulate --library $scratch/none
 another library     |1|libm.* has no zvckmservo_initialize|run --library libm.so.6
 no such file        |1|^dravik-host: cannot read $scratch/none: No such|run --config $scratch/none

@@ -23,10 +23,11 @@ double measurementErrorNs(const tMeasurementModel& model, tNoise& noise)
 }
 
 tSimulatedSource::tSimulatedSource(tSimulatedClock& clock, tScenario phases, tNoise& noise,
-                                   uint64_t seed)
-    : clock(clock), scenario(std::move(phases)), now(scenario.front()), noise(noise),
-      chances(seed, kDelayedCause), delays(seed, kDelayCause), misses(seed, kMissingCause),
-      flicker(tNoise(seed, kFlickerCause)), elapsedNs(-now.measurement.intervalNs)
+                                   uint64_t seed, tSimulatedClock* referenceClock)
+    : clock(clock), referenceClock(referenceClock), scenario(std::move(phases)),
+      now(scenario.front()), noise(noise), chances(seed, kDelayedCause), delays(seed, kDelayCause),
+      misses(seed, kMissingCause), flicker(tNoise(seed, kFlickerCause)),
+      elapsedNs(-now.measurement.intervalNs)
 {}
 
 // Numbers are drawn for a pair that does not come too, so that silence does not change the noise.
@@ -59,7 +60,8 @@ tPair tSimulatedSource::measure()
     const uint64_t trueNs = kStartNs + static_cast<uint64_t>(elapsedNs + jumpedNs);
     const double errorNs = std::floor(measurementErrorNs(model, noise) +
                                       flicker.withTime(model.flickerNs) - delayNs());
-    const uint64_t seenNs = trueNs + static_cast<uint64_t>(static_cast<int64_t>(errorNs));
+    const uint64_t referenceNs = referenceClock != nullptr ? referenceClock->timeNs() : trueNs;
+    const uint64_t seenNs = referenceNs + static_cast<uint64_t>(static_cast<int64_t>(errorNs));
     return tPair{elapsedNs, cut(seenNs), cut(clock.timeNs()), clock.aheadOfNs(trueNs)};
 }
 

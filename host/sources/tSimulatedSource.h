@@ -17,8 +17,10 @@ public:
     static constexpr uint64_t kStartNs = 1'700'000'000'000'000'000;
 
     // Clock and noise are borrowed; the clock, which is as the first phase says, is moved on from
-    // pair to pair. What comes beside that noise has the seed.
-    tSimulatedSource(tSimulatedClock& clock, tScenario scenario, tNoise& noise, uint64_t seed = 0);
+    // pair to pair. What comes beside that noise has the seed. The reference is the true time, or
+    // else a clock that is borrowed too.
+    tSimulatedSource(tSimulatedClock& clock, tScenario scenario, tNoise& noise, uint64_t seed = 0,
+                     tSimulatedClock* referenceClock = nullptr);
 
     std::optional<tMoment> next() override;
 
@@ -29,6 +31,7 @@ private:
     bool comes();
 
     tSimulatedClock& clock;
+    tSimulatedClock* referenceClock;
     tScenario scenario;
     tPhase now;
     size_t entered = 1; // phases so far

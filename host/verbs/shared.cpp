@@ -1,5 +1,6 @@
 #include "verbs/shared.h"
 
+#include "text/words.h"
 #include "watchers/tReport.h"
 #include "watchers/tSummary.h"
 #include "watchers/tTraceFile.h"
@@ -41,6 +42,15 @@ void addLater(std::vector<tLaterDocument>& later, const std::string& text)
     if (!later.empty() && document.afterNs <= later.back().afterNs)
         throw std::invalid_argument("'" + text + "' does not come after the one before");
     later.push_back(document);
+}
+
+int parseHops(const std::string& text)
+{
+    constexpr int kMostHops = 50;
+    const auto hops = numberIn<int>(text);
+    if (!hops || *hops < 1 || *hops > kMostHops)
+        throw std::invalid_argument(fmt::format("'{}' is not 1 to {}", text, kMostHops));
+    return *hops;
 }
 
 void printUnread(const tRecording& recording)
@@ -124,6 +134,13 @@ std::string tuningText(const tDisciplineOptions& discipline)
     if (tuning.metaDataFile) return "tuned for what " + *tuning.metaDataFile + " tells";
     if (tuning.referenceType) return "tuned for the type '" + *tuning.referenceType + "'";
     return "with the built-in parameters";
+}
+
+void addHopsOption(tOptionSet& options, int& hops, const char* help)
+{
+    options.parsed(
+        "--hops", "NUMBER", [&hops](const std::string& text) { hops = parseHops(text); }, help,
+        "1");
 }
 
 void addDisciplineOptions(tOptionSet& options, tDisciplineOptions& discipline)

@@ -24,6 +24,9 @@ void requireOneTuning(const tOptionSet& options, const tDisciplineOptions& disci
 // "self-tuned", "tuned by a.json" and the like.
 std::string tuningText(const tDisciplineOptions& discipline);
 
+// Clocks in a row: 1 to 50.
+void addHopsOption(tOptionSet& options, int& hops, const char* help);
+
 // Files that may both be the standard input, which has one text to give.
 void requireOneInput(const tTuning& tuning);
 

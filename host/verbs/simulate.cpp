@@ -1,7 +1,6 @@
 #include "verbs/verbs.h"
 
-#include "loop/tDiscipline.h"
-#include "sources/tSimulatedSource.h"
+#include "loop/tSimulatedChain.h"
 #include "text/files.h"
 #include "verbs/shared.h"
 
@@ -23,6 +22,7 @@ struct tSimulation : tDisciplineOptions {
     std::string scenario; // file; "": none
     bool intervalGiven = false;
     uint64_t seed = 1;
+    int hops = 1;
 };
 
 // What a scenario says itself.
@@ -78,6 +78,14 @@ void checkScenario(const tOptionSet& options, tSimulation& simulation)
     simulation.intervalGiven = options.given("--interval");
 }
 
+// Each servo reads its documents.
+void checkHops(const tSimulation& simulation)
+{
+    const tTuning& tuning = simulation.tuning;
+    if (simulation.hops > 1 && (tuning.metaDataFile == "-" || tuning.configFile == "-"))
+        throw std::invalid_argument("--hops: the standard input is enough for one servo only");
+}
+
 tScenario scenarioOf(const tSimulation& options)
 {
     tScenarioStart start;
@@ -95,15 +103,11 @@ void run(const tSimulation& options)
     const tServoLibrary library(tServoLibrary::find(options.library));
     const tScenario scenario = scenarioOf(options);
     const tPhase& first = scenario.front();
-    tOscillatorModel oscillator = first.oscillator;
-    oscillator.frequencyErrorPpb = first.frequencyPpb;
-    tNoise noise(options.seed);
-    tSimulatedClock clock(tSimulatedSource::kStartNs + static_cast<uint64_t>(first.stepNs),
-                          oscillator, options.maxFrequencyOffsetPpb, noise, options.seed);
-    tSimulatedSource source(clock, scenario, noise, options.seed);
+    tSimulatedChain chain(library, scenario, options.hops, options.seed, options);
     const std::string file = options.scenario.empty() ? "" : ", scenario " + options.scenario;
-    runInMadeTime(library, clock, source,
-                  fmt::format("simulate: clock {}{}, seed {}; {}; {}",
+    const std::string row = options.hops > 1 ? fmt::format(" at hop {}", options.hops) : "";
+    runInMadeTime(library, chain.lastClock(), chain,
+                  fmt::format("simulate: clock{} {}{}, seed {}; {}; {}", row,
                               tInitialError{first.stepNs, first.frequencyPpb}.text(), file,
                               options.seed, tuningText(options), library.path),
                   options);
@@ -124,8 +128,11 @@ std::function<void()> addSimulate(tOptionSet& options)
         "Same seed, same bytes of output", std::to_string(simulation->seed));
     options.text("--scenario", "FILE", simulation->scenario,
                  "What is simulated, and changes on the way");
+    addHopsOption(options, simulation->hops,
+                  "So many clocks in a row, each on the one\nbefore; the last one is shown");
     options.finally([simulation, options] {
         requireOneTuning(options, *simulation);
+        checkHops(*simulation);
         checkScenario(options, *simulation);
     });
     return [simulation] { run(*simulation); };

@@ -5,8 +5,13 @@
 #include "loop/tHoldoverEstimate.h"
 #include "loop/tMeanOrders.h"
 #include "loop/tSanityCheck.h"
+#include "loop/tSimulatedChain.h"
+#include "maths/chainGains.h"
 #include "text/quantity.h"
 
+#include <array>
+#include <cmath>
+#include <cstdio>
 #include <stdexcept>
 
 using namespace dravikHost;
@@ -235,6 +240,42 @@ TEST(MeanOrders, areInForceWhilePairsAreMissing)
     EXPECT_FALSE(orders.resume(0.5));
     orders.add(stepAt(60, 10, false, 0)); // the lock is lost
     EXPECT_FALSE(orders.orderFor(nsOfSeconds(90)));
+// Each clock as theory has it, with noise of its own, behind the one before.
+TEST(SimulatedChain, hasTheErrorOfTheoryAtEachClock)
+{
+    constexpr int kHops = 4;
+    const tTestFile document("chain.json", R"({"phaseLockGain": 0.2, "phaseLockCoefficientA": 1.05,
+                                               "snapTimeThreshold": 1e-5})");
+    tDisciplineOptions options;
+    options.maxFrequencyOffsetPpb = 500'000;
+    options.tuning.configFile = document.path;
+    tPhase phase;
+    phase.oscillator.frequencyWanderPpb = 1;
+    phase.measurement.noiseNs = 50;
+    phase.measurement.intervalNs = kSecondNs;
+    phase.measurement.durationNs = 20'000 * kSecondNs;
+    phase.frequencyPpb = 12'000;
+    for (const int hops : {1, kHops}) {
+        tSimulatedChain chain(library(), {phase}, hops, 1, options);
+        tDiscipline last(library(), chain.lastClock(), options);
+        double squares = 0;
+        while (const auto moment = chain.next()) {
+            last.take(*moment->pair);
+            const bool settled = moment->elapsedNs >= 10'000 * kSecondNs;
+            squares += settled ? *moment->pair->trueErrorNs * *moment->pair->trueErrorNs : 0;
+        }
+        const double rmsNs = 50 * std::sqrt(chainVariance({0, 4e-4}, {0.2, 0.01}, hops));
+        EXPECT_NEAR(rmsNs, std::sqrt(squares / 10'000), 0.08 * rmsNs);
+        std::array<double, kHops> found{};
+        const int numbers =
+            std::sscanf(chain.remarks().c_str(), "hops RMS %lf ns, %lf ns, %lf ns, %lf ns",
+                        &found[0], &found[1], &found[2], &found[3]);
+        ASSERT_EQ(hops > 1 ? hops : -1, numbers) << chain.remarks();
+        for (int hop = 1; hop <= numbers; ++hop) {
+            const double ns = 50 * std::sqrt(chainVariance({0, 4e-4}, {0.2, 0.01}, hop));
+            EXPECT_NEAR(ns, found[hop - 1], 0.08 * ns);
+        }
+    }
 }
 
 } // namespace
