@@ -1,6 +1,7 @@
 #include "design/designDocuments.h"
 
 #include "design/kalmanDesign.h"
+#include "maths/chainGains.h"
 #include "maths/patternSearch.h"
 
 #include <fmt/format.h>
@@ -24,6 +25,20 @@ tNoiseModel withRounding(const tNoiseModel& model)
     const double orderedPpb = 1.0 / usualFactor(snapThresholdFor(model));
     sum.wanderPpb = std::hypot(model.wanderPpb, orderedPpb / std::sqrt(12.0 * model.interval()));
     return sum;
+}
+
+// What filter and threshold see of it on a clock with such an error.
+tNoiseModel seenBy(const tNoiseModel& model, double rmsNs)
+{
+    tNoiseModel seen = withRounding(model);
+    seen.noiseNs = std::hypot(seen.noiseNs, rmsNs);
+    return seen;
+}
+
+tChainNoise chainNoiseOf(const tNoiseModel& model)
+{
+    return tChainNoise::of(model.noiseNs, model.frequencyNoisePpb, model.wanderPpb,
+                           model.interval());
 }
 
 // The limit of the filter, in mean steps of the noise from pair to pair. If outliers are to be
@@ -181,7 +196,25 @@ void setSpikeFilter(tServoParameters& parameters, const tNoiseModel& model)
 
 tKalmanDesign theoreticalDesign(const tNoiseModel& model)
 {
-    return steadyKalman(withRounding(model));
+    if (model.hops == 1) return steadyKalman(withRounding(model));
+    const tChainGains best = bestChainGains(chainNoiseOf(withRounding(model)), model.hops);
+    const tLoopGains gains = {best.phase / model.interval(), best.frequency / model.interval()};
+    return {gains, theoreticalErrorNs(gains, model)};
+}
+
+double theoreticalErrorNs(const tLoopGains& gains, const tNoiseModel& model)
+{
+    const tNoiseModel all = withRounding(model);
+    const tChainGains perPair = {gains.kp * model.interval(), gains.ki * model.interval()};
+    return all.noiseNs * std::sqrt(chainVariance(chainNoiseOf(all), perPair, model.hops));
+}
+
+tServoParameters theoreticalDocument(const tNoiseModel& model)
+{
+    const tKalmanDesign kalman = theoreticalDesign(model);
+    return parametersAt(
+        {std::log(kalman.gains.kp), std::log(kalman.gains.ki), startingLimit(model)},
+        seenBy(model, kalman.rmsNs));
 }
 
 tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model,
@@ -189,8 +222,7 @@ tDesign designDocuments(const tServoLibrary& library, const tNoiseModel& model,
 {
     const tKalmanDesign kalman = theoreticalDesign(model);
     requirePlausible(kalman, model);
-    tNoiseModel seen = withRounding(model); // what the filter and the threshold see of it
-    seen.noiseNs = std::hypot(seen.noiseNs, kalman.rmsNs);
+    const tNoiseModel seen = seenBy(model, kalman.rmsNs);
     tDesign design;
     design.theoreticalRmsNs = kalman.rmsNs;
     design.quiet = refined(library, model, kalman.gains, seen, progress);

@@ -35,8 +35,12 @@ tDesign designDocuments(
     const tServoLibrary& library, const tNoiseModel& model,
     const tDesignProgress& progress = [](int) {});
 
-// What theory has for the model, with rounding.
+// What theory has for the model, with rounding; and what error it has for gains, in ns.
 tKalmanDesign theoreticalDesign(const tNoiseModel& model);
+double theoreticalErrorNs(const tLoopGains& gains, const tNoiseModel& model);
+
+// With the gains of theory and what suits the noise, nothing simulated.
+tServoParameters theoreticalDocument(const tNoiseModel& model);
 
 // Adds the quick documents, if the quiet one of the design needs any.
 void addQuick(tDesign& design, const tNoiseModel& model);

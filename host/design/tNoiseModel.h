@@ -16,6 +16,7 @@ struct tNoiseModel {
     double outlierSizeNs = 0;     // by which they are, with either sign
 
     int64_t granularityNs = 1; // timestamps are cut down to its multiples
+    int hops = 1;              // clocks in a row, all alike; the error is that of the last one
 
     double interval() const { return secondsOf(intervalNs); } // s
 };

@@ -7,6 +7,8 @@
 
 #include <algorithm>
 #include <cmath>
+#include <memory>
+#include <vector>
 
 namespace dravikHost {
 
@@ -49,8 +51,8 @@ public:
           spacing(first.measureOverNs), noisy(first.noisy)
     {}
 
-    // Returns the true error, in ns.
-    double takePair()
+    // Measures against the clock before, else against the true time. Returns the true error, in ns.
+    double takePair(tRun* before = nullptr)
     {
         clock.advance(intervalNs);
         trueNs += static_cast<uint64_t>(intervalNs);
@@ -59,8 +61,9 @@ public:
         elapsedNs += intervalNs;
         if (spacing.holdsBack(elapsedNs)) return errorNs;
         const auto errorSeenNs = static_cast<int64_t>(std::floor(seenNs));
-        const tLockEvent event =
-            servo.adjustTime(cut(trueNs + static_cast<uint64_t>(errorSeenNs)), cut(clock.timeNs()));
+        const uint64_t referenceNs = before != nullptr ? before->clock.timeNs() : trueNs;
+        const tLockEvent event = servo.adjustTime(
+            cut(referenceNs + static_cast<uint64_t>(errorSeenNs)), cut(clock.timeNs()));
         spacing.given(elapsedNs, event, servo.measuring());
         lost += event == kLockLost ? 1 : 0;
         missed = missed || event == kLockMissed;
@@ -92,6 +95,38 @@ private:
     uint64_t trueNs = tSimulatedSource::kStartNs;
 };
 
+// Clocks in a row, each with noise of its own.
+class tRow
+{
+public:
+    tRow(const tServoLibrary& library, const tServoParameters& parameters, const tNoiseModel& model,
+         uint64_t seed)
+    {
+        constexpr int kSeedBits = 32;
+        for (int hop = 0; hop < model.hops; ++hop) {
+            const uint64_t seedOfHop = seed + (static_cast<uint64_t>(hop) << kSeedBits);
+            runs.push_back(std::make_unique<tRun>(library, parameters, model, seedOfHop));
+        }
+    }
+
+    // Returns the true error of the last one, in ns.
+    double takePair()
+    {
+        tRun* before = nullptr;
+        double errorNs = 0;
+        for (const auto& run : runs) {
+            errorNs = run->takePair(before);
+            before = run.get();
+        }
+        return errorNs;
+    }
+
+    int64_t locksLost() const { return runs.back()->locksLost(); }
+
+private:
+    std::vector<std::unique_ptr<tRun>> runs;
+};
+
 } // namespace
 
 int usualFactor(double snapTimeThreshold)
@@ -108,7 +143,7 @@ tTrialResult runTrial(const tServoLibrary& library, const std::string& document,
     double eighths = 0;
     int64_t lost = 0;
     for (uint64_t i = 0; i < options.seeds; ++i) {
-        tRun run(library, parameters, model, kFirstSeed + i);
+        tRow run(library, parameters, model, kFirstSeed + i);
         for (int64_t pair = 0; pair < options.settlingPairs; ++pair)
             run.takePair();
         for (int64_t pair = 0; pair < options.countedPairs; ++pair) {
@@ -160,9 +195,10 @@ tStartResult runStarts(const tServoLibrary& library, const std::string& document
 tTrialOptions trialFor(const tLoopGains& gains, const tNoiseModel& model)
 {
     const double timeConstant = 1 / std::sqrt(gains.ki * model.interval()); // in pairs
-    const auto settling = static_cast<int64_t>(std::clamp(10 * timeConstant, 50.0, 2000.0));
+    const auto settling =
+        static_cast<int64_t>(std::clamp(10 * timeConstant * model.hops, 50.0, 2000.0));
     const auto counted = static_cast<int64_t>(std::clamp(200 * timeConstant, 2000.0, 10000.0));
-    return {settling, counted, 32};
+    return {settling, counted, static_cast<uint64_t>(std::max(32 / model.hops, 4))};
 }
 
 } // namespace dravikHost

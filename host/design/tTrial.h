@@ -13,7 +13,8 @@ namespace dravikHost {
 int usualFactor(double snapTimeThreshold);
 
 // What a document is worth: simulations through the plug-in, the rounding of orders and whole
-// nanoseconds included. The lock is acquired without noise, so what counts is how it is held.
+// nanoseconds included; of a row of clocks, at the last one. The lock is acquired without noise, so
+// what counts is how it is held.
 struct tTrialOptions {
     int64_t settlingPairs; // not counted
     int64_t countedPairs;

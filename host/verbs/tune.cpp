@@ -12,11 +12,12 @@
 
 #include <fmt/format.h>
 
-#include <array>
 #include <chrono>
 #include <filesystem>
 #include <memory>
 #include <stdexcept>
+#include <utility>
+#include <vector>
 
 namespace dravikHost {
 
@@ -38,6 +39,7 @@ struct tTune {
     tTraceOptions trace;
     tGivenNoise given;
     std::optional<tLoopGains> controller;
+    int hops = 1;
     std::string output;
     std::string quickOutput;
     std::string library;
@@ -103,6 +105,7 @@ tNoiseEstimate noiseModel(const tTune& options)
     model.noiseTold = model.noiseTold || given.noiseNs;
     model.frequencyNoiseTold = model.frequencyNoiseTold || given.frequencyNoisePpb;
     if (given.wanderPpb) model.leastWanderPpb = model.mostWanderPpb = *given.wanderPpb;
+    model.hops = options.hops;
     return model;
 }
 
@@ -134,9 +137,14 @@ std::string noiseText(const tNoiseEstimate& model)
     const std::string wander = model.mostWanderPpb > 0 && model.leastWanderPpb == 0
                                    ? fmt::format("at most {:.3g}", model.mostWanderPpb)
                                    : fmt::format("{:.3g}", model.wanderPpb);
+    const std::string row =
+        model.hops > 1 ? fmt::format("{} clocks in a row, all like that: errors are those of the "
+                                     "last one\n",
+                                     model.hops)
+                       : "";
     return fmt::format("measurements{} {} every {}{};\n"
-                       "oscillator with {} and {} ppb of wander per root second\n",
-                       steps, noise, spacingText(model.intervalNs), outliers, white, wander);
+                       "oscillator with {} and {} ppb of wander per root second\n{}",
+                       steps, noise, spacingText(model.intervalNs), outliers, white, wander, row);
 }
 
 // A wander that the trace hardly tells, if the error depends on it.
@@ -159,19 +167,28 @@ std::string rangeText(const tNoiseEstimate& model)
                        durationText(mostNs));
 }
 
-// Two documents side by side, as simulations through the plug-in show them.
+struct tColumn {
+    const char* name;
+    tServoParameters parameters;
+    tTrialResult held{};
+    tStartResult started{};
+};
+
+// Documents side by side, as simulations through the plug-in show them.
 class tComparison
 {
 public:
-    tComparison(const tServoLibrary& library, const tNoiseModel& model,
-                const tServoParameters& builtIn, const tServoParameters& tuned)
-        : interval(model.interval()), columns{builtIn, tuned}
+    // As long as a loop with the gains needs.
+    tComparison(const tServoLibrary& library, const tNoiseModel& model, const tLoopGains& gains,
+                std::vector<tColumn> documents)
+        : interval(model.interval()), columns(std::move(documents))
     {
-        const tTrialOptions trial = trialFor(tLoopGains::of(tuned), model);
+        const tTrialOptions trial = trialFor(gains, model);
         const tStartOptions alone = {2 * trial.settlingPairs, kStarts};
-        for (size_t i = 0; i < columns.size(); ++i) {
-            results[i] = runTrial(library, columns[i].documentText(), model, trial);
-            starts[i] = runStarts(library, columns[i].documentText(), model, alone);
+        for (tColumn& column : columns) {
+            const std::string document = column.parameters.documentText();
+            column.held = runTrial(library, document, model, trial);
+            column.started = runStarts(library, document, model, alone);
         }
     }
 
@@ -179,13 +196,15 @@ public:
     {
         const auto gains = [](const tServoParameters& p) { return tLoopGains::of(p); };
         const auto loop = [this](const tServoParameters& p) { return tLoopAnalysis(p, interval); };
-        return fmt::format("{:<24}{:>12}{:>12}\n", "", "built-in", "this one") +
-               row("error, RMS", [](const tTrialResult& r) { return durationText(r.rmsNs); }) +
-               row("error, peak", [](const tTrialResult& r) { return durationText(r.peakNs); }) +
+        return row("", [](const tColumn& c) { return c.name; }) +
+               row("error, RMS", [](const tColumn& c) { return durationText(c.held.rmsNs); }) +
+               row("error, peak", [](const tColumn& c) { return durationText(c.held.peakNs); }) +
                row("locks lost per hour",
-                   [](const tTrialResult& r) { return fmt::format("{:.3g}", r.lostPerHour); }) +
-               fmt::format("{:<24}{:>12}{:>12}\n", "starts that fail, alone", startsText(starts[0]),
-                           startsText(starts[1])) +
+                   [](const tColumn& c) { return fmt::format("{:.3g}", c.held.lostPerHour); }) +
+               row("starts that fail, alone",
+                   [](const tColumn& c) {
+                       return fmt::format("{} of {}", c.started.failed, kStarts);
+                   }) +
                rowOf("kp, 1/s", [&](auto& p) { return fmt::format("{:.4g}", gains(p).kp); }) +
                rowOf("ki, 1/s per pair",
                      [&](auto& p) { return fmt::format("{:.4g}", gains(p).ki); }) +
@@ -206,25 +225,39 @@ public:
 private:
     static constexpr uint64_t kStarts = 30;
 
-    static std::string startsText(const tStartResult& result)
-    {
-        return fmt::format("{} of {}", result.failed, kStarts);
-    }
-
     template <typename Text> std::string row(const char* title, Text text) const
     {
-        return fmt::format("{:<24}{:>12}{:>12}\n", title, text(results[0]), text(results[1]));
+        std::string line = fmt::format("{:<24}", title);
+        for (const tColumn& column : columns)
+            line += fmt::format("{:>12}", text(column));
+        return line + "\n";
     }
     template <typename Text> std::string rowOf(const char* title, Text text) const
     {
-        return fmt::format("{:<24}{:>12}{:>12}\n", title, text(columns[0]), text(columns[1]));
+        return row(title, [&text](const tColumn& column) { return text(column.parameters); });
     }
 
     double interval;
-    std::array<tServoParameters, 2> columns;
-    std::array<tTrialResult, 2> results{};
-    std::array<tStartResult, 2> starts{};
+    std::vector<tColumn> columns;
 };
+
+// At the end of a row beside the document for one clock, if there can be one.
+std::string comparisonText(const tServoLibrary& library, const tNoiseModel& model,
+                           const tServoParameters& builtIn, const tDesign& design)
+{
+    std::vector<tColumn> columns = {{"built-in", builtIn}, {"this one", design.quiet}};
+    std::string theory =
+        fmt::format("{:<24}{:>24}", "theory: error, RMS", durationText(design.theoreticalRmsNs));
+    tNoiseModel one = model;
+    one.hops = 1;
+    const tLoopGains gains = theoreticalDesign(one).gains;
+    if (model.hops > 1 && gains.fit()) {
+        columns.push_back({"for one hop", theoreticalDocument(one)});
+        theory += fmt::format("{:>12}", durationText(theoreticalErrorNs(gains, model)));
+    }
+    return tComparison(library, model, tLoopGains::of(design.quiet), columns).text() + theory +
+           "\n";
+}
 
 // quick.json, quick2.json, quick3.json
 std::string quickName(const std::string& file, size_t index)
@@ -309,11 +342,8 @@ void run(const tTune& options)
     tConsole console(toStdout);
     console.print(noiseText(model));
     const tDesign design = designDocuments(library, model, tProgressLine(console));
-    const std::string comparison = tComparison(library, model, builtIn, design.quiet).text();
-    console.print(
-        comparison +
-        fmt::format("{:<24}{:>24}\n", "theory: error, RMS", durationText(design.theoreticalRmsNs)) +
-        rangeText(model) + quickText(design, options));
+    console.print(comparisonText(library, model, builtIn, design) + rangeText(model) +
+                  quickText(design, options));
     writeDocument(options.output, design.quiet);
     if (options.quickOutput.empty()) return;
     for (size_t i = 0; i < design.quick.size(); ++i)
@@ -328,6 +358,8 @@ std::function<void()> addTune(tOptionSet& options)
     addTraceOptions(options, tune->trace);
     addFreeRunningOption(options, tune->trace);
     addGivenNoise(options, tune->given);
+    addHopsOption(options, tune->hops,
+                  "So many clocks in a row, each on the one\nbefore: the last one's error counts");
     options.parsed(
         "--from-pi", "KP,KI",
         [tune](const std::string& text) { tune->controller = parseController(text); },
