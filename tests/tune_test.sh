@@ -107,19 +107,30 @@ expect "with half a noise" 0 $?
 "${host[@]}" tune --from-pi 0.7,0.3 --noise 100ns --interval 1s > pi.json
 expect "with a noise" "1.2e-06 1" "$(key snapTimeThreshold pi.json) $(key spikeFilterEnabled pi.json)"
 
+# What a telecom boundary clock is to pass on.
+for interval in 62.5ms 1s; do
+    "${host[@]}" tune --bandwidth 0.05Hz --peaking 0.1dB --interval $interval -o bandwidth.json
+    expect "bandwidth at $interval" 1 "$("${host[@]}" check bandwidth.json --interval $interval 2>&1 |
+        grep -c '3 dB bandwidth 0.05 Hz, gain peaking 0.10 dB (meets G.8273.2')"
+done
+
 while IFS='|' read -r status pattern arguments; do
     # shellcheck disable=SC2086  # split on purpose
     "${host[@]}" tune $arguments > out 2> err
     expect "tune $arguments: exit status" "$status" $?
     expect "tune $arguments: $pattern" "1 1" "$(grep -cE -- "$pattern" err) $(wc -l < err)"
 done << 'END'
-2|A trace, or --noise, --wander and --interval, or --from-pi is required|--noise 1ns
+2|A trace, or --noise, --wander and --interval, or --from-pi, or --bandwidth, is required|--noise 1ns
 2|--from-pi: '1,-1' is not KP,KI|--from-pi 1,-1
 2|--from-pi: '0,1' is not KP,KI|--from-pi 0,1
 2|--from-pi: '1,0' is not KP,KI|--from-pi 1,0
 2|--from-pi: '1,1,1' is not KP,KI|--from-pi 1,1,1
 2|--quick: several documents take files|--noise 1ns --wander 1ppb --interval 1s --quick -
 2|--from-pi: a trace has no say in it|trace.csv --from-pi 1,1
+2|--from-pi: --hops has no say in it|--from-pi 1,1 --hops 2
+2|--bandwidth: a trace has no say in it|trace.csv --bandwidth 1Hz --peaking 1dB --interval 1s
+2|--bandwidth requires --peaking|--bandwidth 0.1Hz --interval 1s
+1|every 1 s has a bandwidth of 0.5 Hz: .* half the rate|--bandwidth 0.5Hz --peaking 1dB --interval 1s
 1|no document can have kp 60 and ki 50 per second|--from-pi 60,50
 1|cannot read none|none
 END

@@ -70,11 +70,15 @@ std::string dynamicsText(const tLoopAnalysis& loop)
 
 std::string bandwidthText(const tLoopAnalysis& loop)
 {
+    constexpr double kRounding = 1e-3;
+    const bool asAsked = loop.bandwidth > 0.05 * (1 - kRounding) &&
+                         loop.bandwidth < 0.1 * (1 + kRounding) &&
+                         loop.peaking < 0.1 * (1 + kRounding);
     const std::string bandwidth = loop.bandwidth > 0 ? fmt::format("{:.3g} Hz", loop.bandwidth)
                                                      : "above half the rate of pairs";
-    return fmt::format("  3 dB bandwidth {}, gain peaking {:.2f} dB (G.8273.2: 0.05 to 0.1 Hz, at "
-                       "most 0.1 dB)\n",
-                       bandwidth, loop.peaking);
+    return fmt::format("  3 dB bandwidth {}, gain peaking {:.2f} dB ({} G.8273.2: 0.05 to 0.1 Hz, "
+                       "at most 0.1 dB)\n",
+                       bandwidth, loop.peaking, asAsked ? "meets" : "misses");
 }
 
 // Weighs the whole rate that was measured, so each lock begins with its distance from 1.

@@ -163,9 +163,13 @@ tLoopAnalysis::tLoopAnalysis(const tServoParameters& parameters, double interval
     noiseGain = std::sqrt(squares);
     phaseWalkGain = std::sqrt(phaseSquares);
     frequencyWalkGain = std::sqrt(frequencySquares);
-    const tTransfer transfer(parameters, interval);
-    bandwidth = transfer.halfPowerAngle() / (kTurn * interval);
-    peaking = 10 * std::log10(transfer.largestPower());
+    bandwidth = tTransfer(parameters, interval).halfPowerAngle() / (kTurn * interval);
+    peaking = gainPeaking(parameters, interval);
+}
+
+double gainPeaking(const tServoParameters& parameters, double interval)
+{
+    return 10 * std::log10(tTransfer(parameters, interval).largestPower());
 }
 
 } // namespace dravikHost

@@ -36,4 +36,7 @@ struct tLoopAnalysis {
     double peaking = 0;   // dB
 };
 
+// The same, at once; in dB, of a loop that is stable.
+double gainPeaking(const tServoParameters& parameters, double interval);
+
 } // namespace dravikHost

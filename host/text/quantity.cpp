@@ -12,6 +12,8 @@ const tQuantityKind kDuration = {
     "TIME", {{"ns", 1}, {"us", 1e3}, {"ms", 1e6}, {"s", 1e9}, {"min", 60e9}, {"h", 3600e9}, {}}};
 const tQuantityKind kFrequency = {"OFFSET", {{"ppb", 1}, {"ppm", 1e3}, {}}};
 const tQuantityKind kRatio = {"PERCENT", {{"%", 0.01}, {}}};
+const tQuantityKind kBandwidth = {"BANDWIDTH", {{"mHz", 1e-3}, {"Hz", 1}, {}}};
+const tQuantityKind kGain = {"GAIN", {{"dB", 1}, {}}};
 
 namespace {
 

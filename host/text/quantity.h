@@ -28,6 +28,8 @@ struct tQuantityKind {
 extern const tQuantityKind kDuration;  // base unit: ns
 extern const tQuantityKind kFrequency; // base unit: ppb
 extern const tQuantityKind kRatio;     // base unit: 1
+extern const tQuantityKind kBandwidth; // base unit: Hz
+extern const tQuantityKind kGain;      // base unit: dB
 
 // Reads a number with its unit, as in "125ms", "-12ppm", "1%", whatever the locale; only 0 may
 // stand alone. Throws std::invalid_argument that tells what is wrong.

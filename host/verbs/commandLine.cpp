@@ -19,7 +19,7 @@ namespace {
 enum tExitStatus { kGood = 0, kFailure = 1, kUsage = 2, kLimitBroken = 3 };
 
 constexpr const char* kFooter =
-    "Values have units: ns us ms s min h, ppb ppm, %.\n"
+    "Values have units: ns us ms s min h, ppb ppm, mHz Hz, dB, %.\n"
     "Files may be -, the standard input or output.\n"
     "Exit status: 0 good; 1 a failure of the plug-in or of a file, such as a\n"
     "refused document; 2 wrong usage; 3 a limit of metrics is not held.";

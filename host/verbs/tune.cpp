@@ -1,6 +1,7 @@
 #include "verbs/verbs.h"
 
 #include "clocks/tSteeredClock.h"
+#include "design/bandwidthDesign.h"
 #include "design/designDocuments.h"
 #include "design/estimateNoise.h"
 #include "design/tLoopAnalysis.h"
@@ -39,16 +40,19 @@ struct tTune {
     tTraceOptions trace;
     tGivenNoise given;
     std::optional<tLoopGains> controller;
+    std::optional<double> bandwidthHz;
+    std::optional<double> peakingDb;
     int hops = 1;
     std::string output;
     std::string quickOutput;
     std::string library;
 };
 
-void addGivenNoise(tOptionSet& options, tGivenNoise& given)
+// Returns the interval.
+tOption addGivenNoise(tOptionSet& options, tGivenNoise& given)
 {
-    options.quantity(given.intervalNs,
-                     {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair"});
+    const tOption interval = options.quantity(
+        given.intervalNs, {"--interval", kDuration, "", "1ms", "24h", "Time from pair to pair"});
     options.quantity(given.noiseNs,
                      {"--noise", kDuration, "", "0ns", "1s", "White, of measurements; deviation"});
     options.quantity(given.wanderPpb, {"--wander", kFrequency, "", "0ppb", "1000ppm",
@@ -60,6 +64,7 @@ void addGivenNoise(tOptionSet& options, tGivenNoise& given)
                      {"--outlier-rate", kRatio, "", "0%", "100%", "Share of measurements far off"});
     options.quantity(given.outlierSizeNs,
                      {"--outlier-size", kDuration, "", "0ns", "1s", "How far they are off"});
+    return interval;
 }
 
 tLoopGains parseController(const std::string& text)
@@ -73,17 +78,26 @@ tLoopGains parseController(const std::string& text)
     return {*kp, *ki};
 }
 
+// What is designed for something else than a noise.
+void requireNothingElse(const tTune& options, const char* option)
+{
+    if (!options.trace.file.empty())
+        throw std::invalid_argument(fmt::format("{}: a trace has no say in it", option));
+    if (options.hops > 1)
+        throw std::invalid_argument(fmt::format("{}: --hops has no say in it", option));
+}
+
 void requireEnough(const tTune& options)
 {
     const tGivenNoise& given = options.given;
     if (options.quickOutput == "-")
         throw std::invalid_argument("--quick: several documents take files");
-    if (options.controller && !options.trace.file.empty())
-        throw std::invalid_argument("--from-pi: a trace has no say in it");
-    if (options.controller || !options.trace.file.empty()) return;
+    if (options.controller) return requireNothingElse(options, "--from-pi");
+    if (options.bandwidthHz) return requireNothingElse(options, "--bandwidth");
+    if (!options.trace.file.empty()) return;
     if (given.noiseNs && given.wanderPpb && given.intervalNs) return;
     throw std::invalid_argument(
-        "A trace, or --noise, --wander and --interval, or --from-pi is required");
+        "A trace, or --noise, --wander and --interval, or --from-pi, or --bandwidth, is required");
 }
 
 tNoiseEstimate noiseModel(const tTune& options)
@@ -296,11 +310,19 @@ void writeDocument(const std::string& file, const tServoParameters& parameters)
     writeText(file.empty() ? "-" : file, parameters.documentText());
 }
 
+std::optional<tLoopGains> gainsAskedFor(const tTune& options)
+{
+    if (!options.bandwidthHz) return options.controller;
+    return gainsForBandwidth(*options.bandwidthHz, *options.peakingDb,
+                             secondsOf(*options.given.intervalNs));
+}
+
 // Without a noise the filter stays off and the threshold as it is.
-tServoParameters convertedDocument(const tTune& options, const tServoParameters& builtIn)
+tServoParameters documentFor(const tLoopGains& gains, const tTune& options,
+                             const tServoParameters& builtIn)
 {
     tServoParameters parameters = builtIn;
-    options.controller->putInto(parameters);
+    gains.putInto(parameters);
     if (!options.given.noiseNs || !options.given.intervalNs) return parameters;
     const tNoiseEstimate model = noiseModel(options);
     parameters.snapTimeThreshold = snapThresholdFor(model);
@@ -333,8 +355,8 @@ void run(const tTune& options)
     tStillClock clock;
     tServoHost host(library, clock);
     const auto builtIn = tServoParameters::of(host.readConfig());
-    if (options.controller) {
-        writeDocument(options.output, convertedDocument(options, builtIn));
+    if (const auto gains = gainsAskedFor(options)) {
+        writeDocument(options.output, documentFor(*gains, options, builtIn));
         return;
     }
     const tNoiseEstimate model = noiseModel(options);
@@ -357,13 +379,23 @@ std::function<void()> addTune(tOptionSet& options)
     const auto tune = std::make_shared<tTune>();
     addTraceOptions(options, tune->trace);
     addFreeRunningOption(options, tune->trace);
-    addGivenNoise(options, tune->given);
+    const tOption interval = addGivenNoise(options, tune->given);
     addHopsOption(options, tune->hops,
                   "So many clocks in a row, each on the one\nbefore: the last one's error counts");
-    options.parsed(
-        "--from-pi", "KP,KI",
-        [tune](const std::string& text) { tune->controller = parseController(text); },
-        "Convert a proportional-integral controller,\nwhose constants are per second and pair");
+    tOption bandwidth =
+        options.quantity(tune->bandwidthHz, {"--bandwidth", kBandwidth, "", "0.001mHz", "500Hz",
+                                             "Of the loop, where its gain is down by 3 dB"});
+    tOption peaking =
+        options.quantity(tune->peakingDb, {"--peaking", kGain, "", "0.001dB", "20dB",
+                                           "Most of the loop's gain, beside --bandwidth"});
+    bandwidth.needs(interval).needs(peaking);
+    peaking.needs(bandwidth);
+    options
+        .parsed(
+            "--from-pi", "KP,KI",
+            [tune](const std::string& text) { tune->controller = parseController(text); },
+            "Convert a proportional-integral controller,\nwhose constants are per second and pair")
+        .excludes(bandwidth);
     options.text("-o,--output", "FILE", tune->output, "The document; else it goes to stdout");
     options.text("--quick", "FILE", tune->quickOutput,
                  "Also those to acquire the lock with, if any:\nFILE, then numbered ones");

@@ -107,8 +107,8 @@ TEST(LoopAdvice, hasALineForEachMatter)
          "changes keeps the clock 2 ns off\n",
          law(0.5, 1)},
         {"! unstable at any interval\n", law(0.5, -1, -1)},
-        {"  3 dB bandwidth 0.468 Hz, gain peaking 6.14 dB (G.8273.2: 0.05 to 0.1 Hz, at most 0.1 "
-         "dB)\n",
+        {"  3 dB bandwidth 0.468 Hz, gain peaking 6.14 dB (misses G.8273.2: 0.05 to 0.1 Hz, "
+         "at most 0.1 dB)\n",
          {}},
         {"  3 dB bandwidth above half the rate of pairs, gain peaking 9.54 dB", law(1, 2)},
         {"  orders are in steps of 0.015625 ppb: without noise the error may stay within 0.02298 "

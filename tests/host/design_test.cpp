@@ -1,5 +1,6 @@
 // Loops, filters and documents: against closed forms, and simulations of known noise.
 
+#include "design/bandwidthDesign.h"
 #include "design/designDocuments.h"
 #include "design/estimateNoise.h"
 #include "design/kalmanDesign.h"
@@ -11,6 +12,7 @@
 #include <fmt/format.h>
 
 #include <cmath>
+#include <complex>
 #include <stdexcept>
 
 using namespace dravikHost;
@@ -113,6 +115,38 @@ TEST(LoopGains, becomeALaw)
     EXPECT_TRUE((tLoopGains{60, 40}).fit());
     EXPECT_FALSE((tLoopGains{60, 40.1}).fit());
     EXPECT_THROW((tLoopGains{60, 40.1}).putInto(parameters), std::runtime_error);
+}
+
+// |H(Z)|^2 = |aZ - b|^2 / |Z^2 - (2 - a)Z + 1 - b|^2, a = (kp + ki) T, b = kp T, Z on the unit
+// circle.
+double powerAt(const tLoopGains& gains, double interval, double hertz)
+{
+    const double a = (gains.kp + gains.ki) * interval;
+    const double b = gains.kp * interval;
+    const auto z = std::polar(1.0, 2 * std::acos(-1.0) * hertz * interval);
+    return std::norm((a * z - b) / (z * z - (2 - a) * z + (1 - b)));
+}
+
+TEST(BandwidthDesign, hasTheBandwidthAndNoMorePeaking)
+{
+    const struct {
+        double bandwidth, peaking, interval, leastPeaking;
+    } kRows[] = {{0.05, 0.1, 0.0625, 0.099},
+                 {0.07, 1, 1, 0.99},
+                 {0.05, 10, 0.125, 2},
+                 {0.49, 0.01, 1, 0.0099}};
+    for (const auto& row : kRows) {
+        const tLoopGains found = gainsForBandwidth(row.bandwidth, row.peaking, row.interval);
+        EXPECT_NEAR(0.5, powerAt(found, row.interval, row.bandwidth), 1e-9) << row.bandwidth;
+        double most = 1;
+        for (int i = 0; i < 1000; ++i) // down to 4e-5 of half the rate of pairs
+            most = std::max(most,
+                            powerAt(found, row.interval, 0.5 / row.interval * std::pow(0.99, i)));
+        EXPECT_LE(10 * std::log10(most), row.peaking) << row.bandwidth;
+        EXPECT_GE(10 * std::log10(most), row.leastPeaking) << row.bandwidth;
+    }
+    EXPECT_THROW(gainsForBandwidth(0.5, 0.1, 1), std::runtime_error);
+    EXPECT_THROW(gainsForBandwidth(1e-6, 1e-3, 0.01), std::runtime_error);
 }
 
 // In the steady state, with a = K1 = kp T and b = K2 T = ki T, R the variance of a measurement and
