@@ -109,7 +109,9 @@ expect "with a noise" "1.2e-06 1" "$(key snapTimeThreshold pi.json) $(key spikeF
 
 # What a telecom boundary clock is to pass on.
 for interval in 62.5ms 1s; do
-    "${host[@]}" tune --bandwidth 0.05Hz --peaking 0.1dB --interval $interval -o bandwidth.json
+    "${host[@]}" tune --bandwidth 0.05Hz --peaking 0.1dB --interval $interval --noise 50ns -o bandwidth.json
+    expect "held at $interval" 1 "$("${host[@]}" simulate --interval $interval --noise 50ns --seed 3 \
+        --config bandwidth.json | grep -c '^lock .* lost 0 times')"
     expect "bandwidth at $interval" 1 "$("${host[@]}" check bandwidth.json --interval $interval 2>&1 |
         grep -c '3 dB bandwidth 0.05 Hz, gain peaking 0.10 dB (meets G.8273.2')"
 done

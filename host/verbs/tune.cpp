@@ -14,6 +14,7 @@
 #include <fmt/format.h>
 
 #include <chrono>
+#include <cmath>
 #include <filesystem>
 #include <memory>
 #include <stdexcept>
@@ -317,6 +318,17 @@ std::optional<tLoopGains> gainsAskedFor(const tTune& options)
                              secondsOf(*options.given.intervalNs));
 }
 
+// A loop of little peaking takes up a frequency slowly, and the first one is measured over two
+// pairs.
+void addRoomToTakeUp(tServoParameters& parameters, const tNoiseModel& model)
+{
+    constexpr double kDeviations = 4.5;
+    const double frequency = std::sqrt(2.0) * secondsOf(model.noiseNs) / model.interval();
+    const double astray = frequency * tLoopAnalysis(parameters, model.interval()).takeUp;
+    double& threshold = parameters.snapTimeThreshold;
+    threshold = withinBounds(zvckmservo_kSnapTimeThreshold, threshold + kDeviations * astray);
+}
+
 // Without a noise the filter stays off and the threshold as it is.
 tServoParameters documentFor(const tLoopGains& gains, const tTune& options,
                              const tServoParameters& builtIn)
@@ -326,6 +338,7 @@ tServoParameters documentFor(const tLoopGains& gains, const tTune& options,
     if (!options.given.noiseNs || !options.given.intervalNs) return parameters;
     const tNoiseEstimate model = noiseModel(options);
     parameters.snapTimeThreshold = snapThresholdFor(model);
+    if (options.bandwidthHz) addRoomToTakeUp(parameters, model);
     setSpikeFilter(parameters, model);
     return parameters;
 }

@@ -139,9 +139,10 @@ TEST(BandwidthDesign, hasTheBandwidthAndNoMorePeaking)
         const tLoopGains found = gainsForBandwidth(row.bandwidth, row.peaking, row.interval);
         EXPECT_NEAR(0.5, powerAt(found, row.interval, row.bandwidth), 1e-9) << row.bandwidth;
         double most = 1;
-        for (int i = 0; i < 1000; ++i) // down to 4e-5 of half the rate of pairs
-            most = std::max(most,
-                            powerAt(found, row.interval, 0.5 / row.interval * std::pow(0.99, i)));
+        for (int i = 0; i < 1000; ++i) { // down to 4e-5 of half the rate of pairs
+            const double hertz = 0.5 / row.interval * std::pow(0.99, i);
+            most = std::max(most, powerAt(found, row.interval, hertz));
+        }
         EXPECT_LE(10 * std::log10(most), row.peaking) << row.bandwidth;
         EXPECT_GE(10 * std::log10(most), row.leastPeaking) << row.bandwidth;
     }
