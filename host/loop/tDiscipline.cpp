@@ -19,7 +19,7 @@ tDiscipline::tDiscipline(const tServoLibrary& library, iClock& clock,
             tuned.documents.first()),
       callsThatMadeIt(servo.calls()), spacing(options.measureOverNs), inForcePpb(clock.offsetPpb())
 {
-    if (options.selfTune) selfTuning.emplace(servo, clock);
+    if (options.selfTune) selfTuning.emplace(servo, clock, options.hops);
     if (servo.factor() == options.factor) return;
     tuned.notes.push_back(fmt::format("resolution {} ppb: limits and thresholds allow no finer one",
                                       1.0 / servo.factor()));

@@ -22,6 +22,7 @@ struct tDisciplineOptions {
     std::vector<tLaterDocument> later; // in the order of their times
     std::string csv;                   // "": none; "-": stdout
     bool selfTune = false;
+    int hops = 1;        // clocks in a row, for the last of which self-tuning is to be best
     bool dryRun = false; // no order reaches the clock
     tTuning tuning;
     std::string library;

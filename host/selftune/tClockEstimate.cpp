@@ -1,5 +1,6 @@
 #include "selftune/tClockEstimate.h"
 
+#include "maths/chainGains.h"
 #include "text/quantity.h"
 
 #include <algorithm>
@@ -9,7 +10,8 @@ namespace dravikHost {
 
 namespace {
 
-constexpr double kGate = 6;          // deviations beyond which a measurement is doubtful
+constexpr double kGate = 6; // deviations beyond which a measurement is doubtful
+constexpr double kGateInDoubt = 3.5;
 constexpr int64_t kYoung = 8;        // pairs in which nothing is
 constexpr int64_t kJumpMayEnd = 200; // pairs after which a jump is taken for good
 
@@ -85,12 +87,14 @@ tClockEstimate::tEvent tClockEstimate::judge(double phaseNs, const tKalmanFilter
     return trust(phaseNs, preferred);
 }
 
-// What little is known at first makes a wide gate.
+// What little is known at first makes a wide gate. Among doubtful ones more is asked of one that is
+// to be believed: the gate widens as time passes, and many tried it.
 bool tClockEstimate::isDoubtful(double innovation) const
 {
     constexpr double kWiderAtFirst = 15;
     if (count < kYoung) return false;
-    const double gate = kGate * (1 + kWiderAtFirst / static_cast<double>(count));
+    const double gate =
+        (doubtful.any() ? kGateInDoubt : kGate) * (1 + kWiderAtFirst / static_cast<double>(count));
     return innovation * innovation > gate * gate * varianceFactor() * noise.variance();
 }
 
@@ -129,6 +133,7 @@ tClockEstimate::tEvent tClockEstimate::doubt(double innovation)
 tClockEstimate::tEvent tClockEstimate::trust(double phaseNs, const tKalmanFilter::tGains* preferred)
 {
     constexpr double kNear = 0.08;
+    constexpr double kSettled = 4; // pairs, over those that the gain remembers
     const double innovation = phaseNs - filter.phase;
     changeNoise(noise.take(innovation * innovation / varianceFactor()));
     bank.take(phaseNs, noise.variance());
@@ -136,14 +141,36 @@ tClockEstimate::tEvent tClockEstimate::trust(double phaseNs, const tKalmanFilter
     const auto near = [](double one, double other) {
         return std::fabs(one - other) <= kNear * one;
     };
-    if (preferred != nullptr && near(latestGains.phase, preferred->phase) &&
-        near(latestGains.frequency, preferred->frequency)) {
-        filter.phase += (preferred->phase - latestGains.phase) * innovation;
-        filter.frequency += (preferred->frequency - latestGains.frequency) * innovation;
-        latestGains = *preferred;
+    if (hops > 1) {
+        const tKalmanFilter::tGains best = gainsOfChain();
+        if (best.phase * static_cast<double>(count) > kSettled) useGains(best, innovation);
     }
+    if (preferred != nullptr && near(latestGains.phase, preferred->phase) &&
+        near(latestGains.frequency, preferred->frequency))
+        useGains(*preferred, innovation);
     ++count;
     return kAsForeseen;
+}
+
+tKalmanFilter::tGains tClockEstimate::gainsOfChain()
+{
+    constexpr double kOther = 1.25;
+    const double ratio = bank.ratio();
+    if (ratio > kOther * chainRatio || ratio * kOther < chainRatio) {
+        constexpr double kHardlyAny = 1e-9;
+        const tChainGains best = bestChainGains({kHardlyAny, ratio * ratio}, hops);
+        chain = {best.phase, best.frequency / interval};
+        chainRatio = ratio;
+    }
+    return chain;
+}
+
+// In place of those that the filter has used.
+void tClockEstimate::useGains(const tKalmanFilter::tGains& gains, double innovation)
+{
+    filter.phase += (gains.phase - latestGains.phase) * innovation;
+    filter.frequency += (gains.frequency - latestGains.frequency) * innovation;
+    latestGains = gains;
 }
 
 // What is known of the clock stays known as well in nanoseconds.
@@ -168,7 +195,7 @@ void tClockEstimate::stepped(int64_t byNs)
     baseNs = static_cast<int64_t>(static_cast<uint64_t>(baseNs) + static_cast<uint64_t>(byNs));
 }
 
-void tClockEstimate::restart() { *this = tClockEstimate(); }
+void tClockEstimate::restart() { *this = tClockEstimate(hops); }
 
 tBelief tClockEstimate::belief() const
 {

@@ -29,6 +29,10 @@ public:
         kUseless, // not later than the one before, or beyond all measure
     };
 
+    // At the end of a row of so many clocks, all held like this one, gains that are best for one
+    // alone add up what they pass on.
+    explicit tClockEstimate(int hops = 1) : hops(hops) {}
+
     // A measured error; all steps and orders up to then were told before. Gains that are nearly as
     // good as the filter's own are used in their place; null: none.
     tEvent take(int64_t elapsedNs, int64_t errorNs, const tKalmanFilter::tGains* preferred);
@@ -57,6 +61,8 @@ private:
     bool isDoubtful(double innovation) const;
     tEvent doubt(double innovation);
     tEvent trust(double phaseNs, const tKalmanFilter::tGains* preferred);
+    tKalmanFilter::tGains gainsOfChain();
+    void useGains(const tKalmanFilter::tGains& gains, double innovation);
     double wanderShare() const;
     void move(double phaseNs, double frequencyPpb, const tCovariance& doubt);
     void changeNoise(double times);
@@ -64,6 +70,9 @@ private:
     double varianceFactor() const { return filter.covariance.xx + 1; }
     bool isFinite() const;
 
+    int hops;
+    tKalmanFilter::tGains chain{}; // for the ratio of wander that was believed then
+    double chainRatio = 0;
     int64_t baseNs = 0;              // phases are told from there, which keeps their digits
     std::optional<int64_t> pairNs;   // when the latest pair was
     std::optional<int64_t> latestNs; // up to when the estimate is

@@ -30,9 +30,12 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, doubl
 {
     constexpr size_t kSloping = 5;
     constexpr size_t kAfterOthers = 6;
+    constexpr size_t kForLine = 8;
     const size_t forJump = pointsOfJump();
+    const bool otherSide =
+        inRow > 0 && (latest(0).point.innovationNs > 0) != (point.innovationNs > 0);
     add(point, true);
-    ++inRow;
+    inRow = otherSide ? 1 : inRow + 1;
     const size_t points = inRow <= forJump
                               ? forJump
                               : std::max({forJump, kAfterOthers, std::min((inRow + 1) / 2, kKept)});
@@ -42,6 +45,11 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, doubl
     }
     if (inRow >= std::max(kSloping, forJump) && inRow <= kKept) {
         const tVerdict verdict = slope(inRow, noiseVariance);
+        if (verdict.finding != kNothing) return verdict;
+    }
+    const size_t forLine = std::max(kForLine, points);
+    if (inRow >= forLine) {
+        const tVerdict verdict = line(forLine, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }
     return grownNoise();
@@ -107,6 +115,36 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::slope(size_t points, double noiseVarian
     return {kNewFrequency, slope * passed, slope, noiseVariance / tt, 0};
 }
 
+// Any line: something wrong was believed before.
+tDoubtfulPairs::tVerdict tDoubtfulPairs::line(size_t points, double noiseVariance) const
+{
+    const auto n = static_cast<double>(points);
+    const double now = latest(0).point.seconds;
+    double t = 0;
+    double x = 0;
+    double tt = 0;
+    double tx = 0;
+    for (size_t i = 0; i < points; ++i) {
+        const tPoint& each = latest(i).point;
+        const double ago = each.seconds - now;
+        t += ago;
+        x += each.innovationNs;
+        tt += ago * ago;
+        tx += ago * each.innovationNs;
+    }
+    const double spread = n * tt - t * t;
+    const double slope = (n * tx - t * x) / spread;
+    const double phase = (x - slope * t) / n;
+    double squares = 0;
+    for (size_t i = 0; i < points; ++i) {
+        const tPoint& each = latest(i).point;
+        const double off = each.innovationNs - phase - slope * (each.seconds - now);
+        squares += off * off;
+    }
+    if (!isNoise(squares, n - 2, noiseVariance)) return {};
+    return {kNewFrequency, phase, slope, noiseVariance * n / spread, 0};
+}
+
 // Half of the latest points are doubtful, and to both sides; or it goes on for so long that it has
 // to be believed.
 tDoubtfulPairs::tVerdict tDoubtfulPairs::grownNoise() const
@@ -114,17 +152,23 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::grownNoise() const
     constexpr size_t kWindow = 12;
     constexpr size_t kTooLong = 100;
     const size_t points = std::min({count, std::max(kWindow, inRow / 2 + 3), kKept});
-    size_t doubtful = 0, above = 0;
+    size_t doubtful = 0;
+    size_t above = 0;
+    size_t changes = 0; // of the side
+    bool wasAbove = false;
     double sum = 0;
     for (size_t i = 0; i < points; ++i) {
         const tEntry& entry = latest(i);
         if (!entry.doubtful) continue;
+        const bool isAbove = entry.point.innovationNs > 0;
+        changes += doubtful > 0 && isAbove != wasAbove ? 1 : 0;
+        wasAbove = isAbove;
+        above += isAbove ? 1 : 0;
         ++doubtful;
-        above += entry.point.innovationNs > 0 ? 1 : 0;
         sum += entry.point.innovationNs;
     }
     const size_t fewer = std::min(above, doubtful - above);
-    const bool bothSides = doubtful * 2 >= kWindow && fewer * 4 >= doubtful;
+    const bool bothSides = doubtful * 2 >= kWindow && fewer * 4 >= doubtful && changes > 1;
     if (inRow < kTooLong && !bothSides) return {};
     const double phase = inRow < kTooLong ? 0 : sum / static_cast<double>(doubtful);
     const double deviation = scatter(points);

@@ -42,12 +42,13 @@ private:
     size_t pointsOfJump() const;
     tVerdict level(size_t points, double noiseVariance) const;
     tVerdict slope(size_t points, double noiseVariance) const;
+    tVerdict line(size_t points, double noiseVariance) const;
     tVerdict grownNoise() const;
     double scatter(size_t points) const;
 
     std::array<tEntry, kKept> entries{};
     size_t count = 0;       // ever added since it last forgot
-    size_t inRow = 0;       // doubtful ones, at the end
+    size_t inRow = 0;       // doubtful ones, at the end, all to the same side
     double goodSeconds = 0; // when the latest good one was
     double share = 0;       // of doubtful ones, lately
 };

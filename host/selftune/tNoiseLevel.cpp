@@ -37,11 +37,12 @@ void tNoiseLevel::seeChange(double changeNs)
 double tNoiseLevel::take(double square)
 {
     const double outlier = taken < kStart ? 0 : kOutlier / std::sqrt(inForce);
+    constexpr double kWidth = 0.7914 * 7; // of Student's distribution, as in the bank of wanders
     const double floorNs = std::sqrt(floorVariance);
     double levelNs = kLowestNs;
     for (double& share : shares) {
         const double deviation = std::max(levelNs, floorNs);
-        const double tail = 1 + square / (7 * deviation * deviation);
+        const double tail = 1 + square / (kWidth * deviation * deviation);
         share *= 1 / (tail * tail * tail * tail * deviation) + outlier;
         levelNs *= 2;
     }

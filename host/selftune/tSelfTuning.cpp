@@ -17,7 +17,8 @@ constexpr double kWhileLocked = 0.1;     // s: what is to be believed is decided
 
 } // namespace
 
-tSelfTuning::tSelfTuning(tFineServo& servo, iClock& clock) : servo(servo), clock(clock)
+tSelfTuning::tSelfTuning(tFineServo& servo, iClock& clock, int hops)
+    : servo(servo), clock(clock), estimate(hops)
 {
     restart();
 }

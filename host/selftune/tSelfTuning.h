@@ -26,7 +26,7 @@ class tSelfTuning
 {
 public:
     // Both are borrowed. Writes the document to acquire a lock with. Throws as the servo does.
-    tSelfTuning(tFineServo& servo, iClock& clock);
+    tSelfTuning(tFineServo& servo, iClock& clock, int hops);
 
     // Before a pair is given to the servo: whether it is to be. May order the clock, and step it
     // where its rate cannot bring it back within some pairs; throws what the clock throws.

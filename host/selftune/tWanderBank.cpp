@@ -7,13 +7,15 @@ namespace dravikHost {
 namespace {
 
 constexpr double kLowestRatio = 3e-5; // each next one is twice as large, up to 16
-constexpr double kChange = 1e-3;      // chance that the ratio is another one at the next pair
+constexpr double kChange = 5e-4;      // chance that the ratio is another one at the next pair
 
 // How likely a measurement is that is off by so much, squared, in variances foreseen: Student's
-// distribution of seven degrees of freedom, which an outlier does not persuade.
+// distribution of seven degrees of freedom, which an outlier does not persuade, so narrow that a
+// normal one of the right variance is the likeliest.
 double likelihood(double square, double variance)
 {
-    const double tail = 1 + square / 7;
+    constexpr double kWidth = 0.7914 * 7;
+    const double tail = 1 + square / kWidth;
     return 1 / (tail * tail * tail * tail * std::sqrt(variance));
 }
 

@@ -173,12 +173,16 @@ std::function<void()> addRun(tOptionSet& options)
     addDisciplineOptions(options, run->discipline);
     options.quantity(run->source.durationNs, {"--duration", kDuration, "", "1ns", "438300h",
                                               "Else until SIGINT or SIGTERM"});
+    addHopsOption(options, run->discipline.hops,
+                  "Tune itself for the last of so many clocks in\na row, all held like this one");
     addGuardOptions(options, *run);
     addSilenceOptions(options, *run);
     addWatcherOptions(options, *run);
     options.finally([run, options] {
         requireConsistency(options, *run);
         tuneItself(options, run->discipline);
+        if (run->discipline.hops > 1 && !run->discipline.selfTune)
+            throw std::invalid_argument("--hops: it is self-tuning that would mind them");
     });
     return [run] { dravikHost::run(*run); };
 }

@@ -22,7 +22,6 @@ struct tSimulation : tDisciplineOptions {
     std::string scenario; // file; "": none
     bool intervalGiven = false;
     uint64_t seed = 1;
-    int hops = 1;
 };
 
 // What a scenario says itself.

@@ -239,6 +239,8 @@ TEST(MeanOrders, areInForceWhilePairsAreMissing)
     EXPECT_FALSE(orders.resume(0.5));
     orders.add(stepAt(60, 10, false, 0)); // the lock is lost
     EXPECT_FALSE(orders.orderFor(nsOfSeconds(90)));
+}
+
 // Each clock as theory has it, with noise of its own, behind the one before.
 TEST(SimulatedChain, hasTheErrorOfTheoryAtEachClock)
 {
