@@ -269,6 +269,14 @@ static void seedReading(const struct machine* made, struct measurement* reading,
     reading->flicker.noise = seeded(made, cause + 400);
 }
 
+/* A scenario has the same noise by whatever way its source is read. */
+static void seedScenario(struct machine* made)
+{
+    const struct scenario* const scenario = &made->scenario;
+    if (scenario->device) seedReading(made, &scenario->device->reading, 3);
+    if (scenario->producer) seedReading(made, &scenario->producer->reading, 3);
+}
+
 /* A loader that cannot load this library goes on without it. Who must not do so looks for
  * FILE.loaded. */
 static void leaveSign(const char* path)
@@ -304,4 +312,5 @@ void configure(struct machine* made)
     }
     for (int i = 0; i < made->producerCount; ++i)
         seedReading(made, &made->producers[i].reading, 10 * i + 4);
+    seedScenario(made);
 }

@@ -56,8 +56,9 @@
  *                          a file as dravik-host simulate takes it, for one clock (system or a PATH)
  *                          and one source (UNIT or PATH) of those above it: values at the start, and
  *                          what happens later. interval= is for segments and sockets. It has not the
- *                          same random numbers there and here, but the same statistics. After a jump
- *                          errors in traces count against where the source is.
+ *                          same random numbers there and here, but the same statistics; here they
+ *                          are the same for every kind of source. After a jump errors in traces
+ *                          count against where the source is.
  *
  *   at T signal HUP|INT|TERM
  *   at T run SHELL COMMAND
