@@ -20,3 +20,7 @@ for second, gated, last in ((10.0, False, 0.0), (1e6, True, 1.5), (None, False, 
     measured = {0: 3.0} if second is None else {0: 3.0, 1: second}
     errors = list(peers.filtered(measured, free, 1, 1e3, 0, gated).values())
     assert all(map(math.isclose, errors[:2], (0, 1.5))) and abs(errors[2] - last) < 1e-9, (second, errors)
+
+# What the covariances of that walk give for the fourth time, from all three measurements at once.
+errors = peers.filtered({0: 1.0, 1: -2.0, 2: 5.0}, dict.fromkeys(range(4), 0.0), 2, 4, 3, False)
+assert math.isclose(errors[3], 183 / 22), errors
