@@ -84,11 +84,12 @@ phc:ptp|last|-10000|1|at 1000s jump 10us
 phc:ptp|mean|10|3|reference delay=10ns
 phc:ptp|last|-9900|0|reference granularity=100ns;at 1000s jump 9950ns
 END
-errorsBy() { # SOURCE: the first four
+errorsBy() { # SOURCE FIRST: four, from that pair on
     played 'reference interval=1s noise=1us' "$1"
-    awk -F, '$1 == "pair" && ++pairs < 5 {print $5}' seen.csv
+    awk -F, -v first="$2" '$1 == "pair" && ++pairs >= first && pairs < first + 4 {print $5}' seen.csv
 }
-expect "the same noise by both ways" "$(errorsBy shm:0)" "$(errorsBy phc:ptp)"
+# The first sample of a segment is there before anybody looks at the clock.
+expect "the same noise by both ways" "$(errorsBy shm:0 1)" "$(errorsBy phc:ptp 2)"
 while IFS='|' read -r why scenario; do
     played "$scenario" shm:0
     expect "refused: $scenario" "simulated machine: scenario:$why" "$(cat out)"
