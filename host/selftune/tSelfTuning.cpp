@@ -104,9 +104,10 @@ void tSelfTuning::chooseGains()
         written && written->phase == gains.phase && written->frequency == gains.frequency;
     unlike = same ? 0 : unlike + 1;
     if (same || (written && estimate.pairs() > kYoung && unlike < kForGood)) return;
-    const tLoopGains wanted = {gains.phase / estimate.secondsPerPair(), gains.frequency};
-    if (!wanted.fit()) return;
-    writeDocument(wanted, kWhileLocked);
+    constexpr double kMost = 50; // of each, which a document can have; the orders do the rest
+    writeDocument({std::min(gains.phase / estimate.secondsPerPair(), kMost),
+                   std::min(gains.frequency, kMost)},
+                  kWhileLocked);
     written = gains;
     unlike = 0;
 }

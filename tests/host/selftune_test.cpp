@@ -141,6 +141,7 @@ struct tServoLoop {
     tDisciplineOptions options;
     tNoise noise{7};
     tPair pair{0, kStartNs, 0, {}};
+    double seconds = 1; // from pair to pair
     std::string events;
     tStep latest;
     std::unique_ptr<tDiscipline> discipline;
@@ -164,7 +165,7 @@ struct tServoLoop {
         latest = discipline->take(pair);
         if (latest.failure) std::rethrow_exception(latest.failure);
         events += latest.heldBack ? '-' : ".m!s0LxX"[latest.event];
-        pass(1);
+        pass(seconds);
         return errorNs;
     }
     double rmsNs(int count)
@@ -204,6 +205,15 @@ TEST(SelfTuning, acquiresHoldsAndFollows)
     EXPECT_EQ(2, loop.latest.steps);
     EXPECT_EQ(0, loop.latest.locksLost);
     EXPECT_GT(12, loop.rmsNs(300));
+}
+
+TEST(SelfTuning, holdsAClockAThousandTimesASecond)
+{
+    tServoLoop loop;
+    loop.seconds = 0.001; // no document has the gains that the first pairs ask for
+    loop.rmsNs(1000);
+    EXPECT_EQ(0, loop.latest.locksLost);
+    EXPECT_GT(5, loop.rmsNs(3000));
 }
 
 TEST(SelfTuning, coastsAtTheEstimatedRate)
