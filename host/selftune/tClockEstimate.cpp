@@ -12,8 +12,8 @@ namespace {
 
 constexpr double kGate = 6; // deviations beyond which a measurement is doubtful
 constexpr double kGateInDoubt = 3.5;
-constexpr int64_t kYoung = 8;        // pairs in which nothing is
-constexpr int64_t kJumpMayEnd = 200; // pairs after which a jump is taken for good
+constexpr int64_t kYoung = 8;         // pairs in which nothing is
+constexpr int64_t kJumpMayEnd = 1000; // pairs after which a jump is taken for good
 
 } // namespace
 

@@ -28,7 +28,6 @@ void tDoubtfulPairs::takeGood(const tPoint& point)
 // some few of many will always do.
 tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, double noiseVariance)
 {
-    constexpr size_t kSloping = 5;
     constexpr size_t kAfterOthers = 6;
     constexpr size_t kForLine = 8;
     const size_t forJump = pointsOfJump();
@@ -43,7 +42,7 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, doubl
         const tVerdict verdict = level(points, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }
-    if (inRow >= std::max(kSloping, forJump) && inRow <= kKept) {
+    if (inRow >= forJump - 1 && inRow <= kKept) { // which is known to begin at nothing
         const tVerdict verdict = slope(inRow, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }

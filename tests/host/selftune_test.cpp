@@ -95,7 +95,7 @@ const tEventRow kEvents[] = {
                                               : i < 9 ? 9000.0
                                                       : 0; }, 0,
      "rrrJrrrJ.B...."},
-    {"another frequency", [](int) { return 0.0; }, 2000, "rrrrF....."},
+    {"another frequency", [](int) { return 0.0; }, 2000, "rrF......."},
     {"a burst of delays", [](int i) { return i < 30 ? 3000.0 + 97 * ((i * i * 31) % 41) : 0; }, 0,
      "rrrrrrrrrrrrrrrrrrrrrrrrrrrrrr........"},
     {"a louder noise", [](int i) { return i % 2 == 0 ? 700.0 + 31 * i : -900.0 - 17 * i; }, 0,
