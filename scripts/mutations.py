@@ -15,6 +15,7 @@ LITERAL = r"\"(\\.|[^\"\\])*\"|(?<!\w)'(\\.|[^'\\\n])+'"  # not the ' between di
 BARE = re.compile(r"(const )?[\w:]+(<.*>)? \w+;$")  # a declaration that reads nothing
 LIMITS = re.compile(r"if \(\w+ [<>]=? (?:static_cast<double>\((.+)\)|(.+))\) return (?:\1|\2);$")  # at it, both ways give it
 LEAVES = re.compile(r"(return|break|continue|throw)\b")
+SYMMETRIC = re.compile(r"\bstd::(min|max|hypot)$")  # the same with its arguments exchanged, but for no numbers
 # What is not changed: attributes and what only the compiler reads, room to spare, what only saves time.
 PLAIN = (r"^ *(#|static_assert|virtual).*|\[\[.*?\]\]|\bchar \w+\[\w+\];|\S*\.reserve\(.*\);")
 
@@ -122,6 +123,7 @@ def expressionChanges(code, line):
     for match in re.finditer(r"\bstd::(?:(min|max)|(f?abs|sqrt|floor|ceil|l?l?round|exp|log10))(?=[(<])", code):
         yield *match.span(), ("std::" + {"min": "max", "max": "min"}[match[1]]) if match[1] else "", "call"
     for match in re.finditer(r"(?<=\w)\(", code):
+        if SYMMETRIC.search(code[:match.start()]): continue
         end, commas = closing(code, match.start())
         if not end: continue
         for begin, comma, behind in zip([match.start(), *commas], commas, [*commas[1:], end]):
