@@ -120,7 +120,6 @@ private:
         outliersNs.push_back(std::fabs(innovation));
         if (++missed < kMostInARow) return;
         outliersNs.resize(outliersNs.size() - kMostInARow);
-        missed = 0;
         restart(i);
     }
 
