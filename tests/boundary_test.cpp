@@ -163,11 +163,6 @@ TEST(Boundary, AWarningStopsNothingAndStays)
 
 TEST(Boundary, AnOperationThatThrowsArrivesWholeAndFreesTheLock)
 {
-    struct Row {
-        const char* operation;
-        int thrown; // 1: a standard exception; 2: something else
-        const char* text;
-    };
     const char* const thrown69 =
         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
         R"("file":"zverr/tools/exception_errStatus","line":69,"component":"dravik",)"
@@ -175,12 +170,12 @@ TEST(Boundary, AnOperationThatThrowsArrivesWholeAndFreesTheLock)
     const char* const thrown74 =
         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
         R"("file":"zverr/tools/exception_errStatus","line":74,"component":"dravik"})";
-    const Row rows[] = {
-        {"getTime", 1, thrown69},
-        {"getFrequency", 2, thrown74},
-        {"stepTime", 1, thrown69},
-    };
-    for (const Row& row : rows) {
+    const struct {
+        const char* operation;
+        int thrown; // 1: a standard exception; 2: something else
+        const char* text;
+    } rows[] = {{"getTime", 1, thrown69}, {"getFrequency", 2, thrown74}, {"stepTime", 1, thrown69}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(testing::Message() << row.operation << " " << row.thrown);
         const long before = allocator::liveBlocks();
         {

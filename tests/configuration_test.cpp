@@ -50,8 +50,7 @@ const tParameter kParameters[] = {
     {"spikeFilterHistorySize", nullptr, nullptr, 5, 2, 100, 235},
     DOUBLE("spikeFilterMaxThreshold", SpikeFilterMaxThreshold, 1.0, 1e-9, 10.0, 256),
     DOUBLE("spikeFilterMinThreshold", SpikeFilterMinThreshold, 2.5e-8, 1e-9, 10.0, 277),
-    DOUBLE("spikeFilterGrowthFactor", SpikeFilterGrowthFactor, 3.0, 1.001, 100.0, 298),
-};
+    DOUBLE("spikeFilterGrowthFactor", SpikeFilterGrowthFactor, 3.0, 1.001, 100.0, 298)};
 #undef DOUBLE
 
 TEST(Parameters, DoublesHaveDefaultsAndInclusiveBounds)
@@ -137,12 +136,11 @@ std::string valuesOf(tFakeHost& host)
 TEST(Document, IsGivenOutWholeOrCutToTheBuffer)
 {
     const std::string text =
-        "{\n\t\"frequencyLockGain\":\t1,\n\t\"phaseLockGain\":\t0.55,\n"
-        "\t\"phaseLockCoefficientA\":\t2,\n\t\"phaseLockCoefficientB\":\t1,\n"
-        "\t\"phaseLockCoefficientC\":\t1,\n\t\"snapTimeThreshold\":\t1e-06,\n"
-        "\t\"spikeFilterEnabled\":\t0,\n\t\"spikeFilterHistorySize\":\t5,\n"
-        "\t\"spikeFilterMaxThreshold\":\t1,\n\t\"spikeFilterMinThreshold\":\t2.5e-08,\n"
-        "\t\"spikeFilterGrowthFactor\":\t3\n}";
+        "{\n\t\"frequencyLockGain\":\t1,\n\t\"phaseLockGain\":\t0.55,\n\t\"phaseLockCoefficientA\":"
+        "\t2,\n\t\"phaseLockCoefficientB\":\t1,\n\t\"phaseLockCoefficientC\":\t1,"
+        "\n\t\"snapTimeThreshold\":\t1e-06,\n\t\"spikeFilterEnabled\":\t0,"
+        "\n\t\"spikeFilterHistorySize\":\t5,\n\t\"spikeFilterMaxThreshold\":\t1,"
+        "\n\t\"spikeFilterMinThreshold\":\t2.5e-08,\n\t\"spikeFilterGrowthFactor\":\t3\n}";
     tFakeHost host;
     host.open();
     zverr_Status* const status = &host.status.record;
@@ -159,13 +157,12 @@ TEST(Document, IsGivenOutWholeOrCutToTheBuffer)
 TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
 {
     const std::string defaults = "1 0.55 2 1 1 1e-06 0 5 1 2.5e-08 3 ";
-    struct Row {
+    const struct {
         const char* name;
         std::string text;
         const char* refusal; // what the payload says behind the constant; "": none
         std::string values;
-    };
-    const Row rows[] = {
+    } rows[] = {
         {"nothing", "{}", "", defaults},
         {"no object", "[1]", "", defaults},
         {"all",
@@ -202,11 +199,10 @@ TEST(Document, IsAppliedInItsOwnOrderUpToTheFirstFailure)
         {"nested to the limit", R"({"x":)" + std::string(999, '[') + std::string(999, ']') + "}",
          "", defaults},
         {"nested too deep", R"({"x":)" + std::string(1000, '[') + std::string(1000, ']') + "}",
-         R"("dravik/tJsonConfig","line":29)", defaults},
-    };
+         R"("dravik/tJsonConfig","line":29)", defaults}};
     for (const char* locale : {"C", "de_DE.UTF-8"}) {
         ASSERT_NE(nullptr, std::setlocale(LC_ALL, locale));
-        for (const Row& row : rows) {
+        for (const auto& row : rows) {
             SCOPED_TRACE(testing::Message() << locale << ": " << row.name);
             tFakeHost host;
             host.open();
@@ -297,43 +293,34 @@ struct tScratchFile {
 
 TEST(ConfigFile, IsJoinedToOneLineAndApplied)
 {
-    struct Row {
-        std::string text;
-        int32_t code;
-        const char* growthFactor;
-    };
-    const Row rows[] = {
-        {"{\n\"spikeFilterGrowthFactor\"\n:1\n2}\n", 0, "12 "},
-        {"{\r\n\"spikeFilterGrowthFactor\":\r\n7}", 0, "7 "},
-        {"{\"spikeFilterGrowthFactor\":1\r\n2}", -52005, "3 "},
-        {std::string("{\"spikeFilterGrowthFactor\":4}\0{", 31), 0, "4 "},
-        {"{\"spikeFilterGrowthFactor\":1}", -52005, "3 "},
-        {"", -52005, "3 "},
-    };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.text);
-        const tScratchFile file(row.text);
+    for (const auto& [text, code, growthFactor] :
+         {std::tuple<std::string, int32_t, const char*>{"{\n\"spikeFilterGrowthFactor\"\n:1\n2}\n",
+                                                        0, "12 "},
+          {"{\r\n\"spikeFilterGrowthFactor\":\r\n7}", 0, "7 "},
+          {"{\"spikeFilterGrowthFactor\":1\r\n2}", -52005, "3 "},
+          {std::string("{\"spikeFilterGrowthFactor\":4}\0{", 31), 0, "4 "},
+          {"{\"spikeFilterGrowthFactor\":1}", -52005, "3 "},
+          {"", -52005, "3 "}}) {
+        SCOPED_TRACE(text);
+        const tScratchFile file(text);
         tFakeHost host;
         tOpenServo& servo = host.open();
         takeSystemLog();
         const std::string refusal = raisedBy([&] { servo.readConfigFile(file.path); });
-        EXPECT_EQ(row.code == 0 ? "" : "-52005", refusal.substr(0, refusal.find(' ')));
-        EXPECT_EQ(
-            std::vector<std::string>{
-                "6 [    dravik|                   dravik/tServo|0434] Reading servo "
-                "configuration from: " +
-                file.path + "\n"},
-            takeSystemLog());
+        EXPECT_EQ(code == 0 ? "" : "-52005", refusal.substr(0, refusal.find(' ')));
+        EXPECT_EQ(std::vector<std::string>{"6 [    dravik|                   dravik/tServo|0434] "
+                                           "Reading servo configuration from: " +
+                                           file.path + "\n"},
+                  takeSystemLog());
         const std::string values = valuesOf(host);
-        EXPECT_EQ(row.growthFactor, values.substr(values.rfind(' ', values.size() - 2) + 1));
+        EXPECT_EQ(growthFactor, values.substr(values.rfind(' ', values.size() - 2) + 1));
     }
     tFakeHost host;
     tOpenServo& servo = host.open();
     EXPECT_EQ("", raisedBy([&] { servo.readConfigFile("/none/%n"); }));
-    EXPECT_EQ(
-        std::vector<std::string>{"6 [    dravik|                   dravik/tServo|0444] Unable "
-                                 "to read configuration from: /none/%n\n"},
-        takeSystemLog());
+    EXPECT_EQ(std::vector<std::string>{"6 [    dravik|                   dravik/tServo|0444] "
+                                       "Unable to read configuration from: /none/%n\n"},
+              takeSystemLog());
     EXPECT_EQ(raisedBy([&] { servo.writeServoConfigJson(""); }),
               raisedBy([&] { servo.readConfigFile("/"); }))
         << "a folder opens, and has no text";
@@ -381,29 +368,24 @@ TEST(MetaData, LoadsTheDefaultFileOncePerChangeOfType)
 {
     const std::string tab = "IEEE 802.1AS-2011 TAB";
     const std::string bc = "IEEE 1588-2008 BC";
-    struct Row {
+    const struct {
         const char* name;
         std::string type; // "-": metadata that is refused
         const char* loaded;
         bool fails = false;
-    };
-    const Row rows[] = {
-        {"none at first", "", ""},
-        {"new", bc, "dravik_tr_ptp4l_bc.json"},
-        {"the same", bc, ""},
-        {"another", tab, "dravik_tr_ptp4l_tab.json"},
-        {"refused", "-", ""},
-        {"still the same", tab, ""},
-        {"unknown is remembered", "ieee 1588-2008 bc", ""},
-        {"back again", tab, "dravik_tr_ptp4l_tab.json"},
-        {"none is remembered", "", ""},
+        // clang-format off
+    } rows[] = {
+        {"none at first", "", ""}, {"new", bc, "dravik_tr_ptp4l_bc.json"}, {"the same", bc, ""},
+        {"another", tab, "dravik_tr_ptp4l_tab.json"}, {"refused", "-", ""},
+        {"still the same", tab, ""}, {"unknown is remembered", "ieee 1588-2008 bc", ""},
+        {"back again", tab, "dravik_tr_ptp4l_tab.json"}, {"none is remembered", "", ""},
         {"a failing file", tab, "dravik_tr_ptp4l_tab.json", true},
-        {"is not tried again", tab, "", true},
-    };
+        {"is not tried again", tab, "", true}};
+    // clang-format on
     tFakeHost host;
     auto* const servo = new tLoadingServo(&host.table);
     host.table.servoHandle = static_cast<zvckmDravik::tServo*>(servo);
-    for (const Row& row : rows) {
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         const std::string metaData =
             R"({"selectedTRInstID":"a","TRs":{"A":{"type":")" + row.type + R"("}}})";

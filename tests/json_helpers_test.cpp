@@ -96,32 +96,29 @@ TEST(JsonHelpers, LookUpOptionalMembers)
     const std::string invalid = payload("-52005", "jsonErrorsInvalidJSON", "zvjsonkit/CppJson", 34);
     const std::string noObject =
         payload("-52004", "jsonErrorsNotAnObject", "zvjsonkit/cJSONUtils", 78);
-    struct Row {
+    const struct {
         bool (*lookUp)(const std::string&, const std::string&, std::string&);
-        const char* text;
-        const char* key;
+        const char *text, *key;
         bool found;
         const char* value; // "old" before
         std::string raised;
-    };
-    const Row rows[] = {
-        {getOptionalString, R"({"a":"x\ny"} z)", "A", true, "x\ny", ""},
-        {getOptionalString, R"({"a":null})", "a", true, "old", ""},
-        {getOptionalString, R"({"b":{"a":""}})", "a", false, "old", ""},
-        {getOptionalString, R"(["a"])", "a", false, "old", ""},
-        {getOptionalString, R"({"":"x"})", "", true, "x", ""},
-        {getOptionalString, " {\"a\":\t1} z", "A", false, "old",
-         type + R"("JSON":" {\"a\":\t1} z","key":"A"}})"},
-        {getOptionalString, "{", "a", false, "old", invalid},
-        {getOptionalObjectText, "{\"a\": {\n \"c\" : [ \"\\u0001\\\"\" ] , \"b\" : 1.50 } }", "A",
-         true, "{\"c\":[\"\\u0001\\\"\"],\"b\":1.5}", ""},
-        {getOptionalObjectText, R"({"a":{}})", "b", false, "old", ""},
-        {getOptionalObjectText, "5", "a", false, "old", ""},
-        {getOptionalObjectText, R"({"a":null})", "a", false, "old", noObject},
-        {getOptionalObjectText, R"({"a":"{}"})", "a", false, "old", noObject},
-        {getOptionalObjectText, "", "a", false, "old", invalid},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{getOptionalString, R"({"a":"x\ny"} z)", "A", true, "x\ny", ""},
+                {getOptionalString, R"({"a":null})", "a", true, "old", ""},
+                {getOptionalString, R"({"b":{"a":""}})", "a", false, "old", ""},
+                {getOptionalString, R"(["a"])", "a", false, "old", ""},
+                {getOptionalString, R"({"":"x"})", "", true, "x", ""},
+                {getOptionalString, " {\"a\":\t1} z", "A", false, "old",
+                 type + R"("JSON":" {\"a\":\t1} z","key":"A"}})"},
+                {getOptionalString, "{", "a", false, "old", invalid},
+                {getOptionalObjectText,
+                 "{\"a\": {\n \"c\" : [ \"\\u0001\\\"\" ] , \"b\" : 1.50 } }", "A", true,
+                 "{\"c\":[\"\\u0001\\\"\"],\"b\":1.5}", ""},
+                {getOptionalObjectText, R"({"a":{}})", "b", false, "old", ""},
+                {getOptionalObjectText, "5", "a", false, "old", ""},
+                {getOptionalObjectText, R"({"a":null})", "a", false, "old", noObject},
+                {getOptionalObjectText, R"({"a":"{}"})", "a", false, "old", noObject},
+                {getOptionalObjectText, "", "a", false, "old", invalid}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.text);
         std::string value = "old";
         bool found = false;
@@ -133,29 +130,25 @@ TEST(JsonHelpers, LookUpOptionalMembers)
 
 TEST(MetaData, TellsTheTypeOfTheSelectedReference)
 {
-    struct Row {
-        const char* text;
-        const char* type;
+    const struct {
+        const char *text, *type;
         int32_t code;
-    };
-    const Row rows[] = {
+        // clang-format off
+    } rows[] = {
         {R"({"selectedtrinstid":"A1","trs":{"b":5,"a1":{"x":[],"TYPE":"T b"}}} rest)", "T b", 0},
         {R"({"selectedTRInstID":"a","TRs":{"a":{"type":null}}})", "", 0},
         {R"({"selectedTRInstID":"a","TRs":{"a":{}}})", "", 0},
         {R"({"selectedTRInstID":"a","TRs":{"b":{"type":"T"}}})", "", 0},
-        {R"({"selectedTRInstID":"a"})", "", 0},
-        {R"({"TRs":5})", "", 0},
-        {"[]", "", 0},
+        {R"({"selectedTRInstID":"a"})", "", 0}, {R"({"TRs":5})", "", 0}, {"[]", "", 0},
         {R"({"selectedTRInstID":null,"TRs":{"":{"type":"T"}}})", "T", 0},
         {R"({"selectedTRInstID":"","TRs":{"a":{"type":"T"}}})", "", 0},
         {R"({"selectedTRInstID":"a","TRs":5})", "", -52004},
         {R"({"selectedTRInstID":"a","TRs":null})", "", -52004},
         {R"({"selectedTRInstID":"a","TRs":{"a":[]}})", "", -52004},
         {R"({"selectedTRInstID":{},"TRs":{}})", "", -52004},
-        {R"({"selectedTRInstID":"a","TRs":{"a":{"type":7}}})", "", -52004},
-        {"{", "", -52005},
-    };
-    for (const Row& row : rows) {
+        {R"({"selectedTRInstID":"a","TRs":{"a":{"type":7}}})", "", -52004}, {"{", "", -52005}};
+    // clang-format on
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.text);
         std::string type;
         const std::string raised = raisedBy([&] { type = getSelectedTimeReferenceType(row.text); });

@@ -51,15 +51,13 @@ tPut anObject(const char* key)
 
 TEST(JsonWriter, AddsAMemberIntoTheLastFreeByteAndNotBeyond)
 {
-    struct Row {
-        const char* name;
-        const char* before;
+    const struct {
+        const char *name, *before;
         size_t position;
         tPut put;
         const char* after;
         size_t behind; // the position that comes back
-    };
-    const Row rows[] = {
+    } rows[] = {
         {"first member", "{}", 1, aString("a", "b"), R"({"a":"b"})", 8},
         {"behind another", R"({"a":"b"})", 8, anInt("c", -1), R"({"a":"b","c":-1})", 15},
         {"behind white space", "{ \t\r\n}", 5, anInt("a", 1), "{ \t\r\n\"a\":1}", 10},
@@ -77,9 +75,8 @@ TEST(JsonWriter, AddsAMemberIntoTheLastFreeByteAndNotBeyond)
          R"({"o":{"k":1,"p":{}},"n":1})", 18},
         {"end marks in the text", R"({"J":"J"})", 8, aString("J", "J"), R"({"J":"J","J":"J"})", 16},
         {"escapes", "{}", 1, aString("\"", "\"\\\b\t\n\f\r\x01\x1f\x7f/ \xc3\xa9"),
-         "{\"\\\"\":\"\\\"\\\\\\b\\t\\n\\f\\r\\u0001\\u001f\\u007f/ \xc3\xa9\"}", 44},
-    };
-    for (const Row& row : rows) {
+         "{\"\\\"\":\"\\\"\\\\\\b\\t\\n\\f\\r\\u0001\\u001f\\u007f/ \xc3\xa9\"}", 44}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         const size_t need = std::strlen(row.after) - std::strlen(row.before);
         tBuffer exact(row.before, need);
@@ -99,45 +96,22 @@ TEST(JsonWriter, AddsAMemberIntoTheLastFreeByteAndNotBeyond)
 
 TEST(JsonReader, TellsWhereAndWhyATextDoesNotParse)
 {
-    struct Row {
+    const struct {
         const char* text;
         uint32_t error; // 0: parses up to `place`
         size_t place;
-    };
-    const Row rows[] = {
-        {R"({"a":1,})", 8, 7},
-        {"[1 , ]", 8, 5},
-        {R"({"a" 1})", 5, 5},
-        {R"({"a":1 "b":2})", 6, 7},
-        {"[1 2]", 6, 3},
-        {"[1}", 6, 2},
-        {"[1,2", 4, 4},
-        {"[", 4, 1},
-        {"{", 3, 1},
-        {R"({"a":1 )", 3, 7},
-        {R"({"a":"\q"})", 7, 7},
-        {R"("\u12g4")", 7, 5},
-        {R"("\)", 7, 2},
-        {R"("\u)", 7, 3},
-        {R"({"a":"x)", 2, 7},
-        {"\"a\tb\"", 2, 2},
-        {"{1:2}", 2, 1},
-        {R"({"a":})", 2, 5},
-        {R"({"a":1,)", 2, 7},
-        {"[x]", 2, 1},
-        {"", 2, 0},
-        {" 1", 2, 0}, // white space is skipped inside only
-        {"+1", 2, 0},
-        {".5", 2, 0},
-        {"1e", 2, 0},
-        {"nul", 2, 0},
-        {"{}x", 0, 2},
-        {"[ 1 , [ ] , { \"a\" : null } ]x", 0, 28},
-        {"truest", 0, 4},
-        {"null", 0, 4},
-        {"\"\\\"\\/\\\\\\b\\f\\n\\r\\t\\uaF09 \x7f\x80\"", 0, 27},
-    };
-    for (const Row& row : rows) {
+        // clang-format off
+    } rows[] = {
+        {R"({"a":1,})", 8, 7}, {"[1 , ]", 8, 5}, {R"({"a" 1})", 5, 5}, {R"({"a":1 "b":2})", 6, 7},
+        {"[1 2]", 6, 3}, {"[1}", 6, 2}, {"[1,2", 4, 4}, {"[", 4, 1}, {"{", 3, 1},
+        {R"({"a":1 )", 3, 7}, {R"({"a":"\q"})", 7, 7}, {R"("\u12g4")", 7, 5}, {R"("\)", 7, 2},
+        {R"("\u)", 7, 3}, {R"({"a":"x)", 2, 7}, {"\"a\tb\"", 2, 2}, {"{1:2}", 2, 1},
+        {R"({"a":})", 2, 5}, {R"({"a":1,)", 2, 7}, {"[x]", 2, 1}, {"", 2, 0},
+        {" 1", 2, 0 /* white space is skipped inside only */}, {"+1", 2, 0}, {".5", 2, 0},
+        {"1e", 2, 0}, {"nul", 2, 0}, {"{}x", 0, 2}, {"[ 1 , [ ] , { \"a\" : null } ]x", 0, 28},
+        {"truest", 0, 4}, {"null", 0, 4}, {"\"\\\"\\/\\\\\\b\\f\\n\\r\\t\\uaF09 \x7f\x80\"", 0, 27}};
+    // clang-format on
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.text);
         jsonz_Token token = {};
         const char* const behind = jsonz_parseValue(row.text, &token);
@@ -157,25 +131,21 @@ TEST(JsonReader, TellsWhereAndWhyATextDoesNotParse)
 
 TEST(JsonReader, DescribesAValueOfEachKind)
 {
-    struct Row {
+    const struct {
         const char* text;
         uint32_t type;
         size_t start;
         uint32_t length;
         bool isFloat;
-    };
-    const Row rows[] = {
-        {R"( "a\n")", jsonz_tokenString, 2, 3, false},
-        {"\t-", jsonz_tokenNumber, 1, 1, false},
-        {"007x", jsonz_tokenNumber, 0, 3, false},
-        {"1.", jsonz_tokenNumber, 0, 2, true},
-        {"1e+", jsonz_tokenNumber, 0, 3, true},
-        {"-1.5E-07,", jsonz_tokenNumber, 0, 8, true},
-        {"\r\n[1]", jsonz_tokenArray, 2, 0, false},
-        {R"({"a":1})", jsonz_tokenObject, 0, 0, false},
-        {"null", jsonz_tokenNull, 0, 0, false},
-    };
-    for (const Row& row : rows) {
+        // clang-format off
+    } rows[] = {
+        {R"( "a\n")", jsonz_tokenString, 2, 3, false}, {"\t-", jsonz_tokenNumber, 1, 1, false},
+        {"007x", jsonz_tokenNumber, 0, 3, false}, {"1.", jsonz_tokenNumber, 0, 2, true},
+        {"1e+", jsonz_tokenNumber, 0, 3, true}, {"-1.5E-07,", jsonz_tokenNumber, 0, 8, true},
+        {"\r\n[1]", jsonz_tokenArray, 2, 0, false}, {R"({"a":1})", jsonz_tokenObject, 0, 0, false},
+        {"null", jsonz_tokenNull, 0, 0, false}};
+    // clang-format on
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.text);
         jsonz_Token token = {};
         ASSERT_NE(nullptr, jsonz_parseValueAt(row.text, &token));
@@ -210,28 +180,19 @@ TEST(JsonReader, StopsAtItsDeepestNesting)
 
 TEST(JsonReader, FindsTheFirstMemberOfTheTopLevel)
 {
-    struct Row {
-        const char* text;
-        const char* key;
+    const struct {
+        const char *text, *key;
         const char* value; // and what follows; null: not found
-    };
-    const Row rows[] = {
-        {R"({"a":{"b":1},"b":2})", "b", "2}"},
-        {R"({"a":1,"a":2})", "a", R"(1,"a":2})"},
-        {" {\t\"a\" :\n1 , \"b\" : 2", "b", "2"},
-        {R"({"\u0061\"\/":1})", "a\"/", "1}"},
-        {R"({"ab":1})", "a", nullptr},
-        {R"({"a":1})", "ab", nullptr},
-        {R"({"a":1 "b":2})", "b", nullptr},
-        {R"({"a":x,"b":2})", "b", nullptr},
-        {R"({"a":1,})", "b", nullptr},
-        {R"([{"a":1}])", "a", nullptr},
-        {R"(["a":1])", "a", nullptr},
-        {"{}", "a", nullptr},
-        {"", "a", nullptr},
-        {R"({"a":1}, "b":2)", "b", nullptr},
-    };
-    for (const Row& row : rows) {
+        // clang-format off
+    } rows[] = {
+        {R"({"a":{"b":1},"b":2})", "b", "2}"}, {R"({"a":1,"a":2})", "a", R"(1,"a":2})"},
+        {" {\t\"a\" :\n1 , \"b\" : 2", "b", "2"}, {R"({"\u0061\"\/":1})", "a\"/", "1}"},
+        {R"({"ab":1})", "a", nullptr}, {R"({"a":1})", "ab", nullptr},
+        {R"({"a":1 "b":2})", "b", nullptr}, {R"({"a":x,"b":2})", "b", nullptr},
+        {R"({"a":1,})", "b", nullptr}, {R"([{"a":1}])", "a", nullptr}, {R"(["a":1])", "a", nullptr},
+        {"{}", "a", nullptr}, {"", "a", nullptr}, {R"({"a":1}, "b":2)", "b", nullptr}};
+    // clang-format on
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.text);
         EXPECT_STREQ(row.value, jsonz_findMember(row.text, row.key));
     }
@@ -257,42 +218,24 @@ TEST(JsonReader, GivesStringsThatPointIntoTheText)
 
 TEST(JsonReader, ConvertsNumbersUnderEveryLocale)
 {
-    struct Row {
+    const struct {
         const char* text;
         int32_t value;
         int behind; // -1: the fallback
-    };
-    const Row rows[] = {
-        {"12", 12, 2},
-        {"-7,", -7, 2},
-        {" 12.9", 12, 5},
-        {"-12.9", -12, 5},
-        {"010", 8, 3},
-        {"0x10", 16, 1}, // cut by the parser, read on by the conversion
-        {"08", 0, 2},
-        {"1.5e3,7.5", 1500, 5},
-        {"1e2", 100, 3},
-        {"1e+", 1, 3},
-        {"1.", 1, 2},
-        {"-.5", 0, 3},
-        {"2147483647", INT32_MAX, 10},
-        {"2147483648", INT32_MAX, 10},
-        {"-2147483649", INT32_MIN, 11},
-        {"99999999999999999999", INT32_MAX, 20},
-        {"4294967297", INT32_MAX, 10},
-        {"1e999", INT32_MAX, 5},
-        {"-3e9", INT32_MIN, 4},
-        {"-2147483648.5", INT32_MIN, 13},
-        {"\"12\"", 55, -1},
-        {"-", 55, -1},
-        {"-e5", 55, -1},
-        {"true", 55, -1},
-        {"x", 55, -1},
-        {nullptr, 55, -1},
-    };
+        // clang-format off
+    } rows[] = {
+        {"12", 12, 2}, {"-7,", -7, 2}, {" 12.9", 12, 5}, {"-12.9", -12, 5}, {"010", 8, 3},
+        {"0x10", 16, 1 /* cut by the parser, read on by the conversion */}, {"08", 0, 2},
+        {"1.5e3,7.5", 1500, 5}, {"1e2", 100, 3}, {"1e+", 1, 3}, {"1.", 1, 2}, {"-.5", 0, 3},
+        {"2147483647", INT32_MAX, 10}, {"2147483648", INT32_MAX, 10},
+        {"-2147483649", INT32_MIN, 11}, {"99999999999999999999", INT32_MAX, 20},
+        {"4294967297", INT32_MAX, 10}, {"1e999", INT32_MAX, 5}, {"-3e9", INT32_MIN, 4},
+        {"-2147483648.5", INT32_MIN, 13}, {"\"12\"", 55, -1}, {"-", 55, -1}, {"-e5", 55, -1},
+        {"true", 55, -1}, {"x", 55, -1}, {nullptr, 55, -1}};
+    // clang-format on
     for (const char* locale : {"C", "de_DE.UTF-8"}) {
         ASSERT_NE(nullptr, std::setlocale(LC_ALL, locale)) << locale;
-        for (const Row& row : rows) {
+        for (const auto& row : rows) {
             SCOPED_TRACE(testing::Message() << locale << " " << (row.text ? row.text : "null"));
             const char* next = "";
             EXPECT_EQ(row.value, jsonz_getInt(row.text, 55, &next));
@@ -308,47 +251,33 @@ TEST(JsonReader, ConvertsNumbersUnderEveryLocale)
 
 TEST(JsonReader, UnescapesUpToTheFirstBadSequence)
 {
-    struct Row {
-        const char* escaped;
-        const char* plain;
-        bool clean;
-    };
-    const Row rows[] = {
-        {"", "", true},
-        {"a\x7f\xc3\xa9", "a\x7f\xc3\xa9", true},
-        {R"(\"\/\\\b\f\n\r\t)", "\"/\\\b\f\n\r\t", true},
-        {R"(\u004A\u007f\u0080\u00e9\u07FF)", "J\x7f\xc2\x80\xc3\xa9\xdf\xbf", true},
-        {R"(\u0800\ud7ff\ue000\uffff)", "\xe0\xa0\x80\xed\x9f\xbf\xee\x80\x80\xef\xbf\xbf", true},
-        {R"(\u20ac)", "\xe2\x82\xac", true},
-        {R"(\ud800\udc00\ud83d\ude00)", "\xf0\x90\x80\x80\xf0\x9f\x98\x80", true},
-        {R"(\udbff\udfffx)", "\xf4\x8f\xbf\xbfx", true},
-        // Halves in the wrong order are taken as they come, as far as four bytes hold them.
-        {R"(\udc00\u1234x)", "\xf4\x93\x98\xb4x", true},
-        {R"(\udfbf\udfff)", "\xf7\xbf\xbf\xbf", true},
-        {R"(a\udfbf\ue000)", "a", false},
-        {R"(a\udfff\udc00)", "a", false},
-        {R"(a\ud83d)", "a", false},
-        {R"(a\ud83dx)", "a", false},
-        {R"(a\ud83d\n)", "a", false},
-        {R"(a\ud83dxude00)", "a", false},
-        {R"(a\ud83d\u12)", "a", false},
-        {R"(a\ud83d\u12x4)", "a", false},
-        {R"(a\u0000b)", "a", false},
-        {R"(a\)", "a", false},
-        {R"(a\qb)", "a", false},
-        {R"(a\u12)", "a", false},
-        {R"(a\u12:4)", "a", false},
-    };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.escaped);
-        const auto length = static_cast<uint32_t>(std::strlen(row.escaped));
+    for (const auto& [escaped, plain, clean] :
+         {std::tuple<const char*, const char*, bool>{"", "", true},
+          {"a\x7f\xc3\xa9", "a\x7f\xc3\xa9", true},
+          {R"(\"\/\\\b\f\n\r\t)", "\"/\\\b\f\n\r\t", true},
+          {R"(\u004A\u007f\u0080\u00e9\u07FF)", "J\x7f\xc2\x80\xc3\xa9\xdf\xbf", true},
+          {R"(\u0800\ud7ff\ue000\uffff)", "\xe0\xa0\x80\xed\x9f\xbf\xee\x80\x80\xef\xbf\xbf", true},
+          {R"(\u20ac)", "\xe2\x82\xac", true},
+          {R"(\ud800\udc00\ud83d\ude00)", "\xf0\x90\x80\x80\xf0\x9f\x98\x80", true},
+          {R"(\udbff\udfffx)", "\xf4\x8f\xbf\xbfx", true},
+          // Halves in the wrong order are taken as they come, as far as four bytes hold them.
+          {R"(\udc00\u1234x)", "\xf4\x93\x98\xb4x", true},
+          {R"(\udfbf\udfff)", "\xf7\xbf\xbf\xbf", true},
+          // clang-format off
+          {R"(a\udfbf\ue000)", "a", false}, {R"(a\udfff\udc00)", "a", false},
+          {R"(a\ud83d)", "a", false}, {R"(a\ud83dx)", "a", false}, {R"(a\ud83d\n)", "a", false},
+          {R"(a\ud83dxude00)", "a", false}, {R"(a\ud83d\u12)", "a", false},
+          {R"(a\ud83d\u12x4)", "a", false}, {R"(a\u0000b)", "a", false}, {R"(a\)", "a", false},
+          {R"(a\qb)", "a", false}, {R"(a\u12)", "a", false}, {R"(a\u12:4)", "a", false}}) {
+        // clang-format on
+        SCOPED_TRACE(escaped);
+        const auto length = static_cast<uint32_t>(std::strlen(escaped));
         const std::unique_ptr<char[]> out(new char[length + 1]);
-        char* const end = jsonz_unescape(row.escaped, length, out.get());
-        EXPECT_STREQ(row.plain, out.get());
-        EXPECT_EQ(row.clean ? out.get() + std::strlen(row.plain) : nullptr, end);
-        EXPECT_TRUE(jsonz_equalsEscaped(row.plain, row.escaped, length));
-        EXPECT_FALSE(
-            jsonz_equalsEscaped((row.plain + std::string("x")).c_str(), row.escaped, length));
+        char* const end = jsonz_unescape(escaped, length, out.get());
+        EXPECT_STREQ(plain, out.get());
+        EXPECT_EQ(clean ? out.get() + std::strlen(plain) : nullptr, end);
+        EXPECT_TRUE(jsonz_equalsEscaped(plain, escaped, length));
+        EXPECT_FALSE(jsonz_equalsEscaped((plain + std::string("x")).c_str(), escaped, length));
     }
     // The length ends the reading, inside an escape too, whatever stands behind it.
     char out[8];

@@ -66,27 +66,23 @@ TEST(FixedStatus, KeepsBothEndsOfALongFileAndTheStartOfALongComponent)
 {
     const std::string start(49, 'a');
     const std::string end(49, 'z');
-    struct Row {
-        std::string component, file, keptComponent, keptFile;
-    };
-    const Row rows[] = {
-        {"dravik", "unit", "dravik", "unit"},
-        {"123456789", start + "12" + end, "123456789", start + "12" + end},
-        {"123456789A", start + "123" + end, "123456789", start + ".." + end},
-        {"", start + std::string(300, '-') + end, "", start + ".." + end},
-    };
     tFixedStatus reused;
-    for (const Row& row : rows) {
+    for (const auto& [component, file, keptComponent, keptFile] :
+         {std::tuple<std::string, std::string, std::string, std::string>{"dravik", "unit", "dravik",
+                                                                         "unit"},
+          {"123456789", start + "12" + end, "123456789", start + "12" + end},
+          {"123456789A", start + "123" + end, "123456789", start + ".." + end},
+          {"", start + std::string(300, '-') + end, "", start + ".." + end}}) {
         reused.code = 2; // a failure replaces a warning and all of its text
-        EXPECT_TRUE(reused.set(-5, row.component.c_str(), row.file.c_str(), 7));
+        EXPECT_TRUE(reused.set(-5, component.c_str(), file.c_str(), 7));
         EXPECT_EQ(-5, reused.code);
-        EXPECT_EQ(row.keptComponent, reused.component);
-        EXPECT_EQ(row.keptFile, reused.file);
+        EXPECT_EQ(keptComponent, reused.component);
+        EXPECT_EQ(keptFile, reused.file);
         EXPECT_EQ(7U, reused.line);
         EXPECT_FALSE(reused.set(-6, "other", "other", 8));
-        EXPECT_EQ(row.keptFile, reused.file);
+        EXPECT_EQ(keptFile, reused.file);
         EXPECT_EQ(-5, reused.code);
-        for (size_t i = row.keptFile.size(); i < sizeof reused.file; ++i) {
+        for (size_t i = keptFile.size(); i < sizeof reused.file; ++i) {
             EXPECT_EQ(0, reused.file[i]);
         }
     }
@@ -101,7 +97,7 @@ TEST(FixedStatus, KeepsBothEndsOfALongFileAndTheStartOfALongComponent)
 TEST(FixedStatus, GoesIntoAStatusAsFarAsThereIsRoom)
 {
     const std::string escapes(100, '\x01'); // more than there is room for
-    struct Row {
+    const struct {
         const char* name;
         int32_t code;
         const char* component;
@@ -111,18 +107,15 @@ TEST(FixedStatus, GoesIntoAStatusAsFarAsThereIsRoom)
         int32_t after;
         const char* text;
         bool refuses = false;
-    };
-    const Row rows[] = {
-        {"all", -5, "c", "f", 0, nullptr, -5, R"({"file":"f","line":7,"component":"c"})"},
-        {"a warning", 5, "c", "", 0, nullptr, 5, R"({"component":"c"})"},
-        {"bare", -5, "", "", 0, nullptr, -5, "(none)"},
-        {"nothing", 0, "c", "f", 0, nullptr, 0, "(none)"},
-        {"over a warning", -5, "", "f", 2, R"({"w":1})", -5, R"({"file":"f","line":7})"},
-        {"under a failure", -5, "c", "f", -1, R"({"w":1})", -1, R"({"w":1})"},
-        {"no memory", -5, "c", "f", 0, nullptr, -5, "(none)", true},
-        {"too long a file", -5, "c", escapes, 0, nullptr, -5, R"({"component":"c"})"},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{"all", -5, "c", "f", 0, nullptr, -5, R"({"file":"f","line":7,"component":"c"})"},
+                {"a warning", 5, "c", "", 0, nullptr, 5, R"({"component":"c"})"},
+                {"bare", -5, "", "", 0, nullptr, -5, "(none)"},
+                {"nothing", 0, "c", "f", 0, nullptr, 0, "(none)"},
+                {"over a warning", -5, "", "f", 2, R"({"w":1})", -5, R"({"file":"f","line":7})"},
+                {"under a failure", -5, "c", "f", -1, R"({"w":1})", -1, R"({"w":1})"},
+                {"no memory", -5, "c", "f", 0, nullptr, -5, "(none)", true},
+                {"too long a file", -5, "c", escapes, 0, nullptr, -5, R"({"component":"c"})"}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tFixedStatus fixed;
         fixed.set(row.code, row.component, row.file.c_str(), 7);
@@ -164,28 +157,25 @@ TEST(FixedStatus, GuardRaisesFailuresOnlyAndOnlyOutsideAnUnwinding)
 
 TEST(FixedStatus, AdapterShowsTheEndsOfWhatAStatusHolds)
 {
-    struct Row {
+    const struct {
         const char* name;
         int32_t code;
         std::string text;
         std::string component, file;
         uint32_t line;
-    };
-    const Row rows[] = {
-        {"all", -5, R"({"component":"abc","file":"f","line":7})", "abc", "f", 7},
-        {"a warning", 5, R"({"line":-1})", "", "", UINT32_MAX},
-        {"long names", -5,
-         R"({"component":"0123456789","file":"xy)" + std::string(99, 'f') + R"("})", "123456789",
-         "y" + std::string(99, 'f'), 0},
-        {"cut in an escape", -5, R"({"component":"\u0041b\n34567"})", "1b\n34567", "", 0},
-        {"cut to a bad one", -5, R"({"component":"12\\u56x8901","file":"f"})", "", "f", 0},
-        {"bad behind good", -5, R"({"component":"ab\u0000c"})", "ab", "", 0},
-        {"other types", -5, R"({"component":1,"file":null,"line":"7"})", "", "", 0},
-        {"no JSON", -5, R"({"line":7,"component":)", "", "", 7},
-        {"no object", -5, R"(["component","c"])", "", "", 0},
-        {"no failure", 0, R"({"component":"abc","file":"f","line":7})", "", "", 0},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{"all", -5, R"({"component":"abc","file":"f","line":7})", "abc", "f", 7},
+                {"a warning", 5, R"({"line":-1})", "", "", UINT32_MAX},
+                {"long names", -5,
+                 R"({"component":"0123456789","file":"xy)" + std::string(99, 'f') + R"("})",
+                 "123456789", "y" + std::string(99, 'f'), 0},
+                {"cut in an escape", -5, R"({"component":"\u0041b\n34567"})", "1b\n34567", "", 0},
+                {"cut to a bad one", -5, R"({"component":"12\\u56x8901","file":"f"})", "", "f", 0},
+                {"bad behind good", -5, R"({"component":"ab\u0000c"})", "ab", "", 0},
+                {"other types", -5, R"({"component":1,"file":null,"line":"7"})", "", "", 0},
+                {"no JSON", -5, R"({"line":7,"component":)", "", "", 7},
+                {"no object", -5, R"(["component","c"])", "", "", 0},
+                {"no failure", 0, R"({"component":"abc","file":"f","line":7})", "", "", 0}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tHostStatus host(row.code, row.text.c_str());
         {
@@ -366,29 +356,26 @@ TEST(Containers, DoNothingUnderAFailureAndKeepTheirContentsWithoutMemory)
         tBytes bytes;
         tPairs pairs;
     };
-    struct Row {
+    const std::string longText(300, 'x');
+    const struct {
         const char* name;
         std::function<void(tObjects&, zverr_Status*)> change;
         long allocations;
-    };
-    const std::string longText(300, 'x');
-    const Row rows[] = {
-        {"construct", [&](tObjects&, zverr_Status* s) { string(longText.c_str(), s); }, 1},
-        {"copy", [](tObjects& o, zverr_Status* s) { string(o.text, s); }, 1},
-        {"reserve", [](tObjects& o, zverr_Status* s) { o.text.reserve(300, s); }, 1},
-        {"assign", [&](tObjects& o, zverr_Status* s) { o.text.assign(longText.c_str(), 300, s); },
-         1},
-        {"assign less", [](tObjects& o, zverr_Status* s) { o.text.assign("x", 1, s); }, 0},
-        {"insert", [](tObjects& o, zverr_Status* s) { o.bytes.insert(4, 1, 'x', s); }, 1},
-        {"open_gap", [](tObjects& o, zverr_Status* s) { insert(o.pairs, 4, "x", s); }, 18},
-        {"chain",
-         [&](tObjects&, zverr_Status* s) {
-             const string name(longText.c_str(), s);
-             const string copy(name, s);
-         },
-         2},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{"construct", [&](tObjects&, zverr_Status* s) { string(longText.c_str(), s); }, 1},
+                {"copy", [](tObjects& o, zverr_Status* s) { string(o.text, s); }, 1},
+                {"reserve", [](tObjects& o, zverr_Status* s) { o.text.reserve(300, s); }, 1},
+                {"assign",
+                 [&](tObjects& o, zverr_Status* s) { o.text.assign(longText.c_str(), 300, s); }, 1},
+                {"assign less", [](tObjects& o, zverr_Status* s) { o.text.assign("x", 1, s); }, 0},
+                {"insert", [](tObjects& o, zverr_Status* s) { o.bytes.insert(4, 1, 'x', s); }, 1},
+                {"open_gap", [](tObjects& o, zverr_Status* s) { insert(o.pairs, 4, "x", s); }, 18},
+                {"chain",
+                 [&](tObjects&, zverr_Status* s) {
+                     const string name(longText.c_str(), s);
+                     const string copy(name, s);
+                 },
+                 2}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tHostStatus good;
         tHostStatus failed(-1, R"({"b":2})");
@@ -426,30 +413,24 @@ TEST(Details, AreAllThatExhaustedMemoryCosts)
 {
     const std::string longText(2000, '\n'); // more than two buffers
     const std::runtime_error thrown(longText);
-    struct Row {
-        const char* name;
-        std::function<void(zverr_Status*)> fail;
-        int32_t code;
-        long allocations;
-    };
-    const Row rows[] = {
-        {"load", [&](zverr_Status* s) { zvdynlib_load(longText.c_str(), RTLD_NOW, s); }, -52005, 6},
-        {"symbol", [](zverr_Status* s) { zvdynlib_symbol(nullptr, "?", s); }, -52005, 1},
-        {"fixed record",
-         [](zverr_Status* s) { zvplat::tFixedStatusAdapter(s).get()->set(-5, "c", "f", 7); }, -5,
-         1},
-        {"exception",
-         [&thrown](zverr_Status* s) {
-             try {
-                 throw std::runtime_error(thrown); // the copy shares its text
-             } catch (...) {
-                 zverr_exceptionToStatus(s);
-             }
-         },
-         -52003, 5},
-    };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.name);
+    for (const auto& [name, fail, code, allocations] :
+         {std::tuple<const char*, std::function<void(zverr_Status*)>, int32_t, long>{
+              "load", [&](zverr_Status* s) { zvdynlib_load(longText.c_str(), RTLD_NOW, s); },
+              -52005, 6},
+          {"symbol", [](zverr_Status* s) { zvdynlib_symbol(nullptr, "?", s); }, -52005, 1},
+          {"fixed record",
+           [](zverr_Status* s) { zvplat::tFixedStatusAdapter(s).get()->set(-5, "c", "f", 7); }, -5,
+           1},
+          {"exception",
+           [&thrown](zverr_Status* s) {
+               try {
+                   throw std::runtime_error(thrown); // the copy shares its text
+               } catch (...) {
+                   zverr_exceptionToStatus(s);
+               }
+           },
+           -52003, 5}}) {
+        SCOPED_TRACE(name);
         const long before = allocator::liveBlocks();
         long n = 1;
         size_t length = 0;
@@ -457,10 +438,10 @@ TEST(Details, AreAllThatExhaustedMemoryCosts)
             zverr_Status status = zverr_emptyStatus();
             {
                 const allocator::tFailNth failing(n);
-                row.fail(&status);
+                fail(&status);
                 fired = failing.fired();
             }
-            EXPECT_EQ(row.code, status.code);
+            EXPECT_EQ(code, status.code);
             expectBufferForm(status);
             if (status.json != nullptr) {
                 EXPECT_NE(nullptr, jsonz_closingBracket(status.json));
@@ -469,7 +450,7 @@ TEST(Details, AreAllThatExhaustedMemoryCosts)
             }
             zverr_releaseJson(&status);
         }
-        EXPECT_EQ(row.allocations, n - 2);
+        EXPECT_EQ(allocations, n - 2);
         EXPECT_EQ(before, allocator::liveBlocks());
     }
 }
@@ -488,15 +469,14 @@ TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
         notRead +
         R"(21,"string":"Is a directory"},"zvhostq_debug":{)"
         R"("desc":"didn't read full content of file","fileSize":0,"fread_return":0,"filename":)";
-    struct Row {
+    const struct {
         const char* name;
         std::string path;
         int32_t before;
         std::string content; // "old content" before
         int32_t code;
         std::string text;
-    };
-    const Row rows[] = {
+    } rows[] = {
         {"shorter than before", path, 0, std::string("abc\0", 4), 0, "(none)"},
         {"under a failure", path, -1, "old content", -1, "(none)"},
         {"missing", "/none", 0, "old content", -52006,
@@ -513,9 +493,8 @@ TEST(ReadWholeFile, GivesItsBytesAndAZeroOrSaysWhatTheSystemSaid)
              R"(29,"string":"Illegal seek"},"zvhostq_debug":{)"
              R"("desc":"didn't read full content of file","fileSize":4294967295,"fread_return":0,)"
              R"("filename":")" +
-             pipePath + R"("}})"},
-    };
-    for (const Row& row : rows) {
+             pipePath + R"("}})"}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tHostStatus status(row.before);
         tBytes content;
@@ -561,14 +540,13 @@ TEST(DebugLine, KeepsItsFormHoweverLongItsParts)
     const tDebugLocation onAndOn = {"dravik/tServo", 434, " and so on\n"};
     const std::string file32(32, 'f');
     const std::string file33 = "x" + file32;
-    struct Row {
+    const struct {
         const char* name;
         int32_t level;
         tDebugLocation location;
         std::string message;
         std::string line; // "": dropped
-    };
-    const Row rows[] = {
+    } rows[] = {
         {"dropped", 4095, servo, "m", ""},
         {"lowest level", 4096, servo, "m", prefix + "m\n"},
         {"empty message", 8192, servo, "", prefix + "\n"},
@@ -577,10 +555,9 @@ TEST(DebugLine, KeepsItsFormHoweverLongItsParts)
         {"long end", 8192, onAndOn, longest, prefix + std::string(449, 'm') + " and so on\n"},
         {"no end", 8192, {"dravik/tServo", 434, ""}, "m", prefix + "m"},
         {"file of 32", 8192, {file32.c_str(), 12345, ""}, "m", head + file32 + "|2345] m"},
-        {"file of 33", 8192, {file33.c_str(), 0, ""}, "m", head + file32 + "|0000] m"},
-    };
+        {"file of 33", 8192, {file33.c_str(), 0, ""}, "m", head + file32 + "|0000] m"}};
     takeSystemLog();
-    for (const Row& row : rows) {
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         const tDebugLocation location = row.location;
         zvsdbg_line(row.level, &location, "%s", row.message.c_str());

@@ -23,26 +23,20 @@ constexpr double kInfinity = std::numeric_limits<double>::infinity();
 
 TEST(TimeSpan, FromAndToSeconds)
 {
-    struct Row {
-        double seconds;
-        uint64_t magnitude;
-        int32_t sign;
-    };
-    const Row rows[] = {
-        {0.5, 500000000, 1},
-        {-1.5, 1500000000, -1},
-        {1e-6, 1000, 1},
-        {1.5e-8, 14, 1},
-        {-0.0, 0, 1},
-        {kNaN, 0, -1},
-        {1.9999999999, 1999999999, 1},
-        {10.0, 10 * kSecond, 1},
-        {kInfinity, 4294967295U * kSecond + 4294967295U, 1}, // both conversions saturate
-    };
-    for (const Row& row : rows) {
-        const tTimeSpan span(row.seconds);
-        EXPECT_EQ(row.magnitude, span.getMagnitude()) << row.seconds;
-        EXPECT_EQ(row.sign, span.getSign()) << row.seconds;
+    for (const auto& [seconds, magnitude, sign] : {
+             std::tuple<double, uint64_t, int32_t>{0.5, 500000000, 1},
+             {-1.5, 1500000000, -1},
+             {1e-6, 1000, 1},
+             {1.5e-8, 14, 1},
+             {-0.0, 0, 1},
+             {kNaN, 0, -1},
+             {1.9999999999, 1999999999, 1},
+             {10.0, 10 * kSecond, 1},
+             {kInfinity, 4294967295U * kSecond + 4294967295U, 1}, // both conversions saturate
+         }) {
+        const tTimeSpan span(seconds);
+        EXPECT_EQ(magnitude, span.getMagnitude()) << seconds;
+        EXPECT_EQ(sign, span.getSign()) << seconds;
     }
     EXPECT_EQ(-1.5, tTimeSpan(1500000000U, -1).toSeconds());
     EXPECT_EQ(0x1.9c511dc3a41dfp-29, tTimeSpan(uint64_t{3}).toSeconds())
@@ -64,28 +58,25 @@ TEST(TimeSpan, PartsCarryAndKeepTheSign)
 
 TEST(TimeSpan, DifferencesWrapAndComparisonsLookAtTheSignFirst)
 {
-    struct Row {
+    const uint64_t big = uint64_t{1} << 63;
+    const struct {
         tTimeSpan a, b;
         int64_t difference;
         bool greater, greaterOrEqual;
-    };
-    const uint64_t big = uint64_t{1} << 63;
-    const Row rows[] = {
-        {tTimeSpan(uint64_t{5}), tTimeSpan(uint64_t{7}), -2, false, false},
-        {tTimeSpan(uint64_t{7}), tTimeSpan(uint64_t{7}), 0, false, true},
-        {tTimeSpan(3U, -1), tTimeSpan(5U, -1), 2, true, true},
-        {tTimeSpan(5U, -1), tTimeSpan(3U, -1), -2, false, false},
-        {tTimeSpan(5U, -1), tTimeSpan(5U, -1), 0, false, true},
-        {tTimeSpan(uint64_t{1}), tTimeSpan(9U, -1), 10, true, true},
-        {tTimeSpan(9U, -1), tTimeSpan(uint64_t{1}), -10, false, false},
-        {tTimeSpan(1U, -1), tTimeSpan(uint64_t{9}), -10, false, false},
-        {tTimeSpan(uint64_t{0}), tTimeSpan(0U, -1), 0, true, true},
-        {tTimeSpan(0U, -1), tTimeSpan(uint64_t{0}), 0, false, false},
-        {tTimeSpan(big + 3), tTimeSpan(big - 4), 7, true, true},
-        {tTimeSpan(uint64_t{2}), tTimeSpan(UINT64_MAX), 3, false, false},
-        {tTimeSpan(big), tTimeSpan(uint64_t{0}), INT64_MIN, true, true},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{tTimeSpan(uint64_t{5}), tTimeSpan(uint64_t{7}), -2, false, false},
+                {tTimeSpan(uint64_t{7}), tTimeSpan(uint64_t{7}), 0, false, true},
+                {tTimeSpan(3U, -1), tTimeSpan(5U, -1), 2, true, true},
+                {tTimeSpan(5U, -1), tTimeSpan(3U, -1), -2, false, false},
+                {tTimeSpan(5U, -1), tTimeSpan(5U, -1), 0, false, true},
+                {tTimeSpan(uint64_t{1}), tTimeSpan(9U, -1), 10, true, true},
+                {tTimeSpan(9U, -1), tTimeSpan(uint64_t{1}), -10, false, false},
+                {tTimeSpan(1U, -1), tTimeSpan(uint64_t{9}), -10, false, false},
+                {tTimeSpan(uint64_t{0}), tTimeSpan(0U, -1), 0, true, true},
+                {tTimeSpan(0U, -1), tTimeSpan(uint64_t{0}), 0, false, false},
+                {tTimeSpan(big + 3), tTimeSpan(big - 4), 7, true, true},
+                {tTimeSpan(uint64_t{2}), tTimeSpan(UINT64_MAX), 3, false, false},
+                {tTimeSpan(big), tTimeSpan(uint64_t{0}), INT64_MIN, true, true}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(testing::Message() << "row " << &row - rows);
         const tTimeSpan difference = row.a - row.b;
         EXPECT_EQ(row.difference, difference.toNanoseconds());
@@ -220,29 +211,22 @@ TEST(ControlLaw, KeepsItsOrderOfOperations)
 
 TEST(Timekeeper, SendsWholePartsPerBillionAndExactSteps)
 {
-    struct Row {
-        double ratio;
-        const char* sent;
-    };
     const double half = 1.0 / 1024; // 976562.5 parts per billion, exactly
-    const Row rows[] = {
-        {1.0, "0"},
-        {1.0 + 0.7e-9, "1"},
-        {1.0 + half, "976563"},
-        {1.0 - half, "-976563"},
-        {4.0, "2147483647"},
-        {-4.0, "-2147483648"},
-        {kInfinity, "2147483647"},
-        {kNaN, "0"},
-        {-kInfinity, "-2147483648"},
-        {1.0 - 110e-9, "-110"},
-        {0x1.0000000abcc77p+0, "2"},
-    };
     tFakeHost host;
     zvckmDravik::iTimekeeper& timekeeper = host.open().timekeeper();
-    for (const Row& row : rows) {
-        timekeeper.setFrequency(row.ratio);
-        EXPECT_EQ(std::string("set ") + row.sent, host.takeCalls()) << row.ratio;
+    for (const auto& [ratio, sent] : {std::pair<double, const char*>{1.0, "0"},
+                                      {1.0 + 0.7e-9, "1"},
+                                      {1.0 + half, "976563"},
+                                      {1.0 - half, "-976563"},
+                                      {4.0, "2147483647"},
+                                      {-4.0, "-2147483648"},
+                                      {kInfinity, "2147483647"},
+                                      {kNaN, "0"},
+                                      {-kInfinity, "-2147483648"},
+                                      {1.0 - 110e-9, "-110"},
+                                      {0x1.0000000abcc77p+0, "2"}}) {
+        timekeeper.setFrequency(ratio);
+        EXPECT_EQ(std::string("set ") + sent, host.takeCalls()) << ratio;
     }
     host.offsetPpb = -1051970500;
     EXPECT_EQ(-0x1.a9be09bb6aa60p-5, timekeeper.getFrequency());
@@ -281,15 +265,13 @@ const std::string kLockIn = kMeasured + "3 0 | ";
 
 TEST(StateMachine, LeadsPairsThroughTheStates)
 {
-    struct Row {
+    const struct {
         const char* name;
         std::string script;
         int32_t minPpb = -500000, maxPpb = 500000, offsetPpb = 0;
-    };
-    const Row rows[] = {
-        {"12 ppm off to locked",
-         "1 1000000 | 2 1012000 get set -12000 | 3 1012000 step -1012000 | 4 100 get set -12110 |"
-         "5 0 get set -12055"},
+    } rows[] = {
+        {"12 ppm off to locked", "1 1000000 | 2 1012000 get set -12000 | 3 1012000 step -1012000 | "
+                                 "4 100 get set -12110 |5 0 get set -12055"},
         {"100010 ppb from ten seconds",
          "0 0 | 10 -1000000 get set 100010 | 11 0 | 12 0 get set 100010"},
         {"identical pairs are no measurement", "1 0 | 1 0 get set 0 | 1 0"},
@@ -320,7 +302,7 @@ TEST(StateMachine, LeadsPairsThroughTheStates)
         {"clearHistory leaves phase lock",
          kLockIn + "clear | 4 1000000000 | 5 1000000000 get set 0 | 6 1000000000 step -1000000000"},
     };
-    for (const Row& row : rows) {
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tFakeHost host;
         host.minPpb = row.minPpb;
@@ -351,14 +333,11 @@ TEST(StateMachine, ThresholdsDifferBetweenSnapTimeAndPhaseLock)
 
 TEST(StateMachine, NothingIsRolledBackWhenTheClockFails)
 {
-    struct Row {
+    const struct {
         const char* name;
         std::string before;
-        const char* failing;
-        const char* failed;
-        const char* after;
-    };
-    const Row rows[] = {
+        const char *failing, *failed, *after;
+    } rows[] = {
         // The first pair stays, and the next pair measures from it over two seconds.
         {"frequency lock, getFrequency", "1 0", "getFrequency", "2 0 get",
          "3 2000 get set -1000 | 4 1000000 step -1000000"},
@@ -372,9 +351,8 @@ TEST(StateMachine, NothingIsRolledBackWhenTheClockFails)
         {"phase lock, getFrequency", kLockIn + "4 0 get set 0", "getFrequency", "5 100 get",
          "6 0 get set 0"},
         {"phase lock, setFrequency", kLockIn + "4 0 get set 0", "setFrequency",
-         "5 100 get set -110", "6 0 get set 0"},
-    };
-    for (const Row& row : rows) {
+         "5 100 get set -110", "6 0 get set 0"}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tFakeHost host;
         host.initialize();
@@ -445,8 +423,7 @@ TEST(StateMachine, OneLockCoversAPairAndEveryOtherCall)
         [&] { servo.writeServoConfigJson("{}"); },
         [&] { servo.readServoConfigJson(); },
         [&] { servo.readConfigFile("/none"); },
-        [&] { servo.applyMetaData("{}"); },
-    };
+        [&] { servo.applyMetaData("{}"); }};
     for (const std::function<void()>& other : others) {
         host.takeCalls();
         play(host, "clear | 1 0"); // the states involved take no lock themselves
@@ -503,8 +480,7 @@ TEST(StateMachine, AHostMayCallBackFromEveryOperation)
         [](auto* h, auto* s) {
             uint64_t time = 0;
             zvckmservo_getTime(h, &time, s);
-        },
-    };
+        }};
     for (const std::string operation : {"getTime", "stepTime", "getFrequency", "setFrequency"}) {
         for (const tCall call : calls) {
             tFakeHost host;

@@ -51,16 +51,15 @@ void bridge(const std::function<void()>& thrower, zverr_Status* status)
 
 TEST(Status, FirstFailureWinsAndAFailureReplacesAWarning)
 {
-    struct Row {
+    const struct {
         int32_t before, set;
         bool taken;
-    };
-    const Row rows[] = {{0, 0, false},  {0, -5, true},
-                        {0, 3, true},   {3, -5, true},
-                        {3, 4, false},  {3, 0, false},
-                        {-5, 0, false}, {-5, -6, false},
-                        {-5, 3, false}, {INT32_MAX, INT32_MIN, true}};
-    for (const Row& row : rows) {
+    } rows[] = {{0, 0, false},  {0, -5, true},
+                {0, 3, true},   {3, -5, true},
+                {3, 4, false},  {3, 0, false},
+                {-5, 0, false}, {-5, -6, false},
+                {-5, 3, false}, {INT32_MAX, INT32_MIN, true}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(testing::Message() << row.before << " <- " << row.set);
         tOwnStatus status;
         zverr_setJson(&status.record, R"({"a":1})");
@@ -256,16 +255,6 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
         const char* what() const noexcept override { return nullptr; }
     };
     const auto silent = [] { throw tSilent(); };
-    struct Row {
-        const char* name;
-        std::function<void()> thrower;
-        int32_t before;
-        const char* textBefore;
-        int32_t code;
-        std::string text;
-        tHostStatus::tMode mode = tHostStatus::kGive;
-        uint32_t largest = UINT32_MAX;
-    };
     const char* const warning = R"({"a long warning":"that leaves room"})";
     const char* const text62 =
         R"({"error_constant":"zvplaterr_memoryFull","file":"zverr/tools/exception_errStatus",)"
@@ -279,7 +268,16 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
     const char* const text74 =
         R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly",)"
         R"("file":"zverr/tools/exception_errStatus","line":74,"component":"dravik"})";
-    const Row rows[] = {
+    const struct {
+        const char* name;
+        std::function<void()> thrower;
+        int32_t before;
+        const char* textBefore;
+        int32_t code;
+        std::string text;
+        tHostStatus::tMode mode = tHostStatus::kGive;
+        uint32_t largest = UINT32_MAX;
+    } rows[] = {
         {"own failure", own, 0, nullptr, -8, R"({"a":1})"},
         {"without payload", bare, 0, nullptr, -8, "{}"},
         {"fits over a warning", own, 2, warning, -8, R"({"a":1})"},
@@ -300,9 +298,8 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
         {"what fits exactly", number, 0, nullptr, -52003,
          R"({"error_constant":"zvplaterr_softwareFaultPLATInternalUseOnly"})", tHostStatus::kGive,
          66},
-        {"older failure, no JSON", number, -1, "{no", -1, "{no"},
-    };
-    for (const Row& row : rows) {
+        {"older failure, no JSON", number, -1, "{no", -1, "{no"}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(row.name);
         tHostStatus host(row.before, row.textBefore);
         host.mode = row.mode;
@@ -316,25 +313,22 @@ TEST(Bridge, PutsEveryKindOfExceptionIntoTheHostsStatus)
 
 TEST(Payload, ReservesABufferAndFindsItsClosingBracket)
 {
-    struct Row {
+    const struct {
         const char* text; // null: no buffer yet
         uint32_t extra;
         int bracket;       // -1: null
         uint32_t capacity; // afterwards
         tHostStatus::tMode mode;
-    };
-    const Row rows[] = {
-        {nullptr, 2, 1, 4, tHostStatus::kGive},
-        {nullptr, 2, -1, 0, tHostStatus::kRefuse},
-        {nullptr, 0x7FFFFFFE, -1, 0, tHostStatus::kGive},
-        {R"({"a":1})", 2, 6, 9, tHostStatus::kGive},
-        {R"({"a":1})", 7, 6, 9, tHostStatus::kGive}, // no matter how full it is
-        {R"({"a":1})", 8, 6, 10, tHostStatus::kGive},
-        {R"([{}] rest)", 2, 3, 11, tHostStatus::kGive},
-        {R"({"a":})", 2, -1, 8, tHostStatus::kGive},
-        {R"( {})", 2, -1, 5, tHostStatus::kGive},
-    };
-    for (const Row& row : rows) {
+    } rows[] = {{nullptr, 2, 1, 4, tHostStatus::kGive},
+                {nullptr, 2, -1, 0, tHostStatus::kRefuse},
+                {nullptr, 0x7FFFFFFE, -1, 0, tHostStatus::kGive},
+                {R"({"a":1})", 2, 6, 9, tHostStatus::kGive},
+                {R"({"a":1})", 7, 6, 9, tHostStatus::kGive}, // no matter how full it is
+                {R"({"a":1})", 8, 6, 10, tHostStatus::kGive},
+                {R"([{}] rest)", 2, 3, 11, tHostStatus::kGive},
+                {R"({"a":})", 2, -1, 8, tHostStatus::kGive},
+                {R"( {})", 2, -1, 5, tHostStatus::kGive}};
+    for (const auto& row : rows) {
         SCOPED_TRACE(testing::Message() << (row.text ? row.text : "none") << " " << row.extra);
         tHostStatus host(1, row.text);
         host.mode = row.mode;

@@ -64,8 +64,8 @@ static void* bind(void* library, const char* name)
     return function;
 }
 
-#define BIND(name)                                                                                 \
-    __extension__ __typeof__(&zvckmservo_##name) name = bind(library, "zvckmservo_" #name)
+/* NOLINTNEXTLINE(bugprone-macro-parentheses): what it declares is a name. */
+#define BIND(f) __extension__ __typeof__(&zvckmservo_##f) f = bind(library, "zvckmservo_" #f)
 
 static void useAndClose(const char* path)
 {

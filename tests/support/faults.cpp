@@ -145,7 +145,7 @@ void syslog(int /*priority*/, const char* /*format*/, ...) {}
     result name parameters                                                                         \
     {                                                                                              \
         REAL(name);                                                                                \
-        return failsNow(faults::kFile, EIO) ? failure : real arguments;                            \
+        return failsNow(faults::kFile, EIO) ? (failure) : real arguments;                          \
     }
 FAILING(FILE*, fopen, (const char* path, const char* mode), (path, mode), nullptr)
 FAILING(FILE*, fopen64, (const char* path, const char* mode), (path, mode), nullptr)
