@@ -57,12 +57,10 @@ TEST(SteeredClock, passesWhatOscillatorAndOrderSay)
         int32_t orderedPpb;
         double aheadNs; // after ten seconds
         uint64_t shownNs;
-    } kRows[] = {
-        {0, 0, 0, 10'000'000'000},      {120, 0, 1200, 10'000'001'200},
-        {0, 120, 1200, 10'000'001'200}, {0, -7, -70, 9'999'999'930},
-        {-7, 5, -20, 9'999'999'980},    {1e8, 100'000'000, 2.1e9, 12'100'000'000},
-        {-1e9, 100'000'000, -1e10, 0},
-    };
+    } kRows[] = {{0, 0, 0, 10'000'000'000},      {120, 0, 1200, 10'000'001'200},
+                 {0, 120, 1200, 10'000'001'200}, {0, -7, -70, 9'999'999'930},
+                 {-7, 5, -20, 9'999'999'980},    {1e8, 100'000'000, 2.1e9, 12'100'000'000},
+                 {-1e9, 100'000'000, -1e10, 0}};
     for (const auto& row : kRows) {
         tSteeredClock clock(kStart, row.oscillatorPpb, 200'000'000);
         clock.setOffsetPpb(row.orderedPpb);
@@ -229,18 +227,17 @@ protected:
 
 TEST_F(KernelClock, isSteppedBySecondsAndNanoseconds)
 {
-    const struct {
-        int64_t deltaNs;
-        long seconds, nanoseconds;
-    } kRows[] = {
-        {1, 0, 1},       {-1, -1, 999'999'999},           {-kSecond, -1, 0},
-        {kSecond, 1, 0}, {2'500'000'000, 2, 500'000'000}, {-2'500'000'000, -3, 500'000'000}};
-    for (const auto& row : kRows) {
-        clock.step(row.deltaNs);
+    for (const auto& [deltaNs, seconds, nanoseconds] : {std::tuple<int64_t, long, long>{1, 0, 1},
+                                                        {-1, -1, 999'999'999},
+                                                        {-kSecond, -1, 0},
+                                                        {kSecond, 1, 0},
+                                                        {2'500'000'000, 2, 500'000'000},
+                                                        {-2'500'000'000, -3, 500'000'000}}) {
+        clock.step(deltaNs);
         const timex& request = kernel.requests.back();
         EXPECT_EQ(unsigned{ADJ_SETOFFSET | ADJ_NANO}, request.modes);
-        EXPECT_EQ(row.seconds, request.time.tv_sec) << row.deltaNs;
-        EXPECT_EQ(row.nanoseconds, request.time.tv_usec) << row.deltaNs;
+        EXPECT_EQ(seconds, request.time.tv_sec) << deltaNs;
+        EXPECT_EQ(nanoseconds, request.time.tv_usec) << deltaNs;
     }
 }
 

@@ -66,9 +66,9 @@ tOutcome runWith(std::vector<std::string> words)
 {
     given = {};
     words.insert(words.begin(), "dravik-host");
-    std::vector<char*> arguments;
-    for (std::string& word : words)
-        arguments.push_back(word.data());
+    std::vector<char*> arguments(words.size());
+    std::transform(words.begin(), words.end(), arguments.begin(),
+                   [](std::string& word) { return word.data(); });
     testing::internal::CaptureStdout();
     testing::internal::CaptureStderr();
     const int status = runCommandLine(static_cast<int>(words.size()), arguments.data(),
@@ -121,8 +121,7 @@ TEST(CommandLine, refusesWhatIsWrong)
         {2, "--parsed: 0 is refused", {"probe", "a", "-p", "0"}},
         {2, "not both", {"probe", "a", "--whole", "1s", "--share", "100%"}},
         {1, "it failed", {"probe", "a", "--flag", "-a", "fail"}},
-        {3, "a limit", {"probe", "a", "--flag", "-a", "limit"}},
-    };
+        {3, "a limit", {"probe", "a", "--flag", "-a", "limit"}}};
     for (const auto& row : kRows) {
         const tOutcome found = runWith(row.words);
         const std::string line = row.status == 0 ? "" : std::string("dravik-host: ") + row.why;

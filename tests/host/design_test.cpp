@@ -9,25 +9,11 @@
 #include "host/stepFixture.h"
 #include "maths/tNoise.h"
 
-#include <fmt/format.h>
-
-#include <cmath>
 #include <complex>
-#include <stdexcept>
 
 using namespace dravikHost;
 
 namespace {
-
-tServoParameters law(double g, double a, double b = 1, double c = 1)
-{
-    tServoParameters parameters;
-    parameters.phaseLockGain = g;
-    parameters.phaseLockCoefficientA = a;
-    parameters.phaseLockCoefficientB = b;
-    parameters.phaseLockCoefficientC = c;
-    return parameters;
-}
 
 tNoiseModel noiseOf(double interval, double noiseNs, double frequencyNoisePpb, double wanderPpb)
 {
@@ -51,8 +37,7 @@ TEST(LoopAnalysis, agreesWithClosedForms)
         {"real poles", law(0.1, 1.01), 1, 1.62289299, 411.574568, 0.07048957, 0.24119122},
         {"deadbeat", law(1, 2), 1, 0, 2, 1, 2.23606798},
         {"alternating", law(0.6, 1.2), 2, 0, 43.1107870, 0.44, 1.49509000},
-        {"one pole", law(0.5, 1, 0, 0), 1, 0, 6.6438562, 0, 0.57735027},
-    };
+        {"one pole", law(0.5, 1, 0, 0), 1, 0, 6.6438562, 0, 0.57735027}};
     for (const auto& row : kRows) {
         const tLoopAnalysis found(row.parameters, row.interval);
         SCOPED_TRACE(row.name);
@@ -70,16 +55,14 @@ TEST(LoopAnalysis, knowsWhereStabilityEnds)
         tServoParameters parameters;
         double below; // s; 0: none is told
         double stable, unstable;
+        // clang-format off
     } kRows[] = {
-        {law(0.55, 2), 80 / 33.0, 2.42, 2.43},
-        {law(0.1, 1.2, 0.8), 20, 19.9, 20.1},
-        {law(1, 1, 1), 0, 0, 1}, // a double pole at 1
-        {law(1, 0.5, 1), 0, 0, 0.001},
-        {law(1, 2, -1), 0, 0, 0.001},
-        {law(1, -2, -3), 0, 0, 0.001},
-        {law(1, 1, 0.5, 0.5), 0, 1.99, 2.01}, // where s = -1 - p
-        {law(1, 0, -1, 0.5), 0, 0.49, 0.5},   // where p = 1
-    };
+        {law(0.55, 2), 80 / 33.0, 2.42, 2.43}, {law(0.1, 1.2, 0.8), 20, 19.9, 20.1},
+        {law(1, 1, 1), 0, 0, 1 /* a double pole at 1 */}, {law(1, 0.5, 1), 0, 0, 0.001},
+        {law(1, 2, -1), 0, 0, 0.001}, {law(1, -2, -3), 0, 0, 0.001},
+        {law(1, 1, 0.5, 0.5), 0, 1.99, 2.01 /* where s = -1 - p */},
+        {law(1, 0, -1, 0.5), 0, 0.49, 0.5 /* where p = 1 */}};
+    // clang-format on
     for (const auto& row : kRows) {
         const tLoopAnalysis outside(row.parameters, row.unstable);
         EXPECT_FALSE(outside.stable) << row.unstable;
@@ -93,24 +76,19 @@ TEST(LoopAnalysis, knowsWhereStabilityEnds)
 
 TEST(LoopGains, becomeALaw)
 {
-    const struct {
-        tLoopGains gains;
-        double g, a, b;
-    } kRows[] = {
-        {{0.7, 0.3}, 0.7, 1 / 0.7, 1},
-        {{0.01, 0.99}, 0.1, 10, 0.1}, // A at its bound
-        {{20, 5}, 10, 2.5, 2},        // the gain at its bound
-        {{60, 40}, 10, 10, 6},
-    };
     tServoParameters parameters = law(1, 1, 1, 0);
-    for (const auto& row : kRows) {
-        row.gains.putInto(parameters);
-        EXPECT_DOUBLE_EQ(row.g, parameters.phaseLockGain);
-        EXPECT_DOUBLE_EQ(row.a, parameters.phaseLockCoefficientA);
-        EXPECT_DOUBLE_EQ(row.b, parameters.phaseLockCoefficientB);
+    for (const auto& [gains, g, a, b] :
+         {std::tuple<tLoopGains, double, double, double>{{0.7, 0.3}, 0.7, 1 / 0.7, 1},
+          {{0.01, 0.99}, 0.1, 10, 0.1}, // A at its bound
+          {{20, 5}, 10, 2.5, 2},        // the gain at its bound
+          {{60, 40}, 10, 10, 6}}) {
+        gains.putInto(parameters);
+        EXPECT_DOUBLE_EQ(g, parameters.phaseLockGain);
+        EXPECT_DOUBLE_EQ(a, parameters.phaseLockCoefficientA);
+        EXPECT_DOUBLE_EQ(b, parameters.phaseLockCoefficientB);
         EXPECT_EQ(1, parameters.phaseLockCoefficientC);
-        EXPECT_NEAR(row.gains.kp, tLoopGains::of(parameters).kp, 1e-12);
-        EXPECT_NEAR(row.gains.ki, tLoopGains::of(parameters).ki, 1e-12);
+        EXPECT_NEAR(gains.kp, tLoopGains::of(parameters).kp, 1e-12);
+        EXPECT_NEAR(gains.ki, tLoopGains::of(parameters).ki, 1e-12);
     }
     EXPECT_TRUE((tLoopGains{60, 40}).fit());
     EXPECT_FALSE((tLoopGains{60, 40.1}).fit());
@@ -214,13 +192,11 @@ TEST(NoiseEstimate, findsWhatWasPutIn)
     const struct {
         tNoiseModel model;
         double frequencyWithin, wanderWithin;
-    } kRows[] = {
-        {{2'000'000'000, 50, 0, 1, 0, 0}, 5, 0.2},
-        {{1'000'000'000, 20, 20, 1, 0, 0}, 2, 0.3},
-        {{1'000'000'000, 50, 0, 1, 0.02, 3000}, 5, 0.25},
-    };
+    } kRows[] = {{{2'000'000'000, 50, 0, 1, 0, 0}, 5, 0.2},
+                 {{1'000'000'000, 20, 20, 1, 0, 0}, 2, 0.3},
+                 {{1'000'000'000, 50, 0, 1, 0.02, 3000}, 5, 0.25}};
     for (const auto& row : kRows) {
-        const tNoiseModel found = estimateNoise(simulated(row.model, 5000));
+        const tNoiseEstimate found = estimateNoise(simulated(row.model, 5000));
         SCOPED_TRACE(testing::Message() << "row " << &row - kRows);
         EXPECT_EQ(row.model.intervalNs, found.intervalNs);
         EXPECT_NEAR(row.model.noiseNs, found.noiseNs, 2);

@@ -1,9 +1,6 @@
 #include "clocks/tSteeredClock.h"
 #include "host/stepFixture.h"
 #include "servo/tFineServo.h"
-#include "support/failureOf.h"
-
-#include <cmath>
 
 using namespace dravikHost;
 
@@ -125,22 +122,18 @@ TEST(FineServo, filtersSpikesAsTheServoItself)
 
 TEST(FineServo, knowsItsLimits)
 {
-    const struct {
-        double offPpb;
-        tLockEvent event;
-        double orderedPpb;
-    } kRows[] = {{-90, kFrequencyMeasured, 90},
-                 {-100, kFrequencyMeasured, 100 - 1.0 / 64},
-                 {-102, kFrequencyAtLimit, 100},
-                 {5e6, kFrequencyAtLimit, -100}};
-    for (const auto& row : kRows) {
-        tBeside beside(64, kStartNs, row.offPpb, 100);
+    for (const auto& [offPpb, event, orderedPpb] :
+         {std::tuple<double, tLockEvent, double>{-90, kFrequencyMeasured, 90},
+          {-100, kFrequencyMeasured, 100 - 1.0 / 64},
+          {-102, kFrequencyAtLimit, 100},
+          {5e6, kFrequencyAtLimit, -100}}) {
+        tBeside beside(64, kStartNs, offPpb, 100);
         for (int i = 0; i < 3; ++i) { // over and over
             beside.servo.clearHistory();
             beside.clock.setOffsetPpb(0);
             EXPECT_EQ(kNothingNew, beside.next());
-            EXPECT_EQ(row.event, beside.next()) << row.offPpb;
-            EXPECT_EQ(row.orderedPpb, beside.ordered());
+            EXPECT_EQ(event, beside.next()) << offPpb;
+            EXPECT_EQ(orderedPpb, beside.ordered());
         }
     }
     tServoParameters parameters;

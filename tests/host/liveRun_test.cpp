@@ -62,8 +62,7 @@ const tPolicyRow kPolicies[] = {
     {"C...", "5 the clock leapt by -300 ms against CLOCK_MONOTONIC_RAW: measuring anew\n"
              "6 measured\n7 stepped\n8 locked\n"},
     {"d....", "5 lost\n7 measured\n8 stepped\n9 locked\n"}, // its own step is nobody's leap
-    {".H..", "6 documents read again\n"},
-};
+    {".H..", "6 documents read again\n"}};
 
 TEST(LiveRun, hasAPolicyForWhatGoesWrong)
 {
@@ -96,8 +95,7 @@ TEST(LiveRun, showsHowLongTheSilenceIs)
 
 struct tGuardRow {
     std::optional<int64_t> maxStepNs;
-    bool noStepAfterLock;
-    bool dryRun;
+    bool noStepAfterLock, dryRun;
     const char* script;
     const char* refusal; // null if none
     int orders;          // that were made or tried

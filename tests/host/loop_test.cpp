@@ -1,6 +1,5 @@
 #include "clocks/tSteeredClock.h"
 #include "host/scene.h"
-#include "host/stepFixture.h"
 #include "loop/tDiscipline.h"
 #include "loop/tHoldoverEstimate.h"
 #include "loop/tMeanOrders.h"
@@ -22,7 +21,7 @@ void lockFor(int pairs, tHoldoverEstimate& estimate, double deviationPpb = 4)
 {
     for (int i = 0; i < pairs; ++i) {
         const int sign = i % 2 == 0 ? 1 : -1;
-        estimate.add(stepAt(i, 30 * sign, true, 5000 + deviationPpb * sign));
+        estimate.add(stepAt(i, int64_t{30} * sign, true, 5000 + deviationPpb * sign));
     }
 }
 

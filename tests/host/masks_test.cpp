@@ -4,6 +4,7 @@
 #include "metrics/masks.h"
 #include "metrics/stability.h"
 
+#include <fmt/format.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -117,16 +118,15 @@ const std::map<std::string, tLimits> kMasks = {
     {"g8273.2-a", ofClass(100, 50, 40, 4, 70)}, {"g8273.2-b", ofClass(70, 20, 40, 4, 70)},
     {"g8273.2-c", ofClass(30, 10, 10, 2, 30)},  {"g8273.2-d", {{&kLow, 5}}},
     {"g8273.3-a", ofClass(100, 50, 40, 4, 70)}, {"g8273.3-b", ofClass(70, 20, 40, 4, 70)},
-    {"802.1as", {{&kTe, 1000}, {&kSlope, 5}}},
-};
+    {"802.1as", {{&kTe, 1000}, {&kSlope, 5}}}};
 
 TEST(Masks, holdJustInsideAndBreakJustOutside)
 {
     EXPECT_EQ(kMasks.size(), maskNames().size());
     for (const std::string& name : maskNames()) {
         for (const auto& [limit, ns] : kMasks.at(name)) {
-            const std::string title = limit->before + std::to_string(ns) + " ns" + limit->after;
-            SCOPED_TRACE(name + " " + title);
+            const std::string title = fmt::format("{}{} ns{}", limit->before, ns, limit->after);
+            SCOPED_TRACE(testing::Message() << name << " " << title);
             const auto inside = checkMask(name, limit->shape(0.99 * ns));
             const auto outside = checkMask(name, limit->shape(1.01 * ns));
             EXPECT_EQ(tMaskLine::kHeld, lineOf(inside, title).verdict);
@@ -157,8 +157,7 @@ TEST(Masks, areNotJudgedOnTooFewData)
          "0 ns at 1 s; needs 3000 s of data, has 2999 s"},
         {"802.1as", "TDEV 5 ns per s of tau up to 10 s, free-running clock", 30,
          "0 ns at 1 s; needs 30 s of data, has 29 s"},
-        {"802.1as", "TDEV 5 ns per s of tau up to 10 s, free-running clock", 3, "too few points"},
-    };
+        {"802.1as", "TDEV 5 ns per s of tau up to 10 s, free-running clock", 3, "too few points"}};
     const auto flat = [](double interval, size_t points) {
         return shaped(interval, points, [](double) { return 1; });
     };

@@ -1,9 +1,11 @@
 #include "maths/chainGains.h"
 #include "maths/median.h"
 #include "maths/patternSearch.h"
+#include "maths/tFlicker.h"
 #include "maths/tKalmanFilter.h"
 #include "maths/tNoise.h"
 
+#include <fmt/format.h>
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -24,6 +26,19 @@ TEST(Noise, isTheSameEverywhere)
     for (const double value : {-0x1.42c3b2b72217p-5, -0x1.8c1da014dda08p-2, -0x1.fdd85e535a47ap-3,
                                0x1.5fa75918ca312p-1, -0x1.bfaac17196979p-5, -0x1.971d689089fdcp-1})
         EXPECT_EQ(value, normal.normal());
+}
+
+TEST(Flicker, isTheSameEverywhere)
+{
+    tFlicker flicker(tNoise(3));
+    EXPECT_EQ(0, flicker.withAllan(0));
+    std::string found;
+    for (int i = 0; i < 3; ++i) {
+        found += fmt::format("{:.10g} ", flicker.withAllan(1));
+        found += fmt::format("{:.10g} ", flicker.withTime(2));
+    }
+    EXPECT_EQ("-0.6109220165 0.179705789 1.984746914 3.888489139 -2.288139017 -2.603923496 ",
+              found);
 }
 
 TEST(KalmanFilter, doesWhatIsWorkedOutByHand)

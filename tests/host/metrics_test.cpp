@@ -5,9 +5,6 @@
 #include "metrics/stability.h"
 #include "metrics/tMeasured.h"
 
-#include <cmath>
-#include <stdexcept>
-
 using namespace dravikHost;
 
 namespace {
@@ -30,11 +27,9 @@ TEST(Stability, isThatPublished)
     const struct {
         size_t n;
         double adev, oadev, mdev, tdev;
-    } kDeviations[] = {
-        {1, 2.922319e-01, 2.922319e-01, 2.922319e-01, 1.687202e-01},
-        {10, 9.965736e-02, 9.159953e-02, 6.172376e-02, 3.563623e-01},
-        {100, 3.897804e-02, 3.241343e-02, 2.170921e-02, 1.253382e+00},
-    };
+    } kDeviations[] = {{1, 2.922319e-01, 2.922319e-01, 2.922319e-01, 1.687202e-01},
+                       {10, 9.965736e-02, 9.159953e-02, 6.172376e-02, 3.563623e-01},
+                       {100, 3.897804e-02, 3.241343e-02, 2.170921e-02, 1.253382e+00}};
     for (const auto& row : kDeviations) {
         const tStability found = stabilityAt(phase, row.n);
         EXPECT_NEAR(row.adev, *found.adev, 1e-6 * row.adev) << row.n;
@@ -129,8 +124,7 @@ TEST(Measured, isWhatIsSelected)
         {"all", {true, s(0), {}}, "measured error", 0, 11, 10, 6, 1204, 5000500, 5000, 5040},
         {"a part", {true, s(3), s(9)}, "measured error", 3, 9, 5, 3, -2, 740, 40, 80},
         {"below zero", {true, s(3), s(5)}, "measured error", 3, 5, 3, 3, -10, 1700 / 3.0, 40, 50},
-        {"one point", {true, s(8), s(8)}, "measured error", 8, 8, 1, 0, -20, 400, 20, 0},
-    };
+        {"one point", {true, s(8), s(8)}, "measured error", 8, 8, 1, 0, -20, 400, 20, 0}};
     for (const auto& row : kRows) {
         const tMeasured found = measure(kTrace, row.selection);
         SCOPED_TRACE(row.name);
@@ -172,11 +166,9 @@ TEST(Measured, hasTheLongestStretchWithoutAGap)
         std::vector<double> seconds;
         double first, interval;
         size_t points;
-    } kRows[] = {
-        {{0, 1.5, 2.5, 3.5, 5.01, 6.01}, 0, 3.5 / 3, 4},
-        {{0, 1, 2.51, 3.01, 4.01}, 2.51, 0.75, 3},
-        {{0, 1, 2, 2.49, 3.49, 4.49}, 0, 1, 3},
-    };
+    } kRows[] = {{{0, 1.5, 2.5, 3.5, 5.01, 6.01}, 0, 3.5 / 3, 4},
+                 {{0, 1, 2.51, 3.01, 4.01}, 2.51, 0.75, 3},
+                 {{0, 1, 2, 2.49, 3.49, 4.49}, 0, 1, 3}};
     for (const auto& row : kRows) {
         std::vector<tPoint> points;
         for (const double at : row.seconds)
@@ -220,27 +212,20 @@ TEST(Figures, haveNamesAndTaus)
         const char* figure;
         bool isTime;
         std::optional<double> value;
+        // clang-format off
     } kRows[] = {
-        {"rms", true, std::sqrt(25.5) * 1e-9},
-        {"peak", true, 8e-9},
-        {"peak-to-peak", true, 14e-9},
-        {"mean", true, 1.5e-9},
-        {"time-to-lock", true, 2},
-        {"locks-lost", false, 1},
-        {"adev(10s)", false, 0.09965736},
-        {"oadev(10s)", false, 0.09159953},
-        {"mdev(10s)", false, 0.06172376},
-        {"tdev(10s)", true, 0.3563623},
-        {"tdev(10.009s)", true, 0.3563623}, // as moments may be rounded
+        {"rms", true, std::sqrt(25.5) * 1e-9}, {"peak", true, 8e-9}, {"peak-to-peak", true, 14e-9},
+        {"mean", true, 1.5e-9}, {"time-to-lock", true, 2}, {"locks-lost", false, 1},
+        {"adev(10s)", false, 0.09965736}, {"oadev(10s)", false, 0.09159953},
+        {"mdev(10s)", false, 0.06172376}, {"tdev(10s)", true, 0.3563623},
+        {"tdev(10.009s)", true, 0.3563623 /* as moments may be rounded */},
         {"tdev(10.011s)", true, kNone},
         {"tdev(300.24s)", true, stabilityAt(measured.series, 300).tdev},
-        {"tdev(300.26s)", true, kNone},
-        {"tdev(400us)", true, kNone},
+        {"tdev(300.26s)", true, kNone}, {"tdev(400us)", true, kNone},
         {"mtie(1000s)", true, stabilityAt(measured.series, 1000).mtie},
-        {"mtie(1001s)", true, kNone},
-        {"mtie(4294967306s)", true, kNone},
-        {"adev(501s)", false, kNone},
-    };
+        {"mtie(1001s)", true, kNone}, {"mtie(4294967306s)", true, kNone},
+        {"adev(501s)", false, kNone}};
+    // clang-format on
     for (const auto& row : kRows) {
         const tFigure figure = parseFigure(row.figure);
         EXPECT_EQ(row.isTime, figure.isTime) << row.figure;
@@ -262,22 +247,18 @@ TEST(Figures, haveNamesAndTaus)
 TEST(Assertions, holdOrTellWhatWasFound)
 {
     const tMeasured measured = measure(kTrace, {});
+    // clang-format off
     const std::pair<const char*, const char*> kRows[] = {
-        {"peak<=8ns", ""},
-        {"peak>=8ns", ""},
-        {"peak<8ns", " does not hold: it is 8 ns"},
-        {"peak>8ns", " does not hold: it is 8 ns"},
-        {"peak<9ns", ""},
-        {"peak<=7ns", " does not hold: it is 8 ns"},
-        {"peak>=9ns", " does not hold: it is 8 ns"},
-        {"mean>1ns", ""},
-        {"locks-lost<1", " does not hold: it is 1"},
-        {"mtie(1s)<=7ns", ""},
-        {"adev(9s)<1", " cannot be computed from these data"},
-    };
-    for (const auto& [text, failure] : kRows)
+        {"peak<=8ns", ""}, {"peak>=8ns", ""}, {"peak<8ns", " does not hold: it is 8 ns"},
+        {"peak>8ns", " does not hold: it is 8 ns"}, {"peak<9ns", ""},
+        {"peak<=7ns", " does not hold: it is 8 ns"}, {"peak>=9ns", " does not hold: it is 8 ns"},
+        {"mean>1ns", ""}, {"locks-lost<1", " does not hold: it is 1"}, {"mtie(1s)<=7ns", ""},
+        {"adev(9s)<1", " cannot be computed from these data"}};
+    // clang-format on
+    for (const auto& [text, failure] : kRows) {
         EXPECT_EQ(*failure == '\0' ? "" : text + std::string(failure),
                   tAssertion(text).failure(measured));
+    }
     for (const char* const text : {"rms", "rms<20", "rms<", "rmse<1ns", "adev(1s)<1ns", "=1"})
         EXPECT_THROW(tAssertion{text}, std::invalid_argument) << text;
 }

@@ -52,49 +52,47 @@ void expectScript(const std::string& script, const std::vector<const char*>& pie
 
 TEST(Plot, hasAllItsPanels)
 {
-    expectScript(
-        plotScript(steered(), {"it's.svg", "802.1as"}),
-        {"set terminal svg dynamic size 1100,1000 ",
-         "set output 'it''s.svg'\n",
-         "$pairs << END\n"
-         "0 5000 -500000 1\n1 30 3000 0\n2 -40 -4000 0\n3 20 2000 0\n4 -10 -1000 0\n5 50 nan 0\n"
-         "END\n",
-         "set y2range [0:1]",
-         "set multiplot\nset size 1,0.333\nset origin 0,0.667\n",
-         "set ylabel 'phase error, ns'\nset yrange [-49:59]\n",
-         "'cut off: 1 of 6 points, at 0 s, up to 5 µs' at graph",
-         "set xlabel 'time, s'\nset title 'Phase error, it''s.csv'\n",
-         "plot $pairs using 1:4 axes x1y2 with fillsteps ",
-         "title 'not locked', \\\n    '' using 1:($2/1) with lines",
-         "'clock - reference, as measured'\nunset nonlinear y\nset yrange [*:*]",
-         "set origin 0,0.333\n",
-         "set yrange [-4.7:3.7]\n",
-         "'cut off: 1 of 6 points, at 0 s, down to -500 ppm' at graph",
-         "set title 'Frequency'",
-         "ppm'",
-         "plot $pairs using 1:4 axes x1y2 with fillsteps",
-         "'' using 1:($3/1000) with steps",
-         "'offset ordered'\nset yrange [*:*]",
-         "$stability << END\n1 ",
-         "2 ",
-         "END\n",
-         "set logscale xy",
-         "set xrange [0.909:10]",
-         "set origin 0,0.000\nset size 0.5,0.333\n",
-         "'Stability of the phase, mask 802.1as'",
-         "plot $stability using 1:2",
-         "title 'TDEV'",
-         "'' using 1:3",
-         "title 'MTIE'",
-         "[0.05:10] 0.25*(x/0.05)**1 with lines",
-         "'limit of TDEV, free-running clock'",
-         "set origin 0.5,0.000\nset size 0.5,0.333\n",
-         "'Stability of the frequency'",
-         "plot $stability using 1:4",
-         "title 'ADEV'",
-         "'' using 1:5",
-         "title 'MDEV'\nunset multiplot\n"},
-        4);
+    expectScript(plotScript(steered(), {"it's.svg", "802.1as"}),
+                 {"set terminal svg dynamic size 1100,1000 ",
+                  "set output 'it''s.svg'\n",
+                  "$pairs << END\n0 5000 -500000 1\n1 30 3000 0\n2 -40 -4000 0\n3 20 2000 0\n",
+                  "4 -10 -1000 0\n5 50 nan 0\nEND\n",
+                  "set y2range [0:1]",
+                  "set multiplot\nset size 1,0.333\nset origin 0,0.667\n",
+                  "set ylabel 'phase error, ns'\nset yrange [-49:59]\n",
+                  "'cut off: 1 of 6 points, at 0 s, up to 5 µs' at graph",
+                  "set xlabel 'time, s'\nset title 'Phase error, it''s.csv'\n",
+                  "plot $pairs using 1:4 axes x1y2 with fillsteps ",
+                  "title 'not locked', \\\n    '' using 1:($2/1) with lines",
+                  "'clock - reference, as measured'\nunset nonlinear y\nset yrange [*:*]",
+                  "set origin 0,0.333\n",
+                  "set yrange [-4.7:3.7]\n",
+                  "'cut off: 1 of 6 points, at 0 s, down to -500 ppm' at graph",
+                  "set title 'Frequency'",
+                  "ppm'",
+                  "plot $pairs using 1:4 axes x1y2 with fillsteps",
+                  "'' using 1:($3/1000) with steps",
+                  "'offset ordered'\nset yrange [*:*]",
+                  "$stability << END\n1 ",
+                  "2 ",
+                  "END\n",
+                  "set logscale xy",
+                  "set xrange [0.909:10]",
+                  "set origin 0,0.000\nset size 0.5,0.333\n",
+                  "'Stability of the phase, mask 802.1as'",
+                  "plot $stability using 1:2",
+                  "title 'TDEV'",
+                  "'' using 1:3",
+                  "title 'MTIE'",
+                  "[0.05:10] 0.25*(x/0.05)**1 with lines",
+                  "'limit of TDEV, free-running clock'",
+                  "set origin 0.5,0.000\nset size 0.5,0.333\n",
+                  "'Stability of the frequency'",
+                  "plot $stability using 1:4",
+                  "title 'ADEV'",
+                  "'' using 1:5",
+                  "title 'MDEV'\nunset multiplot\n"},
+                 4);
 }
 
 // What an axis of errors is like; the first error is that of the start.
@@ -122,24 +120,23 @@ TEST(Plot, fitsTheAxisToWhatComesAfterTheStart)
          "phase error, s'\nset yrange [36.9999999996:37.0000000044]"},
         {"two decades",
          {-1e6, 20, 20, 20, -900, 20},
-         wide + ", \"20 ns\" 20, \"-20 ns\" -20, \"50 ns\" 50, \"-50 ns\" -50, \"100 ns\" 100, "
-                "\"-100 ns\" -100, "
-                "\"200 ns\" 200, \"-200 ns\" -200, \"500 ns\" 500, \"-500 ns\" -500, \"1 µs\" "
-                "1000, \"-1 µs\" -1000)\n"
-                "set ylabel \"phase error, linear\\nwithin ±20 ns\"\nset yrange [-1000:1000]\n"
-                "set label 1 'cut off: 1 of 6 points, at 0 s, down to -1 ms'"},
-        {"more decades",
-         {1e6, 1e5, 20, 20, 20, 20, 20, 20, 20, -9e4},
          wide +
-             ", \"100 ns\" 100, \"-100 ns\" -100, \"1 µs\" 1000, \"-1 µs\" -1000, \"10 µs\" 10000, "
-             "\"-10 µs\" -10000, \"100 µs\" 100000, \"-100 µs\" -100000)\n"},
+             ", \"20 ns\" 20, \"-20 ns\" -20, \"50 ns\" 50, \"-50 ns\" -50, \"100 ns\" 100, \"-100 "
+             "ns\" -100, \"200 ns\" 200, \"-200 ns\" -200, \"500 ns\" 500, \"-500 ns\" -500, \"1 "
+             "µs\" 1000, \"-1 µs\" -1000)\nset ylabel \"phase error, linear\\nwithin ±20 ns\"\nset "
+             "yrange [-1000:1000]\nset label 1 'cut off: 1 of 6 points, at 0 s, down to -1 ms'"},
+        {"more decades",
+         {1e6, 1e5, 20, 20, 20, 20, 20, 20, 20, -1e5},
+         wide + ", \"100 ns\" 100, \"-100 ns\" -100, \"1 µs\" 1000, \"-1 µs\" -1000, \"10 µs\" "
+                "10000, \"-10 µs\" -10000, \"100 µs\" 100000, \"-100 µs\" -100000)\nset ylabel "
+                "\"phase error, linear\\nwithin ±20 ns\"\nset yrange [-100000:100000]\nset label 1 "
+                "'cut off: 1 of 10 points, at 0 s, up to 1 ms'"},
         {"cut off twice",
          {1e6, 1e5, 20, 20, 20, 20, 20, 20, 20, 20},
          "'cut off: 2 of 10 points, from 0 s to 1 s, up to 1 ms'"},
         {"a start of half the trace",
          {1e6, 1e5, 20, 20, 20},
-         "set yrange [-1000000:1000000]\nset label 1 ''"},
-    };
+         "set yrange [-1000000:1000000]\nset label 1 ''"}};
     for (const auto& row : kRows) {
         const std::string script = plotScript(recordingOf(row.errorsNs), {"a.png", ""});
         EXPECT_NE(std::string::npos, script.find(row.axis)) << row.name << "\n" << script;
@@ -148,17 +145,14 @@ TEST(Plot, fitsTheAxisToWhatComesAfterTheStart)
 
 TEST(Plot, measuresLongTracesInHoursAndDays)
 {
-    const struct {
-        int64_t seconds;
-        const char *axis, *last;
-    } kRows[] = {{17'999, "'time, s'", "\n17999 2 "},
-                 {18'000, "'time, h'", "\n5 2 "},
-                 {431'999, "'time, h'", "\n119.999722 2 "},
-                 {432'000, "'time, d'", "\n5 2 "}};
-    for (const auto& row : kRows) {
+    for (const auto& [seconds, axis, last] :
+         {std::tuple<int64_t, const char*, const char*>{17'999, "'time, s'", "\n17999 2 "},
+          {18'000, "'time, h'", "\n5 2 "},
+          {431'999, "'time, h'", "\n119.999722 2 "},
+          {432'000, "'time, d'", "\n5 2 "}}) {
         tRecording recording = recordingOf({1, 2});
-        recording.pairs.back().elapsedNs = row.seconds * 1'000'000'000;
-        expectScript(plotScript(recording, {"a.png", ""}), {row.last, row.axis}, 1);
+        recording.pairs.back().elapsedNs = seconds * 1'000'000'000;
+        expectScript(plotScript(recording, {"a.png", ""}), {last, axis}, 1);
     }
 }
 

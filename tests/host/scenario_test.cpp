@@ -4,6 +4,7 @@
 #include "support/failureOf.h"
 #include "text/quantity.h"
 
+#include <fmt/format.h>
 #include <gtest/gtest.h>
 
 #include <cmath>
@@ -108,8 +109,7 @@ TEST(Scenario, doesWhatItsStatementsSay)
         {"clock white=64ppb\nat 1ns clock white=8ppb", adev64, 1, 0.15},
         {"clock wander=10ppb", adev64, 46.2, 7}, // root of 64 / 3
         {"clock flicker=10ppb", adev1, 10, 0.8},
-        {"clock flicker=10ppb", adev64, 10, 1.5},
-    };
+        {"clock flicker=10ppb", adev64, 10, 1.5}};
     for (const auto& row : kRows)
         EXPECT_NEAR(row.expected, row.figure(pairsOf(row.text)), row.tolerance) << row.text;
 }
@@ -126,28 +126,80 @@ TEST(Scenario, leavesTheNoiseOfOneCauseAloneWhenItChangesAnother)
     }
 }
 
-TEST(Scenario, isRefusedByNameAndLine)
+// On every machine: errors as measured, in ns, and true ones.
+TEST(Scenario, isTheSameEverywhere)
+{
+    const tPairs pairs = pairsOf(
+        "clock offset=-3ms frequency=12ppm white=3ppb wander=2ppb flicker=4ppb ramp=-1ppb\n"
+        "clock sine=50ppb period=700s\nreference noise=50ns flicker=7ns delay=9ns size=1us\n"
+        "reference delayed=5% outliers=3% granularity=8ns missing=2%\n"
+        "at 300s jump -5us\nat 400s clock frequency=3ppb\nat 2000s reference noise=0ns\n");
+    std::string found;
+    for (const size_t at : {0, 1, 2, 20, 200, 350, 500, 1999, 3000})
+        found += fmt::format("{} {:.9g}; ", pairs.at(at).errorNs(), *pairs.at(at).trueErrorNs);
+    EXPECT_EQ("-2999992 -3000000; -2987976 -2987992.54; -2976032 -2975987.25; -2723224 "
+              "-2724231.55; -566416 -566397.881; 1209728 1209743.03; 2957328 2957405.42; 19391512 "
+              "19391490.6; 29014048 29014010.1; ",
+              found);
+}
+
+TEST(Scenario, keepsEachQuantityWithinItsBounds)
 {
     const struct {
-        const char *text, *why;
-    } kRows[] = {
-        {"# fine\n\nclok offset=1s", "it:3: unknown statement 'clok'; did you mean clock?"},
-        {"clock", "it:1: lacks KEY=VALUE"},
-        {"clock white=1ppb wander", "it:1: 'wander' is no KEY=VALUE"},
-        {"reference wander=1ppb", "it:1: unknown key 'wander'"},
-        {"clock white=1s", "it:1: '1s' has an unknown unit 's'; use ppb or ppm"},
-        {"reference noise=-1ns", "it:1: noise: '-1ns' is out of range"},
-        {"reference missing=101%", "it:1: missing: '101%' is out of range"},
-        {"clock sine=1ppb", "it:1: sine lacks a period"},
-        {"at 5s silence\nat 4s resume", "it:2: is before the statement above it"},
-        {"at 5s silence\nclock white=1ppb", "it:2: comes after statements with a time"},
-        {"at 0 silence", "it:1: at: '0' is out of range"},
-        {"at 5s", "it:1: lacks what happens"},
-        {"at 5s explode", "it:1: unknown event 'explode'"},
-        {"at 5s silence 9s", "it:1: has '9s' too much"},
-    };
-    for (const auto& row : kRows)
-        EXPECT_EQ(row.why, failureOf([&] { pairsOf(row.text); })) << row.text;
+        const char *before, *below, *lowest, *highest, *above;
+    } kRows[] = {{"clock offset=", "-438300.1h", "-438300h", "438300h", "438300.1h"},
+                 {"clock frequency=", "-100001ppm", "-100000ppm", "100000ppm", "100001ppm"},
+                 {"clock white=", "-1e-9ppb", "0ppb", "1000ppm", "1001ppm"},
+                 {"clock wander=", "-1e-9ppb", "0ppb", "1000ppm", "1001ppm"},
+                 {"clock flicker=", "-1e-9ppb", "0ppb", "1000ppm", "1001ppm"},
+                 {"clock period=1s sine=", "-1e-9ppb", "0ppb", "1000ppm", "1001ppm"},
+                 {"clock period=", "0.9ns", "1ns", "438300h", "438300.1h"},
+                 {"clock ramp=", "-1001ppb", "-1000ppb", "1000ppb", "1001ppb"},
+                 {"reference interval=", "0.9ns", "1ns", "24h", "24.1h"},
+                 {"reference noise=", "-1e-9ns", "0ns", "24h", "24.1h"},
+                 {"reference flicker=", "-1e-9ns", "0ns", "24h", "24.1h"},
+                 {"reference outliers=", "-1e-9%", "0%", "100%", "101%"},
+                 {"reference delayed=", "-1e-9%", "0%", "100%", "101%"},
+                 {"reference size=", "-1e-9ns", "0ns", "24h", "24.1h"},
+                 {"reference delay=", "-1e-9ns", "0ns", "24h", "24.1h"},
+                 {"reference granularity=", "0.9ns", "1ns", "24h", "24.1h"},
+                 {"reference missing=", "-1e-9%", "0%", "100%", "101%"},
+                 {"at 1s jump ", "-24.1h", "-24h", "24h", "24.1h"},
+                 {"at 1ns silence\nat ", "0.9ns resume", "1ns resume", "438300h resume",
+                  "438300.1h resume"}};
+    for (const auto& row : kRows) {
+        for (const char* const value : {row.below, row.lowest, row.highest, row.above}) {
+            const std::string text = std::string(row.before) + value;
+            const bool within = value == row.lowest || value == row.highest;
+            const std::string why = failureOf([&] { parseScenario(text, "it", {}); });
+            EXPECT_EQ(within, why.empty()) << text << why;
+            EXPECT_EQ(within, why.find("out of range") == why.npos) << text << why;
+        }
+    }
+    const tScenarioStart start{{}, true};
+    EXPECT_EQ("it:1: interval: given by an option as well",
+              failureOf([&] { parseScenario("reference interval=1s", "it", start); }));
+}
+
+TEST(Scenario, isRefusedByNameAndLine)
+{
+    for (const auto& [text, why] :
+         {std::pair<const char*, const char*>{
+              "# fine\n\nclok offset=1s", "it:3: unknown statement 'clok'; did you mean clock?"},
+          {"clock", "it:1: lacks KEY=VALUE"},
+          {"clock white=1ppb wander", "it:1: 'wander' is no KEY=VALUE"},
+          {"reference wander=1ppb", "it:1: unknown key 'wander'"},
+          {"clock white=1s", "it:1: '1s' has an unknown unit 's'; use ppb or ppm"},
+          {"reference noise=-1ns", "it:1: noise: '-1ns' is out of range"},
+          {"reference missing=101%", "it:1: missing: '101%' is out of range"},
+          {"clock sine=1ppb", "it:1: sine lacks a period"},
+          {"at 5s silence\nat 4s resume", "it:2: is before the statement above it"},
+          {"at 5s silence\nclock white=1ppb", "it:2: comes after statements with a time"},
+          {"at 0 silence", "it:1: at: '0' is out of range"},
+          {"at 5s", "it:1: lacks what happens"},
+          {"at 5s explode", "it:1: unknown event 'explode'"},
+          {"at 5s silence 9s", "it:1: has '9s' too much"}})
+        EXPECT_EQ(why, failureOf([script = text] { pairsOf(script); })) << text;
 }
 
 TEST(SameBits, agreesWithTheCLibrary)

@@ -3,10 +3,8 @@
 #include "clocks/tSteeredClock.h"
 #include "host/stepFixture.h"
 #include "sources/iPairSource.h"
-#include "text/quantity.h"
 
 #include <csignal>
-#include <stdexcept>
 
 namespace dravikHost {
 
@@ -42,7 +40,7 @@ struct tScene : iPairSource {
         if (what == 'd') clock.tSteeredClock::step(-100'000'000); // within the limit of sanity
         if (what == 'C') clock.tSteeredClock::step(-300'000'000);
         if (what == 'R') pair.referenceNs += 300'000'000;
-        if (what == 'H') raise(SIGHUP);
+        if (what == 'H') (void)raise(SIGHUP);
         pair.elapsedNs += kSecondNs;
         pair.referenceNs += kSecondNs;
         pair.clockNs = clock.timeNs();

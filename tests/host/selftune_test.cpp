@@ -3,9 +3,7 @@
 #include "loop/tDiscipline.h"
 #include "maths/tNoise.h"
 #include "selftune/tClockEstimate.h"
-#include "text/quantity.h"
 
-#include <cmath>
 #include <functional>
 #include <memory>
 
@@ -18,6 +16,7 @@ struct tLoop {
     tClockEstimate estimate;
     tNoise noise{1};
     double seconds = 1; // from pair to pair
+    double stepNs = 1;  // of timestamps
     int64_t nowNs = 0;
     double phaseNs = 0, frequencyPpb = 0, orderedPpb = 0;
     int64_t pairs = 0;
@@ -29,7 +28,8 @@ struct tLoop {
         phaseNs += (frequencyPpb + orderedPpb) * seconds;
         frequencyPpb += walk * noise.normal();
         nowNs += nsOfSeconds(seconds);
-        const double measuredNs = std::round(phaseNs + noiseNs * noise.normal() + offNs);
+        const double measuredNs =
+            std::round((phaseNs + noiseNs * noise.normal() + offNs) / stepNs) * stepNs;
         const auto event = estimate.take(nowNs, static_cast<int64_t>(measuredNs), nullptr);
         if (++pairs < 3) return event;
         const double by = -estimate.frequencyPpb() - estimate.phaseNs() / estimate.secondsPerPair();
@@ -48,20 +48,32 @@ struct tLoop {
     }
 };
 
+// What is believed, the same on every machine: noise, wander, gain and error of the next pair.
+std::string figuresOf(const tBelief& belief)
+{
+    return fmt::format("{:.7g} {:.7g} {:.7g} {:.7g}", belief.noiseNs, belief.wanderPpb, belief.gain,
+                       belief.errorNs);
+}
+
 // The least errors that are possible are those of the filter that is told noise and wander.
 struct tQuality {
     const char* name;
-    double seconds, noiseNs, wanderPpb;
-    double leastNs;
+    double seconds, noiseNs, wanderPpb, leastNs;
+    const char *early, *late; // what is believed after 30 pairs, and after 1000
 };
 const tQuality kQualities[] = {
-    {"quiet", 1, 50, 1, 23.53},
-    {"loud", 1, 10'000, 1, 1193},
-    {"restless", 1, 50, 20, 60.12},
-    {"fast", 1.0 / 16, 15, 0.1, 1.81},
-    {"fast, restless", 0.125, 50, 20, 22.74},
-    {"slow", 16, 50, 1, 99.34},
-};
+    {"quiet", 1, 50, 1, 23.53, "51.57651 0.1414988 0.1278789 19.41032",
+     "56.64024 1.060834 0.1378785 22.84544"},
+    {"loud", 1, 10'000, 1, 1193, "9460.666 13.70385 0.1278062 3558.827",
+     "10937.34 1.99764 0.01628673 1409.776"},
+    {"restless", 1, 50, 20, 60.12, "174.1623 30.06402 0.3734047 143.6946",
+     "61.05101 15.2863 0.507507 62.03392"},
+    {"fast", 1.0 / 16, 15, 0.1, 1.81, "13.54339 1.330608 0.1278284 5.095314",
+     "16.44877 0.1975765 0.01666224 2.144923"},
+    {"fast, restless", 0.125, 50, 20, 22.74, "50.92785 2.881614 0.1278718 19.16522",
+     "55.90822 20.24604 0.137057 22.36147"},
+    {"slow", 16, 50, 1, 99.34, "166.851 1.110383 0.5726088 194.7614",
+     "65.00307 0.9935306 0.7532027 113.5405"}};
 
 TEST(SelfTuning, findsTheBestGainsWithoutBeingToldTheNoise)
 {
@@ -71,7 +83,10 @@ TEST(SelfTuning, findsTheBestGainsWithoutBeingToldTheNoise)
         loop.seconds = row.seconds;
         loop.frequencyPpb = 12'000;
         loop.phaseNs = 5000;
-        loop.rmsNs(1000, row.noiseNs, row.wanderPpb);
+        loop.rmsNs(30, row.noiseNs, row.wanderPpb);
+        EXPECT_EQ(row.early, figuresOf(loop.estimate.belief()));
+        loop.rmsNs(970, row.noiseNs, row.wanderPpb);
+        EXPECT_EQ(row.late, figuresOf(loop.estimate.belief()));
         EXPECT_NEAR(1, loop.rmsNs(20'000, row.noiseNs, row.wanderPpb) / row.leastNs, 0.12);
         const tBelief belief = loop.estimate.belief();
         EXPECT_NEAR(1, belief.noiseNs / row.noiseNs, 0.25);
@@ -86,21 +101,31 @@ struct tEventRow {
     std::function<double(int pair)> offNs; // of the measurements
     double frequencyPpb;                   // by which the oscillator changes
     const char* events;
+    const char* figures; // what is believed afterwards
 };
 const tEventRow kEvents[] = {
-    {"an outlier", [](int i) { return i == 1 ? -2000.0 : 0; }, 0, ".r......"},
-    {"a jump that stays", [](int) { return 10'000.0; }, 0, "rrrJ....."},
-    {"a jump that ends", [](int i) { return i < 7 ? -10'000.0 : 0; }, 0, "rrrJ...B....."},
+    {"an outlier", [](int i) { return i == 1 ? -2000.0 : 0; }, 0, ".r......",
+     "23.24676 0.08779863 0.07747087 6.816152"},
+    {"a jump that stays", [](int) { return 10'000.0; }, 0, "rrrJ.....",
+     "23.74019 0.09308312 0.1387324 9.03508"},
+    {"a jump that ends", [](int i) { return i < 7 ? -10'000.0 : 0; }, 0, "rrrJ...B.....",
+     "23.39664 0.08608279 0.1129649 8.102177"},
     {"two jumps that end", [](int i) { return i < 4   ? 3000.0
                                               : i < 9 ? 9000.0
                                                       : 0; }, 0,
-     "rrrJrrrJ.B...."},
-    {"another frequency", [](int) { return 0.0; }, 2000, "rrF......."},
+     "rrrJrrrJ.B....", "22.92199 0.1013091 0.1654206 9.512292"},
+    {"a jump, back and beyond", [](int i) { return i < 5   ? 3000.0
+                                                   : i < 8 ? 0
+                                                           : -3000; }, 0,
+     "rrrJ.B..rrrJ..", "22.74315 0.07597735 0.2481951 11.48989"},
+    {"another frequency", [](int) { return 0.0; }, 2000, "rrF.......",
+     "23.22624 0.1153363 0.3942563 18.1929"},
     {"a burst of delays", [](int i) { return i < 30 ? 3000.0 + 97 * ((i * i * 31) % 41) : 0; }, 0,
-     "rrrrrrrrrrrrrrrrrrrrrrrrrrrrrr........"},
+     "rrrrrrrrrrrrrrrrrrrrrrrrrrrrrr........", "23.22975 0.06381377 0.1392301 8.977841"},
     {"a louder noise", [](int i) { return i % 2 == 0 ? 700.0 + 31 * i : -900.0 - 17 * i; }, 0,
-     "rrrrrN........"},
-    {"a burst without an end", [](int i) { return 3000.0 + 97 * ((i * i * 31) % 41); }, 0, nullptr},
+     "rrrrrN........", "1050.53 0.1115727 0.0001021168 11.08765"},
+    {"a burst without an end", [](int i) { return 3000.0 + 97 * ((i * i * 31) % 41); }, 0, nullptr,
+     "1577.294 0.2643548 0.001905232 69.74164"},
 };
 
 TEST(SelfTuning, knowsWhatUnforeseenPairsMean)
@@ -116,6 +141,7 @@ TEST(SelfTuning, knowsWhatUnforeseenPairsMean)
         for (size_t i = 0; i < expected.size(); ++i)
             found += ".?rJBFNu"[loop.pair(20, 0.1, row.offNs(static_cast<int>(i)))];
         EXPECT_EQ(expected, found);
+        EXPECT_EQ(row.figures, figuresOf(loop.estimate.belief()));
     }
 }
 
@@ -133,6 +159,22 @@ TEST(SelfTuning, followsChangesOfNoiseAndWander)
     EXPECT_NEAR(20, loop.estimate.belief().wanderPpb, 10);
     loop.rmsNs(200, 50, 1);
     EXPECT_GT(3, loop.estimate.belief().wanderPpb);
+    EXPECT_EQ("51.42945 1.467063 0.2112091 26.61813", figuresOf(loop.estimate.belief()));
+}
+
+// Timestamps tell no less noise than their steps make.
+TEST(SelfTuning, knowsCoarseTimestamps)
+{
+    for (const auto& [stepNs, noiseNs, figures] :
+         {std::tuple(1, 0.0, "0.2886751 0.0001325111 0.06642 0.07636605"),
+          {100, 30, "38.11502 0.02040559 0.06868519 10.2658"},
+          {100, 60, "67.07465 0.1026348 0.08315373 20.08229"},
+          {1000, 300, "381.1502 0.2040559 0.06868519 102.658"}}) {
+        tLoop loop;
+        loop.stepNs = stepNs;
+        loop.rmsNs(60, noiseNs, 0);
+        EXPECT_EQ(figures, figuresOf(loop.estimate.belief())) << stepNs;
+    }
 }
 
 // The servo of the plug-in, self-tuned, on a clock 20 ppm fast and 3 ms ahead.
@@ -204,7 +246,15 @@ TEST(SelfTuning, acquiresHoldsAndFollows)
     EXPECT_EQ("----....", loop.events);
     EXPECT_EQ(2, loop.latest.steps);
     EXPECT_EQ(0, loop.latest.locksLost);
+    loop.events.clear();
+    loop.pass(-1); // the same moment again
+    loop.rmsNs(3);
+    EXPECT_EQ("-..", loop.events);
     EXPECT_GT(12, loop.rmsNs(300));
+    EXPECT_EQ("30.51886 0.001667181 0.01266518 3.452573", figuresOf(*loop.latest.belief));
+    const double rmsNs = loop.rmsNs(1);
+    EXPECT_EQ("2.50173578 -19999.5469",
+              fmt::format("{:.9g} {:.9g}", rmsNs, loop.clock.offsetPpb()));
 }
 
 TEST(SelfTuning, holdsAClockAThousandTimesASecond)
@@ -222,17 +272,20 @@ TEST(SelfTuning, coastsAtTheEstimatedRate)
     loop.rmsNs(100);
     loop.discipline->wait(loop.pair.elapsedNs); // the pair is due only now
     const double kicked = loop.clock.offsetPpb();
-    loop.pass(0.6);
+    loop.pass(0.5);
     loop.discipline->wait(loop.pair.elapsedNs);
     EXPECT_NE(kicked, loop.clock.offsetPpb());
     EXPECT_NEAR(-20'000, loop.clock.offsetPpb(), 1.5);
     const double coasting = loop.clock.offsetPpb();
-    loop.pass(300.4);
+    EXPECT_EQ("-20000.4375 -19999.6463", fmt::format("{:.9g} {:.9g}", kicked, coasting));
+    loop.pass(300.5);
     loop.discipline->wait(loop.pair.elapsedNs);
     EXPECT_EQ(coasting, loop.clock.offsetPpb());
     EXPECT_GT(500, std::fabs(loop.take()));
     EXPECT_GT(100, std::fabs(loop.take()));
     EXPECT_EQ(std::string::npos, loop.events.find('X'));
+    const double rmsNs = loop.rmsNs(5);
+    EXPECT_EQ("8.1546933 -20008.2656", fmt::format("{:.9g} {:.9g}", rmsNs, loop.clock.offsetPpb()));
 }
 
 // Whatever it is given it throws nothing, and orders what a clock can do.

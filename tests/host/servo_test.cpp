@@ -3,13 +3,9 @@
 #include "servo/configDocument.h"
 #include "servo/tLockObserver.h"
 #include "servo/tServoHost.h"
-#include "servo/tServoParameters.h"
 #include "servo/tStatus.h"
-#include "support/failureOf.h"
-#include "text/quantity.h"
 
 #include <map>
-#include <stdexcept>
 
 using namespace dravikHost;
 
@@ -21,8 +17,7 @@ const std::map<char, tHostCalls> kDeeds = {
     {'s', {{kGetTime, 5}, {kSetFrequency}}},  {'u', {{kSetFrequency, 0, 199}}},
     {'l', {{kSetFrequency, 0, -99}}},         {'U', {{kSetFrequency, 0, 200}}},
     {'L', {{kSetFrequency, 0, -100}}},        {'j', {{kGetTime, 5}, {kStepTime, 5}}},
-    {'b', {{kStepTime, 5}, {kSetFrequency}}}, {'-', {{kGetTime, 5}}},
-};
+    {'b', {{kStepTime, 5}, {kSetFrequency}}}, {'-', {{kGetTime, 5}}}};
 
 // Events by a letter each: nothing new (.), Measured, At the limit, Stepped, Not stepped, Gained,
 // missed (X), Lost.
@@ -83,11 +78,9 @@ TEST_F(ServoHost, notesWhatThePlugInDoesToTheClock)
     const struct {
         uint64_t referenceNs, clockNs;
         const char* calls;
-    } kPairs[] = {
-        {10'000'000'000, 13'000'000'000, ""},
-        {11'000'000'000, 14'000'002'000, "getFrequency 0; setFrequency -2000; "},
-        {12'000'000'000, 15'000'000'000, "stepTime -3000000000; "},
-    };
+    } kPairs[] = {{10'000'000'000, 13'000'000'000, ""},
+                  {11'000'000'000, 14'000'002'000, "getFrequency 0; setFrequency -2000; "},
+                  {12'000'000'000, 15'000'000'000, "stepTime -3000000000; "}};
     for (const auto& pair : kPairs) {
         host.adjustTime(pair.referenceNs, pair.clockNs);
         EXPECT_EQ(pair.calls, told(host.calls()));

@@ -5,11 +5,8 @@
 #include "sources/tLiveSource.h"
 #include "sources/tSamplePace.h"
 #include "sources/tSimulatedSource.h"
-#include "support/failureOf.h"
-#include "text/quantity.h"
 
 #include <algorithm>
-#include <cmath>
 #include <csignal>
 #include <cstring>
 #include <sys/socket.h>
@@ -93,20 +90,18 @@ TEST_F(LiveSource, readsTheClockAtTheMomentOfTheSample)
         double rate;
         int64_t jumpNs;
         int64_t clockNs; // what the clock showed at that moment; -1: left out
-    } kRows[] = {
-        {"of now", 100 * kMs, 100 * kMs, 1, 0, 100 * kMs},
-        {"of a while ago", 100 * kMs, 60 * kMs, 1, 0, 60 * kMs},
-        {"by a fast clock", 100 * kMs, 60 * kMs, 1.5, 0, 90 * kMs},
-        {"by a clock that runs backwards", 100 * kMs, 60 * kMs, -0.5, 0, -30 * kMs},
-        {"at once", 0, 0, 1.5, 0, 0},
-        {"of the moment of the order", 100 * kMs, 0, 1, 0, 0},
-        {"from before the order", 100 * kMs, -1, 1, 0, -1},
-        {"from the future", 100 * kMs, 100 * kMs + 1, 1, 0, -1},
-        {"with a system clock just even", 100 * kMs, 50 * kMs, 1, 1'100'000, 49'455'984},
-        {"of before the start by it", 100 * kMs, 0, 1, 1'100'000, 0},
-        {"stepped forwards by others", 100 * kMs, 50 * kMs, 1, 1'100'001, -1},
-        {"stepped backwards by others", 100 * kMs, 50 * kMs, 1, -1'100'001, -1},
-    };
+    } kRows[] = {{"of now", 100 * kMs, 100 * kMs, 1, 0, 100 * kMs},
+                 {"of a while ago", 100 * kMs, 60 * kMs, 1, 0, 60 * kMs},
+                 {"by a fast clock", 100 * kMs, 60 * kMs, 1.5, 0, 90 * kMs},
+                 {"by a clock that runs backwards", 100 * kMs, 60 * kMs, -0.5, 0, -30 * kMs},
+                 {"at once", 0, 0, 1.5, 0, 0},
+                 {"of the moment of the order", 100 * kMs, 0, 1, 0, 0},
+                 {"from before the order", 100 * kMs, -1, 1, 0, -1},
+                 {"from the future", 100 * kMs, 100 * kMs + 1, 1, 0, -1},
+                 {"with a system clock just even", 100 * kMs, 50 * kMs, 1, 1'100'000, 49'455'984},
+                 {"of before the start by it", 100 * kMs, 0, 1, 1'100'000, 0},
+                 {"stepped forwards by others", 100 * kMs, 50 * kMs, 1, 1'100'001, -1},
+                 {"stepped backwards by others", 100 * kMs, 50 * kMs, 1, -1'100'001, -1}};
     for (const auto& row : kRows) {
         SCOPED_TRACE(row.name);
         rawNow = 0;
@@ -144,14 +139,12 @@ TEST_F(LiveSource, placesPulsesOnTheNearestSecondAndAddsTheOffset)
         int64_t offsetNs;
         bool pulse;
         int64_t aheadNs, errorNs; // of the clock: by what the sample says, and as given
-    } kRows[] = {
-        {250, false, 7 * kSecondNs + 1000, 7 * kSecondNs + 750},
-        {-250, false, 1000, 1250},
-        {0, true, 7 * kSecondNs + 300 * kMs, 300 * kMs},
-        {0, true, 7 * kSecondNs + 700 * kMs, -300 * kMs},
-        {0, true, -7 * kSecondNs - 300 * kMs, -300 * kMs},
-        {1000, true, 2 * kSecondNs + 100 * kMs, 100 * kMs - 1000},
-    };
+    } kRows[] = {{250, false, 7 * kSecondNs + 1000, 7 * kSecondNs + 750},
+                 {-250, false, 1000, 1250},
+                 {0, true, 7 * kSecondNs + 300 * kMs, 300 * kMs},
+                 {0, true, 7 * kSecondNs + 700 * kMs, -300 * kMs},
+                 {0, true, -7 * kSecondNs - 300 * kMs, -300 * kMs},
+                 {1000, true, 2 * kSecondNs + 100 * kMs, 100 * kMs - 1000}};
     for (const auto& row : kRows) {
         tLiveSource source = open({}, row.offsetNs);
         reference.sample = {kStartNs, kClock - static_cast<uint64_t>(row.aheadNs), row.pulse};
@@ -162,14 +155,13 @@ TEST_F(LiveSource, placesPulsesOnTheNearestSecondAndAddsTheOffset)
 TEST_F(LiveSource, endsInTime)
 {
     tLiveSource source = open(250 * kMs);
-    const struct {
-        int64_t passMs, waitMs;
-        bool ends;
-    } kRows[] = {{100, 100, false}, {100, 100, false}, {49, 50, false}, {1, 1, true}};
-    for (const auto& row : kRows) {
-        reference.passNs = row.passMs * kMs;
-        EXPECT_EQ(row.ends, !source.next().has_value());
-        EXPECT_EQ(row.waitMs * kMs, reference.waitNs);
+    for (const auto& [passMs, waitMs, ends] : {std::tuple<int64_t, int64_t, bool>{100, 100, false},
+                                               {100, 100, false},
+                                               {49, 50, false},
+                                               {1, 1, true}}) {
+        reference.passNs = passMs * kMs;
+        EXPECT_EQ(ends, !source.next().has_value());
+        EXPECT_EQ(waitMs * kMs, reference.waitNs);
     }
 }
 
@@ -206,11 +198,10 @@ TEST(ClockReference, isReadAtItsPaceAndSilentWhereItFails)
     const struct {
         uint64_t rawNs;
         bool broken, sample;
-    } kRows[] = {
-        {1000, false, true}, {1099, false, false}, {1110, false, true},  {1199, false, false},
-        {1200, false, true}, {1300, true, false},  {1399, false, false}, {1400, false, true},
-        {1860, false, true}, {1999, false, false}, {2000, false, true},
-    };
+    } kRows[] = {{1000, false, true},  {1099, false, false}, {1110, false, true},
+                 {1199, false, false}, {1200, false, true},  {1300, true, false},
+                 {1399, false, false}, {1400, false, true},  {1860, false, true},
+                 {1999, false, false}, {2000, false, true}};
     for (const auto& row : kRows) {
         rawNow = row.rawNs;
         broken = row.broken;
@@ -278,8 +269,7 @@ TEST(Segment, isReadInBothSizes)
         {"not synchronised", 1, 3, 1, 0, 0, 0},
         {"unknown mode", 2, 0, 1, 0, 0, 0},
         {"last second", 1, 0, 17'999'999'999, 0, 0, 17'999'999'999'000'000'000U},
-        {"beyond it", 1, 0, 18'000'000'000, 0, 0, 0},
-    };
+        {"beyond it", 1, 0, 18'000'000'000, 0, 0, 0}};
     for (const bool wide : {false, true}) {
         for (const auto& row : kRows) {
             if (!wide && row.second > UINT32_MAX) continue;
@@ -352,21 +342,20 @@ TEST_F(Socket, takesDatagramsOfBothSizes)
         tRest rest;
         int longer;             // than it should be
         int64_t offsetNs = kNo; // kNo: not usable
-    } kRows[] = {
-        {"later", 1'700'000'000, 250'000, {5e-3, 0, 0, 0, kMagic}, 0, 5 * kMs},
-        {"at a leap second", 4'000'000'000, 999'999, {-2.5e-9, 0, 2, 0, kMagic}, 0, -3},
-        {"pulse", 10, 0, {0.25, 1, 0, 0, kMagic}, 0, 250 * kMs},
-        {"largest offset", 10, 0, {9e9, 0, 0, 9, kMagic}, 0, 9'000'000'000 * kSecondNs},
-        {"beyond it", 10, 0, {9.1e9, 0, 0, 0, kMagic}, 0},
-        {"beyond it on the other side", 10, 0, {-9.1e9, 0, 0, 0, kMagic}, 0},
-        {"no number", 10, 0, {std::nan(""), 0, 0, 0, kMagic}, 0},
-        {"too many microseconds", 10, 1'000'000, {0, 0, 0, 0, kMagic}, 0},
-        {"after the last second", 18'000'000'001, 0, {0, 0, 0, 0, kMagic}, 0},
-        {"not synchronised", 10, 0, {0, 0, 3, 0, kMagic}, 0},
-        {"another kind", 10, 0, {0, 0, 0, 0, kMagic + 1}, 0},
-        {"too short", 10, 0, {0, 0, 0, 0, kMagic}, -1},
-        {"too long", 10, 0, {0, 0, 0, 0, kMagic}, 1},
-    };
+    } kRows[] = {{"later", 1'700'000'000, 250'000, {5e-3, 0, 0, 0, kMagic}, 0, 5 * kMs},
+                 {"at a leap second", 4'000'000'000, 999'999, {-2.5e-9, 0, 2, 0, kMagic}, 0, -3},
+                 {"pulse", 10, 0, {0.25, 1, 0, 0, kMagic}, 0, 250 * kMs},
+                 {"largest offset", 10, 0, {9e9, 0, 0, 9, kMagic}, 0, 9'000'000'000 * kSecondNs},
+                 {"beyond it", 10, 0, {9.1e9, 0, 0, 0, kMagic}, 0},
+                 {"beyond it on the other side", 10, 0, {-9.1e9, 0, 0, 0, kMagic}, 0},
+                 {"no number", 10, 0, {std::nan(""), 0, 0, 0, kMagic}, 0},
+                 {"too many microseconds", 10, 1'000'000, {0, 0, 0, 0, kMagic}, 0},
+                 {"last second", 18'000'000'000, 0, {0, 0, 0, 0, kMagic}, 0, 0},
+                 {"after the last second", 18'000'000'001, 0, {0, 0, 0, 0, kMagic}, 0},
+                 {"not synchronised", 10, 0, {0, 0, 3, 0, kMagic}, 0},
+                 {"another kind", 10, 0, {0, 0, 0, 0, kMagic + 1}, 0},
+                 {"too short", 10, 0, {0, 0, 0, 0, kMagic}, -1},
+                 {"too long", 10, 0, {0, 0, 0, 0, kMagic}, 1}};
     const auto reference = socketReference(file.path);
     int64_t unusable = 0;
     for (const size_t part : {size_t{4}, size_t{8}}) {

@@ -1,11 +1,18 @@
+// What most tests of the host use.
 #pragma once
 
 #include "loop/tStep.h"
 #include "servo/tServoLibrary.h"
+#include "servo/tServoParameters.h"
+#include "support/failureOf.h"
 #include "text/files.h"
+#include "text/quantity.h"
 
+#include <fmt/format.h>
 #include <gtest/gtest.h>
 
+#include <cmath>
+#include <stdexcept>
 #include <string>
 #include <unistd.h>
 
@@ -35,6 +42,17 @@ inline const tServoLibrary& library()
 {
     static const tServoLibrary loaded(tServoLibrary::find(""));
     return loaded;
+}
+
+// Parameters of the law, the others as built in.
+inline tServoParameters law(double g, double a, double b = 1, double c = 1)
+{
+    tServoParameters parameters;
+    parameters.phaseLockGain = g;
+    parameters.phaseLockCoefficientA = a;
+    parameters.phaseLockCoefficientB = b;
+    parameters.phaseLockCoefficientC = c;
+    return parameters;
 }
 
 // A file that lives as long as the test; it is there once something writes it.

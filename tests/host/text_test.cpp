@@ -1,10 +1,7 @@
 #include "host/stepFixture.h"
-#include "support/failureOf.h"
 #include "text/json.h"
-#include "text/quantity.h"
 #include "text/words.h"
 
-#include <cmath>
 #include <fcntl.h>
 #include <sys/stat.h>
 
@@ -18,62 +15,55 @@ TEST(Quantity, isReadInItsBaseUnit)
         const char* text;
         const tQuantityKind& kind;
         double value;
-    } kQuantities[] = {
-        {"125ms", kDuration, 125e6},  {"-12ppm", kFrequency, -12e3}, {"1%", kRatio, 0.01},
-        {"+3us", kDuration, 3e3},     {"2min", kDuration, 120e9},    {"1e-3h", kDuration, 3.6e9},
-        {"0", kFrequency, 0},         {"7ppb", kFrequency, 7},       {"1.5s", kDuration, 1.5e9},
-        {"-0.25ns", kDuration, -.25},
-    };
+    } kQuantities[] = {{"125ms", kDuration, 125e6}, {"-12ppm", kFrequency, -12e3},
+                       {"1%", kRatio, 0.01},        {"+3us", kDuration, 3e3},
+                       {"2min", kDuration, 120e9},  {"1e-3h", kDuration, 3.6e9},
+                       {"0", kFrequency, 0},        {"7ppb", kFrequency, 7},
+                       {"1.5s", kDuration, 1.5e9},  {"-0.25ns", kDuration, -.25}};
     const struct {
         const char* text;
         const tQuantityKind& kind;
         const char* why;
-    } kRefused[] = {
-        {"5ppm", kDuration, " has an unknown unit 'ppm'; use ns, us, ms, s, min or h"},
-        {"5x", kFrequency, " has an unknown unit 'x'; use ppb or ppm"},
-        {"5", kRatio, " has no unit; use %"},
-        {"1e999s", kDuration, " is out of range"},
-        {"+-1s", kDuration, " does not start with a number"},
-        {"nan", kDuration, " does not start with a number"},
-        {"inf%", kRatio, " does not start with a number"},
-        {"", kDuration, " does not start with a number"},
-        {"1,5s", kDuration, " has an unknown unit ',5s'; use ns, us, ms, s, min or h"},
-        {"1 s", kDuration, " has an unknown unit ' s'; use ns, us, ms, s, min or h"},
-    };
+    } kRefused[] = {{"5ppm", kDuration, " has an unknown unit 'ppm'; use ns, us, ms, s, min or h"},
+                    {"5x", kFrequency, " has an unknown unit 'x'; use ppb or ppm"},
+                    {"5", kRatio, " has no unit; use %"},
+                    {"1e999s", kDuration, " is out of range"},
+                    {"+-1s", kDuration, " does not start with a number"},
+                    {"nan", kDuration, " does not start with a number"},
+                    {"inf%", kRatio, " does not start with a number"},
+                    {"", kDuration, " does not start with a number"},
+                    {"1,5s", kDuration, " has an unknown unit ',5s'; use ns, us, ms, s, min or h"},
+                    {"1 s", kDuration, " has an unknown unit ' s'; use ns, us, ms, s, min or h"}};
     for (const auto& row : kQuantities)
         EXPECT_DOUBLE_EQ(row.value, parseQuantity(row.text, row.kind)) << row.text;
-    for (const auto& row : kRefused)
-        EXPECT_EQ(std::string("'") + row.text + "'" + row.why,
-                  failureOf([&] { parseQuantity(row.text, row.kind); }));
+    for (const auto& row : kRefused) {
+        const std::string why = failureOf([&] { parseQuantity(row.text, row.kind); });
+        EXPECT_EQ(std::string("'") + row.text + "'" + row.why, why);
+    }
 }
 
 TEST(Quantity, isWrittenForPeople)
 {
-    const struct {
-        double ns;
-        const char *text, *withSign;
-    } kDurations[] = {
-        {0, "0 ns", "+0 ns"},
-        {-0.5, "-0.5 ns", "-0.5 ns"},
-        {999.4, "999.4 ns", "+999.4 ns"},
-        {1e3, "1 us", "+1 us"},
-        {-1500, "-1.5 us", "-1.5 us"},
-        {1012345, "1.012 ms", "+1.012 ms"},
-        {1e9, "1 s", "+1 s"},
-        {7200e9, "7200 s", "+7200 s"},
-        {999999, "1000 us", "+1000 us"},
-        {-1e9, "-1 s", "-1 s"},
-        {9999.5e9, "10000 s", "+10000 s"},
-        {9.9e23, "990000000000000 s", "+990000000000000 s"},
-        {1e24, "1e+15 s", "+1e+15 s"},
-        {9e-4, "0.9 ps", "+0.9 ps"},
-        {1e-3, "0.001 ns", "+0.001 ns"},
-        {-1e-7, "-0.0001 ps", "-0.0001 ps"},
-        {9e-8, "0 ns", "+0 ns"},
-    };
-    for (const auto& row : kDurations) {
-        EXPECT_EQ(row.text, durationText(row.ns));
-        EXPECT_EQ(row.withSign, signedDurationText(row.ns));
+    for (const auto& [ns, text, withSign] :
+         {std::tuple<double, const char*, const char*>{0, "0 ns", "+0 ns"},
+          {-0.5, "-0.5 ns", "-0.5 ns"},
+          {999.4, "999.4 ns", "+999.4 ns"},
+          {1e3, "1 us", "+1 us"},
+          {-1500, "-1.5 us", "-1.5 us"},
+          {1012345, "1.012 ms", "+1.012 ms"},
+          {1e9, "1 s", "+1 s"},
+          {7200e9, "7200 s", "+7200 s"},
+          {999999, "1000 us", "+1000 us"},
+          {-1e9, "-1 s", "-1 s"},
+          {9999.5e9, "10000 s", "+10000 s"},
+          {9.9e23, "990000000000000 s", "+990000000000000 s"},
+          {1e24, "1e+15 s", "+1e+15 s"},
+          {9e-4, "0.9 ps", "+0.9 ps"},
+          {1e-3, "0.001 ns", "+0.001 ns"},
+          {-1e-7, "-0.0001 ps", "-0.0001 ps"},
+          {9e-8, "0 ns", "+0 ns"}}) {
+        EXPECT_EQ(text, durationText(ns));
+        EXPECT_EQ(withSign, signedDurationText(ns));
     }
     EXPECT_EQ("0 ns", durationText(-0.0));
     EXPECT_EQ("+0 ns", signedDurationText(-9.191e-17));
@@ -171,9 +161,10 @@ TEST(Files, nameWhatFailsAndWhy)
     EXPECT_EQ("cannot write " + folder.path + ": Is a directory",
               failureOf([&] { replaceText(folder.path, ""); }));
     rmdir(folder.path.c_str());
-    for (const size_t size : {size_t{1}, size_t{1'000'000}}) // when flushed, and when written
+    for (const size_t size : {size_t{1}, size_t{1'000'000}}) { // when flushed, and when written
         EXPECT_EQ("cannot write /dev/full: No space left on device",
                   failureOf([&] { writeText("/dev/full", std::string(size, 'x')); }));
+    }
 }
 
 TEST(Files, areClosedWithTheirScope)

@@ -1,15 +1,9 @@
 #include "host/stepFixture.h"
 #include "metrics/tMeasured.h"
-#include "text/quantity.h"
 #include "text/words.h"
 #include "traces/moments.h"
 #include "traces/tRecording.h"
 #include "traces/tableRow.h"
-
-#include <fmt/format.h>
-
-#include <cmath>
-#include <stdexcept>
 
 using namespace dravikHost;
 
@@ -35,8 +29,7 @@ std::string refusalOf(const std::string& text, const tReadOptions& options = {})
 }
 
 struct tReadRow {
-    const char* name;
-    const char* text;
+    const char *name, *text;
     size_t count;
     double firstNs; // the first error
     double latestNs;
@@ -57,10 +50,9 @@ std::string unreadOf(const tRecording& recording)
 // What is read, with the sign that is positive for a clock that is ahead.
 const tReadRow kRead[] = {
     {"ptp4l",
-     "ptp4l[10.250]: master offset -23 s2 freq +5 path delay 500\n"
-     "ptp4l[11.250]: port 1: UNCALIBRATED to SLAVE\n"
-     "ptp4l[11.300]: a sentence that ends in an offset 9 s2 freq +5 path delay 500\n"
-     "ptp4l[11.500]: master offset 7 s2 freq +5 path delay 500\n",
+     "ptp4l[10.250]: master offset -23 s2 freq +5 path delay 500\nptp4l[11.250]: port 1: "
+     "UNCALIBRATED to SLAVE\nptp4l[11.300]: a sentence that ends in an offset 9 s2 freq +5 path "
+     "delay 500\nptp4l[11.500]: master offset 7 s2 freq +5 path delay 500\n",
      2, -23, 7, 1'250'000'000, "ptp4l", "", 2},
     {"behind a date, an instance",
      "2024-05-06 10:11:00.123 ptp4l[6.202]: selected /dev/ptp1 as PTP clock\n"
@@ -80,13 +72,10 @@ const tReadRow kRead[] = {
      1, 640, 640, 0, "ts2phc /dev/ptp3", "", 1},
     {"damaged lines",
      "p[1.0]: master offset 1 s2 freq +5 path delay 5\np[2.0]: master offset 1 sX freq +5 path "
-     "delay 5\n"
-     "p[3.0]: master offset 1x s2 freq +5 path delay 5\np[4.0]: master offset 1 s2 freq +\n"
-     "p[5.0]: master offset 1 s2 freq +5\np[6.0]: master off\np[7\n"
-     "p[0.5]: master offset 9 s2 freq +5 path delay 5\np[8.0]: master offset 2 s2 freq +5 path "
-     "delay 5\n"
-     "p[0.7]: master offset 9 s2 freq +5 path delay 5\np[9.0]: master offset 3 s2 freq +5 path "
-     "delay 5\n",
+     "delay 5\np[3.0]: master offset 1x s2 freq +5 path delay 5\np[4.0]: master offset 1 s2 freq "
+     "+\np[5.0]: master offset 1 s2 freq +5\np[6.0]: master off\np[7\np[0.5]: master offset 9 s2 "
+     "freq +5 path delay 5\np[8.0]: master offset 2 s2 freq +5 path delay 5\np[0.7]: master offset "
+     "9 s2 freq +5 path delay 5\np[9.0]: master offset 3 s2 freq +5 path delay 5\n",
      3, 1, 3, 8'000'000'000, "p",
      "8: 2 an unknown state, 3 the offset is no number, 4 the frequency is no number"},
     {"refclocks.log",
@@ -102,26 +91,20 @@ const tReadRow kRead[] = {
      2, 33'910, -5'693, 2'000'000'000, "192.0.2.1"},
     {"measurements.log",
      "2019-09-05 06:34:59 a::1 N 2 111 111 1111 10 10 0.66 -3.572e-03 6e-02 1e-06 3e-04 7e-03 "
-     "C0000265 4B K K\n"
-     "2019-09-05 06:35:59 a::1 N 2 111 101 0000 10 10 0.66 0e-00 6e-02 0e-00 0e-00 0e-00 C0000265 "
-     "4B K K\n"
-     "2019-09-05 06:36:59 a::1 N 2 111 111 1111 9 9 0.6 0e-00 0e-00 0e-00 0e-00 0e-00 C0000265 4B "
-     "Kd? K\n"
-     "2019-09-05 06:37:59 a::1 N 2 111 111 1111 9 9 0.6 0e-00 0e-00 0e-00 0e-00 0e-00 C0000265 "
-     "KKKKK\n"
-     "2019-09-05 06:38:59 a::1 N 2 111 111 1111 9 9 0.6 0e-00 0e-00 0e-00 0e-00 0e-00 C000026\n",
+     "C0000265 4B K K\n2019-09-05 06:35:59 a::1 N 2 111 101 0000 10 10 0.66 0e-00 6e-02 0e-00 "
+     "0e-00 0e-00 C0000265 4B K K\n2019-09-05 06:36:59 a::1 N 2 111 111 1111 9 9 0.6 0e-00 0e-00 "
+     "0e-00 0e-00 0e-00 C0000265 4B Kd? K\n2019-09-05 06:37:59 a::1 N 2 111 111 1111 9 9 0.6 0e-00 "
+     "0e-00 0e-00 0e-00 0e-00 C0000265 KKKKK\n2019-09-05 06:38:59 a::1 N 2 111 111 1111 9 9 0.6 "
+     "0e-00 0e-00 0e-00 0e-00 0e-00 C000026\n",
      1, 3'572'000, 3'572'000, 0, "a::1",
      "3: 3 field 19, 'Kd?', is not what it should be, 4 field 18, 'KKKKK', is not what it should "
      "be, 5 field 17, 'C000026', is not what it should be",
      1},
     {"tracking.log over servers",
      "2021-11-20 19:14:48 192.0.2.31 3 -764.414 0.056 -1.303e-04 N 1 2e-04 4e-05 6e-03 1e-03 "
-     "5e-03\n"
-     "2021-11-20 19:15:00 192.0.2.31 3 -764.414 0.056 -9.303e-04 ? 1 2e-04 4e-05 6e-03 1e-03 "
-     "5e-03\n"
-     "2021-11-20 19:31:53 192.0.2.32 3 -764.418 0.096 -4.869e-04 N 1 3e-04 7e-05 9e-03 1e-03 "
-     "5e-03\n"
-     "2021-11-20 19:32:53 192.0.2.32 3 -764.418 0.096 -4.869e-0\n",
+     "5e-03\n2021-11-20 19:15:00 192.0.2.31 3 -764.414 0.056 -9.303e-04 ? 1 2e-04 4e-05 6e-03 "
+     "1e-03 5e-03\n2021-11-20 19:31:53 192.0.2.32 3 -764.418 0.096 -4.869e-04 N 1 3e-04 7e-05 "
+     "9e-03 1e-03 5e-03\n2021-11-20 19:32:53 192.0.2.32 3 -764.418 0.096 -4.869e-0\n",
      2, -130'300, -486'900, 1'025'000'000'000, "",
      "1: 4 field 7, '-4.869e-0', is not a number as it should be", 1},
     {"loopstats at midnight",
@@ -132,9 +115,9 @@ const tReadRow kRead[] = {
     {"peerstats", "48773 10847.650 PPS(0) 961a -0.001605376 0.000000000 0.001424877 0.000958674\n",
      1, 1'605'376, 1'605'376, 0, "PPS(0)"},
     {"sfptpd",
-     "2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n"
+     "\n2016-03-03 10:04:41.413263 [ptp1->system(em1)], offset: 12.375, freq-adj: 1.5, in-sync: 1\n"
      "2016-03-03 10:04:42.413263 [ptp1->system(em1)], offset: 12.3\n",
-     1, 12.375, 12.375, 0, "ptp1->system(em1)", "1: 2 cut short"},
+     1, 12.375, 12.375, 0, "ptp1->system(em1)", "1: 3 cut short"},
     {"ptpd",
      "# Timestamp, State, Clock ID, One Way Delay, Offset From Master, Slave to Master\n"
      "2015-06-11 13:20:12.123456, lstn, , , , \n"
@@ -142,11 +125,9 @@ const tReadRow kRead[] = {
      "2015-06-11 13:20:14.123456, slv, 0011/01,  0.000010234,  0.0000001\n",
      1, 123, 123, 0, "", "1: 4 cut short", 1},
     {"CSV of spreadsheets",
-     "\xef\xbb\xbf"
-     "\"Reference_NS\" ; Clock_NS ; note\r\n"
-     "1700000000000000000 ; \"1700000000000000023\" ;\r\n"
-     "1700000001000000000;1700000000999999999,25;clock_ns;\r\n",
-     2, 23, -0.75, 1'000'000'000, ""},
+     "\xef\xbb\xbf\"Reference_NS\" ; Clock_NS ; note\r\n1700000000000000000 ; "
+     "\"1700000000000000023\" ;\r\n1700000001000000000,5;1700000000999999999,25;clock_ns;\r\n",
+     2, 23, -1.25, 1'000'000'000, ""},
     {"TIE with units", "# time [ms]  TIE [us]\n0 1.5\n125 -2\n", 2, 1500, -2000, 125'000'000, ""},
     {"TIE with decimal commas", "time (s);TIE (ns)\n0,000;11,5\n0,125;13\n0,250;\n", 2, 11.5, 13,
      125'000'000, "", "1: 4 no numbers"},
@@ -166,7 +147,7 @@ const tReadRow kRead[] = {
      "p[8.0]: b c d e f offset 5 s2 freq +5\n",
      3, 2, 4, 2 * kSecondNs, "p b c d e f", "4: 2 cut short, 3 cut short, 4 cut short", 1},
     {"damage to each number",
-     "[1.0] offset 1 s2 freq +5 path delay 5\n[2.0] offset 1 s4 freq +5 path delay 5\n"
+     "[1.0] master offset 1 s2 freq +5 path delay 5\n[2.0] offset 1 s4 freq +5 path delay 5\n"
      "[3.0] offset 1e1 s2 freq +5 path delay 5\n[4.0] offset 1 s2 freq 5e1 path delay 5\n"
      "[5.0] offset 1000000000000000000 s2 freq 5 path delay 5\n"
      "[6.0] offset 999999999999999 s2 freq +5 path delay 5\n",
@@ -192,20 +173,17 @@ const tReadRow kRead[] = {
      "p[1.0]: offset 7 s2 freq 5\np[1.5]: offset 8 s2 freq 5\np[1.25]: offset 9 s2 freq 5\n",
      4, 1, 8, 2 * kSecondNs, "p", "5: 3 time does not advance, 2 time goes back, 4 time goes back"},
     {"a prefix of five words",
-     "===\nNov 23 08:35:26 host c: 2026-02-28 23:59:59.5 PPS0 0 N 1 4.9e-07 2.3e-08 1.0e-06\n"
-     "a b abcdefghij abcd-fghij abcdefg-ij abcd-fg-i 2026-02-28 23:59:59.6 PPS0 0 N 1 4.9e-07 "
-     "2.3e-08 1.0e-06\n"
-     "2026-03-01 00:00:00.75 PPS0 1 N 1 4.9e-07 1.0e+09 1.0e-06\n"
-     "2026-03-01 00:00:01.75 PPS0 1 N 1 4.9e-07 1.5e-08 1.0e-06 x\n"
-     "   Date (UTC) Time     IP Address   Std dev'n Est offset\n",
+     "===\nNov 23 08:35:26 host c: 2026-02-28 23:59:59.5 PPS0 0 N 1 4.9e-07 2.3e-08 1.0e-06\na b "
+     "abcdefghij abcd-fghij abcdefg-ij abcd-fg-i 2026-02-28 23:59:59.6 PPS0 0 N 1 4.9e-07 2.3e-08 "
+     "1.0e-06\n2026-03-01 00:00:00.75 PPS0 1 N 1 4.9e-07 1.0e+09 1.0e-06\n2026-03-01 00:00:01.75 "
+     "PPS0 1 N 1 4.9e-07 1.5e-08 1.0e-06 x\n   Date (UTC) Time     IP Address   Std dev'n Est "
+     "offset\n",
      1, -23, -23, 0, "PPS0", "3: 3 no date, 4 no measurement, 5 more fields than there should be",
      1},
     {"optional fields that end",
      "2021-11-20 19:14:48 h 3 -7.4 0.5 -1.3e-04 N 1 2e-04 4e-05\n2021-11-20 19:14:49 h 3 -7.4 0.5 "
-     "-1.3e-04 N\n"
-     "2021-11-20 19:14:50 h 3 -7.4 0.5 -1.3e-04 N 1 2e-04\n2021-11-20 19:14:51 h 3 -7.4 0.5 "
-     "-1.3e-04 ? 1\n"
-     "2021-11-20 19:14:52 h 3 -7 0.5e1 -1.3e-04 N 1\n",
+     "-1.3e-04 N\n2021-11-20 19:14:50 h 3 -7.4 0.5 -1.3e-04 N 1 2e-04\n2021-11-20 19:14:51 h 3 "
+     "-7.4 0.5 -1.3e-04 ? 1\n2021-11-20 19:14:52 h 3 -7 0.5e1 -1.3e-04 N 1\n",
      1, -130'000, -130'000, 0, "", "4: 2 cut short, 3 cut short, 4 cut short"},
     {"sfptpd beside itself",
      "2016-03-03 10:04:41.4 ptp1: selected\n2016-03-03 10:04:42.4 a b\nptp1: x\n"
@@ -214,9 +192,8 @@ const tReadRow kRead[] = {
      1, -2.5, -2.5, 0, "a->b", "5: 2 no measurement, 3 no measurement, 5 no date and time", 1},
     {"ptpd in seconds, or both",
      "1434028813.5, slv, c, 1.0, 2.5, 3.0\n2015-06-11 13:20:14, 1434028814.5, slv, c, 1.0, 3.5, "
-     "3.0\n"
-     "1434028815.5, slv, c, 1.0, 2.5\n1434028816.5, slv, c, 1.0, 2, 3\n1434028817.5, slv\n"
-     "x, slv, c, 1.0, 2.5, 3\n1434028818.5, pasv, c\n",
+     "3.0\n1434028815.5, slv, c, 1.0, 2.5\n1434028816.5, slv, c, 1.0, 2, 3\n1434028817.5, slv\nx, "
+     "slv, c, 1.0, 2.5, 3\n1434028818.5, pasv, c\n",
      2, 2.5e9, 3.5e9, 500'000'000, "",
      "4: 3 cut short, 4 the offset is no number, 5 no measurement", 1},
     {"CSV with what spreadsheets add",
@@ -256,8 +233,7 @@ const tReadRow kRead[] = {
      "time (utc);phase error (us)\n2024-05-06T10:00:00Z;1\n2024-05-06 10:00:00.25;2,5\n1;1;1\n", 2,
      1000, 2500, 250'000'000, "", "1: 4 no numbers"},
     {"too much", "-0.2500000004 -0.5\n9.5e9 1\n1 1e9\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
-     8'500'000'000'250'000'000, "", "2: 2 no time in the column of the time, 3 an error of years"},
-};
+     8'500'000'000'250'000'000, "", "2: 2 no time in the column of the time, 3 an error of years"}};
 
 TEST(Trace, isReadByWhatItsLinesAre)
 {
@@ -283,11 +259,9 @@ TEST(Trace, tellsTheCorrections)
     EXPECT_EQ(130'300, tracking.stepNs); // slewed away before the next line
     const tRecordedPair loopstats = first("50935 75440.031 0.000006019 13.778190 6\n");
     EXPECT_NEAR(13'778.19, *loopstats.orderedPpb, 1e-6);
-    const tRecordedPair held = first("kind,reference_ns,clock_ns,call,value\n"
-                                     "pair,1000000000,1000000023,,\n"
-                                     "call,,,setFrequency,7\n"
-                                     "held,,,setFrequency,9\n"
-                                     "held,,,stepTime,-23\n");
+    const tRecordedPair held =
+        first("kind,reference_ns,clock_ns,call,value\npair,1000000000,1000000023,,\ncall,,,"
+              "setFrequency,7\nheld,,,setFrequency,9\nheld,,,stepTime,-23\n");
     EXPECT_EQ(7, held.orderedPpb); // what was held back reached no clock
     EXPECT_EQ(0, held.stepNs);
     for (const int state : {0, 1, 2, 3}) {
@@ -359,8 +333,7 @@ const tRefusedRow kRefused[] = {
     {"Tau: 1\n0 1\n1 2\n", "it has a Tau and more than one column"},
     {"Unit: V\n1\n", "its unit 'V' is none of time"},
     {"Time (V),TIE (ns)\n0,1\n", "the unit 'v' of its header is none of time"},
-    {"# t (s) V (ns)\n0 1\n", "header, '# t (s) V (ns)', names no time error that is known"},
-};
+    {"# t (s) V (ns)\n0 1\n", "header, '# t (s) V (ns)', names no time error that is known"}};
 
 // Lines of each kind, and lines that are almost of one.
 const std::pair<const char*, const char*> kKinds[] = {
@@ -391,16 +364,12 @@ const std::pair<const char*, const char*> kKinds[] = {
     {"a journal", "LPKSHHRH"},
     {"text in UTF-16", "\xfe\xff\n\xff\xfe"},
     {"a program", "\x7f\x45LF"},
-    {"",
-     "a offset 3 s2 frq 4\na offset x s2 freq 4\n[1.5 offset 3 s2 freq 4\n[1.5] offset 3 s2 freq "
-     "4\n"
-     "a rms 3 mux 4 freq\na rms x max 4 freq\na rms 3 max 4\nLast offset\na : b\nx* a +/- 3us\n"
-     "^y a +/- 3us\n^*a  +/- 3us\n^* a\n^* \nName/IP Address x\nx NP\n remote  refid  st\n"
-     "remote reach \nrefid reach\n50928 3600.2 127.127.4.1 9624 0.5\n50928 x 127.127.4.1 93 226\n"
-     "50928 3600.2 a 9624\n50928 3600.2 1.5 zz\nsample NTP2 1 2\n2022-05-01 02:01:20 a * --1-- 377 "
-     "1.0 4e+01 -1e-04 1e-04\nsource 0\n assert \nmsn 127.127. "
-     "x"},
-};
+    {"", "a offset 3 s2 frq 4\na offset x s2 freq 4\n[1.5 offset 3 s2 freq 4\n[1.5] offset 3 s2 "
+         "freq 4\na rms 3 mux 4 freq\na rms x max 4 freq\na rms 3 max 4\nLast offset\na : b\nx* a "
+         "+/- 3us\n^y a +/- 3us\n^*a  +/- 3us\n^* a\n^* \nName/IP Address x\nx NP\n remote  refid  "
+         "st\nremote reach \nrefid reach\n50928 3600.2 127.127.4.1 9624 0.5\n50928 x 127.127.4.1 "
+         "93 226\n50928 3600.2 a 9624\n50928 3600.2 1.5 zz\nsample NTP2 1 2\n2022-05-01 02:01:20 a "
+         "* --1-- 377 1.0 4e+01 -1e-04 1e-04\nsource 0\n assert \nmsn 127.127. x"}};
 
 TEST(Trace, isRefusedByWhatItIs)
 {
@@ -433,14 +402,12 @@ TEST(Trace, doesNotMixFormats)
         const char *line, *other; // the seconds in between
         int lines, others;
         const char* why;
-    } kRows[] = {
-        {kTracking, kDaemon, 4, 3, " mixes "},
-        {kTracking, kDaemon, 4, 2, ""},
-        {kTracking, kDaemon, 10, 12, " mixes chrony's tracking.log with"},
-        {kLoop, kClock, 3, 3, " is mostly ntpd's clockstats"},
-        {kLoop, kClock, 4, 3, ""},
-        {kLoop, kClock, 1, 2, ""},
-    };
+    } kRows[] = {{kTracking, kDaemon, 4, 3, " mixes "},
+                 {kTracking, kDaemon, 4, 2, ""},
+                 {kTracking, kDaemon, 10, 12, " mixes chrony's tracking.log with"},
+                 {kLoop, kClock, 3, 3, " is mostly ntpd's clockstats"},
+                 {kLoop, kClock, 4, 3, ""},
+                 {kLoop, kClock, 1, 2, ""}};
     for (const auto& row : kRows) {
         std::string text;
         for (int i = 0; i < row.lines + row.others; ++i)
@@ -459,6 +426,10 @@ TEST(Trace, namesOnlySomeOfManySources)
     const std::string why = refusalOf(many);
     EXPECT_NE(std::string::npos, why.find("and 19990 others"));
     EXPECT_LT(why.size(), 500U);
+    const std::string two = "phc2sys[1.5]: eth1 sys" + line + "phc2sys[1.5]: eth2 sys" + line;
+    for (const char* const source : {"phc2sys eth2", "h2"})
+        EXPECT_EQ("phc2sys eth2", readTraceOf(two, {source, {}, {}}).source);
+    EXPECT_NE("", refusalOf(two, {"eth", {}, {}}));
 }
 
 // Runs of a program one after the other are one source, side by side they are two.
@@ -468,11 +439,12 @@ TEST(Trace, tellsRunsOfAProgramApart)
         return "host phc2sys[" + std::to_string(process) + "]: [" + std::to_string(second) +
                ".5] CLOCK_REALTIME phc offset " + std::to_string(second) + " s2 freq +1 delay 1\n";
     };
-    const tRecording restarted =
-        readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21) + line(9, 15));
-    ASSERT_EQ(5U, restarted.pairs.size());
+    const tRecording restarted = readTraceOf(line(7, 10) + line(7, 11) + line(8, 20) + line(8, 21) +
+                                             line(9, 15) + line(10, 25));
+    ASSERT_EQ(6U, restarted.pairs.size());
     EXPECT_EQ(11 * kSecondNs, restarted.pairs[3].elapsedNs);
     EXPECT_EQ(11 * kSecondNs + 1, restarted.pairs[4].elapsedNs);
+    EXPECT_EQ(21 * kSecondNs + 1, restarted.pairs[5].elapsedNs);
     EXPECT_FALSE(restarted.pairs[2].beginsStretch);
     EXPECT_TRUE(restarted.pairs[4].beginsStretch); // as time went back
     const std::string summary = "host phc2sys[6]: [9.5] CLOCK_REALTIME rms 3 max 4 freq +1 +/- 3\n";
@@ -489,8 +461,8 @@ TEST(Trace, beginsAStretchAfterAReboot)
 {
     std::string text;
     const auto add = [&text](int second, int offset) {
-        text += "ptp4l[" + std::to_string(second) + ".0]: master offset " + std::to_string(offset) +
-                " s2 freq +1 path delay 1\n";
+        text +=
+            fmt::format("ptp4l[{}.0]: master offset {} s2 freq +1 path delay 1\n", second, offset);
     };
     for (int i = 0; i < 5; ++i)
         add(1000 + i, 10);
@@ -532,12 +504,11 @@ TEST(Trace, beginsAStretchWhereAJournalSaysSo)
 TEST(Trace, readsSummariesAsWhatTheyAre)
 {
     const tRecording recording =
-        readTraceOf("ptp4l[1.0]: a b c d e rms 3 max 4 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[2.0]: a b c d e rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[3.0]: rms 4 mux 9 freq +1 +/- 3 delay 237 +/- 0\n"
-                    "ptp4l[4.0]: rms -1 max 9 freq\nptp4l[5.0]: rms 5.1 max 4 freq\n"
-                    "ptp4l[6.0]: rms 5 max 4\nptp4l[7.0]: rms 5 max 1000000000000000000 freq\n"
-                    "ptp4l[8.0]: a b c d e f rms 3 max 4 freq\n");
+        readTraceOf("ptp4l[1.0]: a b c d e rms 3 max 2 freq +1 +/- 3 delay 237 +/- 0\nptp4l[2.0]: "
+                    "a b c d e rms 4 max 7 freq +1 +/- 3 delay 237 +/- 0\nptp4l[3.0]: rms 4 mux 9 "
+                    "freq +1 +/- 3 delay 237 +/- 0\nptp4l[4.0]: rms -1 max 9 freq\nptp4l[5.0]: rms "
+                    "5.1 max 4 freq\nptp4l[6.0]: rms 5 max 4\nptp4l[7.0]: rms 5 max "
+                    "1000000000000000000 freq\nptp4l[8.0]: a b c d e f rms 3 max 4 freq\n");
     const tMeasured measured = measure(recording, {});
     EXPECT_EQ(2U, measured.errors.size());
     EXPECT_EQ(kSecondNs, recording.summaries.back().elapsedNs);
@@ -573,10 +544,9 @@ TEST(Trace, takesFromOptionsWhatTheFileDoesNotTell)
 
     options = {};
     options.intervalNs = 2e9;
-    const tRecording lines =
-        readTraceOf("phc offset 65 s2 freq -4 delay 3\nphc offset 6x s2 freq -4 delay 3\n"
-                    "phc offset 67 s2 freq -4 delay 3\n",
-                    options);
+    const tRecording lines = readTraceOf("phc offset 65 s2 freq -4 delay 3\nphc offset 6x s2 freq "
+                                         "-4 delay 3\nphc offset 67 s2 freq -4 delay 3\n",
+                                         options);
     ASSERT_EQ(2U, lines.pairs.size());
     EXPECT_EQ(4 * kSecondNs, lines.pairs.back().elapsedNs); // that of the damaged line included
     EXPECT_EQ(" has times of its own; leave --interval out", refusalOf("0 5\n1 6\n", options));
@@ -602,28 +572,23 @@ template <typename Parts> std::string joined(const Parts& parts)
 
 TEST(TableRow, isSplitAsPeopleWriteIt)
 {
-    const struct {
-        const char* line;
-        char separator;
-        const char* fields;
-    } kRows[] = {
-        {"a;b,c", ';', "a|b,c"},
-        {"a\tb c", '\t', "a|b c"},
-        {" 'a' \"b\" ", ' ', "a|b"},
-        {"\"x;y\",2", ',', "x;y|2"},
-        {"0,125 13,2", ' ', "0,125|13,2"},
-        {"0.1, 13.2", ',', "0.1|13.2"},
-        {"0 ,5", ',', "0|5"},
-        {"1,2 x", ',', "1|2 x"},
-        {"1,b c,d", ',', "1|b c|d"},
-        {"1, 2 3,4", ',', "1|2 3|4"},
-        {"1,", ',', "1|"},
-        {"'a \"", ' ', "'a|\""},
-        {"\"' x '\";''", ';', "x|"},
-    };
-    for (const auto& row : kRows) {
-        EXPECT_EQ(row.separator, separatorOf(row.line)) << row.line;
-        EXPECT_EQ(row.fields, joined(fieldsOf(row.line, row.separator)));
+    for (const auto& [line, separator, fields] :
+         {std::tuple<const char*, char, const char*>{"a;b,c", ';', "a|b,c"},
+          {"a\tb c", '\t', "a|b c"},
+          {" 'a' \"b\" ", ' ', "a|b"},
+          {"\"x;y\",2", ',', "x;y|2"},
+          {"0,125 13,2", ' ', "0,125|13,2"},
+          {"0.1, 13.2", ',', "0.1|13.2"},
+          {"0 ,5", ',', "0|5"},
+          {"1,2 x", ',', "1|2 x"},
+          {"1,b c,d", ',', "1|b c|d"},
+          {"1,2 x,y", ' ', "1,2|x,y"},
+          {"1, 2 3,4", ',', "1|2 3|4"},
+          {"1,", ',', "1|"},
+          {"'a \"", ' ', "'a|\""},
+          {"\"' x '\";''", ';', "x|"}}) {
+        EXPECT_EQ(separator, separatorOf(line)) << line;
+        EXPECT_EQ(fields, joined(fieldsOf(line, separator)));
     }
     EXPECT_EQ("time [ms]|TIE [us]", joined(titlesOf("# time [ms]  TIE [us]", kBlanks)));
     EXPECT_EQ("t (s)|x", joined(titlesOf("%# t (s) x", kBlanks)));
@@ -641,9 +606,10 @@ TEST(TableRow, isSplitAsPeopleWriteIt)
                                     {1e-3, "ps psec picoseconds"},
                                     {60e9, "min"},
                                     {3600e9, "h"},
-                                    {86'400e9, "d day days"}})
+                                    {86'400e9, "d day days"}}) {
         for (const std::string& unit : fieldsOf(units, kBlanks))
             EXPECT_EQ(ns, unitNsOf(unit)) << unit;
+    }
 }
 
 TEST(TableRow, hasNumbersToTheLastDigit)
@@ -659,21 +625,16 @@ TEST(TableRow, hasNumbersToTheLastDigit)
         int64_t unitNs;
         uint64_t whole;
         double fraction; // kNone: no number
+        // clang-format off
     } kRows[] = {
-        {"1,5", kSecondNs, 1'500'000'000, 0},
-        {"-1.25", 1, static_cast<uint64_t>(-2), 0.75},
-        {"-0.5", 1, static_cast<uint64_t>(-1), 0.5},
-        {".75", 3, 2, 0.25},
+        {"1,5", kSecondNs, 1'500'000'000, 0}, {"-1.25", 1, static_cast<uint64_t>(-2), 0.75},
+        {"-0.5", 1, static_cast<uint64_t>(-1), 0.5}, {".75", 3, 2, 0.25},
         {"18446743000000000001.25", 1, 18'446'743'000'000'000'001U, 0.25},
         {"18446744500000000000", 1, 0, kNone},
-        {"9007199254740993", 1000, 9'007'199'254'740'993'000, 0},
-        {"1e3", 1000, 1'000'000, 0},
-        {"-1E-1", 2, static_cast<uint64_t>(-1), 0.8},
-        {"9e18", 1, 9'000'000'000'000'000'000, 0},
-        {"9.1e18", 1, 0, kNone},
-        {"1e10", kSecondNs, 0, kNone},
-        {"x", 1, 0, kNone},
-    };
+        {"9007199254740993", 1000, 9'007'199'254'740'993'000, 0}, {"1e3", 1000, 1'000'000, 0},
+        {"-1E-1", 2, static_cast<uint64_t>(-1), 0.8}, {"9e18", 1, 9'000'000'000'000'000'000, 0},
+        {"9.1e18", 1, 0, kNone}, {"1e10", kSecondNs, 0, kNone}, {"x", 1, 0, kNone}};
+    // clang-format on
     for (const auto& row : kRows) {
         SCOPED_TRACE(row.field);
         const auto ns = exactNsOf(row.field, ';', row.unitNs).value_or(tExactNs{0, kNone});
@@ -729,8 +690,9 @@ TEST(Moments, areThoseOfTheCalendar)
     EXPECT_FALSE(moments.ofJulian("147001", "0"));
     EXPECT_EQ(0, tMoments().ofJulian("40587", "0"));
     EXPECT_FALSE(tMoments().ofJulian("40586", "0"));
-    for (const char* const time : {"24:00:00", "12:60:00", "12:00:60", "12:00", "23:59:61",
-                                   "23:58:60", "22:59:60", "12-00:00", "12:00-00", "12:00:005"})
+    for (const char* const time :
+         {"24:00:00", "12:60:00", "12:00:60", "12:00", "23:59:61", "23:58:60", "22:59:60",
+          "x2:00:00", "12:x0:00", "12-00:00", "12:00-00", "12:00:005"})
         EXPECT_FALSE(moments.ofDate("2026-02-28", time)) << time;
 }
 

@@ -6,7 +6,6 @@
 #include <fcntl.h>
 #include <functional>
 #include <regex>
-#include <stdexcept>
 #include <stdio_ext.h>
 #include <sys/stat.h>
 
