@@ -67,12 +67,15 @@ TEST(FixedStatus, KeepsBothEndsOfALongFileAndTheStartOfALongComponent)
     const std::string start(49, 'a');
     const std::string end(49, 'z');
     tFixedStatus reused;
+    const auto around = [&](const std::string& middle) {
+        return std::string(start).append(middle).append(end);
+    };
     for (const auto& [component, file, keptComponent, keptFile] :
          {std::tuple<std::string, std::string, std::string, std::string>{"dravik", "unit", "dravik",
                                                                          "unit"},
-          {"123456789", start + "12" + end, "123456789", start + "12" + end},
-          {"123456789A", start + "123" + end, "123456789", start + ".." + end},
-          {"", start + std::string(300, '-') + end, "", start + ".." + end}}) {
+          {"123456789", around("12"), "123456789", around("12")},
+          {"123456789A", around("123"), "123456789", around("..")},
+          {"", around(std::string(300, '-')), "", around("..")}}) {
         reused.code = 2; // a failure replaces a warning and all of its text
         EXPECT_TRUE(reused.set(-5, component.c_str(), file.c_str(), 7));
         EXPECT_EQ(-5, reused.code);

@@ -229,7 +229,7 @@ TEST(MeanOrders, areInForceWhilePairsAreMissing)
         orders.add(stepAt(i, 10, true, 1000));
     EXPECT_FALSE(orders.orderFor(nsOfSeconds(60))); // too few are known
     for (int i = 7; i < 40; ++i)
-        orders.add(stepAt(i, 10 * i, true, 1000 * (i % 2)));
+        orders.add(stepAt(i, int64_t{10} * i, true, 1000 * (i % 2)));
     EXPECT_FALSE(orders.resume(0.5));
     EXPECT_FALSE(orders.orderFor(nsOfSeconds(40.4)));
     EXPECT_EQ(500, orders.orderFor(nsOfSeconds(40.5)));

@@ -285,7 +285,8 @@ TEST(SelfTuning, coastsAtTheEstimatedRate)
     EXPECT_GT(100, std::fabs(loop.take()));
     EXPECT_EQ(std::string::npos, loop.events.find('X'));
     const double rmsNs = loop.rmsNs(5);
-    EXPECT_EQ("8.05539341 -20008.2812", fmt::format("{:.9g} {:.9g}", rmsNs, loop.clock.offsetPpb()));
+    EXPECT_EQ("8.05539341 -20008.2812",
+              fmt::format("{:.9g} {:.9g}", rmsNs, loop.clock.offsetPpb()));
 }
 
 // Whatever it is given it throws nothing, and orders what a clock can do.

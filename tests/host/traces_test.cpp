@@ -493,7 +493,7 @@ TEST(Trace, beginsAStretchWhereAJournalSaysSo)
     const std::string after = "ptp4l[9.0]: master offset 2 s2 freq +1 path delay 1\n"
                               "ptp4l[9.5]: master offset 2 s2 freq +1 path delay 1\n";
     for (const char* const line : {"-- Reboot --\n", "-- Boot 1f2e3d4c --\n"}) {
-        const tRecording recording = readTraceOf(before + line + after);
+        const tRecording recording = readTraceOf(fmt::format("{}{}{}", before, line, after));
         ASSERT_EQ(3U, recording.pairs.size());
         EXPECT_TRUE(recording.pairs[1].beginsStretch) << line;
         EXPECT_FALSE(recording.pairs[2].beginsStretch) << line;
