@@ -175,7 +175,7 @@ expect "an SVG with its text" "1 1 1 1 1" "$(for word in "it's.csv" "not locked"
 expect "a PNG" "$(printf '\211PNG')" "$(head -c 4 "$scratch/p.png")"
 plot -o "$scratch/q.svg" --mask 802.1as --script "$scratch/script"
 gnuplot "$scratch/script"
-expect "the script draws the same" "" "$(cmp "$scratch/p.svg" "$scratch/q.svg")"
+expect "the script draws the same" "" "$(cmp "$scratch/p.svg" "$scratch/q.svg" 2>&1)"
 expect "no picture" "dravik-host: --output: 'a.gif' does not end in .svg or .png" "$(plot -o a.gif)"
 expect "no curve of that mask" 1 "$(plot -o a.svg --mask g8273.2-d | grep -c '^dravik-host: --mask: g8273.2-d not in {')"
 expect "too far apart for a mask" "dravik-host: pairs are too far apart for the mask's filter of 0.1 Hz" \

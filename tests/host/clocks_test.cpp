@@ -2,16 +2,17 @@
 #include "clocks/systemTime.h"
 #include "clocks/tGuardedClock.h"
 #include "clocks/tKernelClock.h"
+#include "clocks/tPtpDevice.h"
 #include "clocks/tRecordedClock.h"
 #include "clocks/tSoftClock.h"
 #include "clocks/tSteeredClock.h"
-#include "support/failureOf.h"
+#include "host/stepFixture.h"
 
-#include <gtest/gtest.h>
-
+#include <array>
 #include <cerrno>
-#include <cmath>
-#include <stdexcept>
+#include <cstdarg>
+#include <linux/ptp_clock.h>
+#include <sys/ioctl.h>
 #include <system_error>
 #include <vector>
 
@@ -28,7 +29,50 @@ struct tKernel {
 };
 tKernel kernel;
 
+// What a PTP clock answers. Its sample i begins at i s and takes 99 ns, the sixth one 6 ns.
+struct tDevice {
+    unsigned methods = 0; // that it knows: 3, or the simplest ones
+    int failure = ENOTTY;
+};
+tDevice device;
+
+ptp_clock_time ptpTime(size_t sample, uint32_t ns)
+{
+    return {static_cast<int64_t>(sample), sample == 5 && ns == 99 ? 6 : ns, 0};
+}
+
 } // namespace
+
+extern "C" int ioctl(int /*fd*/, unsigned long request, ...) noexcept
+{
+    va_list arguments;
+    va_start(arguments, request);
+    void* const reply = va_arg(arguments, void*);
+    va_end(arguments);
+    errno = device.failure;
+    if (request == PTP_CLOCK_GETCAPS && device.methods > 0) {
+        static_cast<ptp_clock_caps*>(reply)->max_adj = 700;
+    } else if (request == PTP_SYS_OFFSET_PRECISE && device.methods == 3) {
+        auto* const precise = static_cast<ptp_sys_offset_precise*>(reply);
+        precise->sys_realtime = ptpTime(3, 30);
+        precise->device = ptpTime(4, 40);
+    } else if (request == PTP_SYS_OFFSET_EXTENDED && device.methods >= 2) {
+        auto* const extended = static_cast<ptp_sys_offset_extended*>(reply);
+        for (size_t i = 0; i < extended->n_samples; ++i)
+            for (const size_t k : {0, 1, 2})
+                extended->ts[i][k] = ptpTime(i, std::array{0U, 1000U, 99U}[k]);
+    } else if (request == PTP_SYS_OFFSET && device.methods >= 1) {
+        auto* const basic = static_cast<ptp_sys_offset*>(reply);
+        for (size_t i = 0; i < basic->n_samples; ++i) { // a sample ends where the next one begins
+            basic->ts[2 * i] = {static_cast<int64_t>(i), i == 5 ? 999'999'994U : 0, 0};
+            basic->ts[2 * i + 1] = ptpTime(i, 1000);
+        }
+        basic->ts[2 * basic->n_samples] = ptpTime(basic->n_samples, 0);
+    } else {
+        return -1;
+    }
+    return 0;
+}
 
 // The C library's own one is never reached: no clock of the machine is touched here.
 extern "C" int clock_adjtime(clockid_t /*id*/, timex* request) noexcept
@@ -215,6 +259,42 @@ TEST(KernelFrequency, givesBackWhatWasSet)
         EXPECT_EQ(finest, std::lround(64 * ppbOfKernelFrequency(kernelFrequency(ppb))));
         EXPECT_EQ(-finest, std::lround(64 * ppbOfKernelFrequency(kernelFrequency(-ppb))));
     }
+}
+
+TEST(PtpDevice, isReadInTheMostExactWayThatItKnows)
+{
+    const tTestFile file("ptp", "");
+    const struct {
+        unsigned methods;
+        const char* method;
+        tCrossReading reading; // of the shortest window, the middle
+    } kRows[] = {{3, "PTP_SYS_OFFSET_PRECISE", {3'000'000'030, 4'000'000'040, 0}},
+                 {2, "PTP_SYS_OFFSET_EXTENDED", {5'000'000'003, 5'000'001'000, 6}},
+                 {1, "PTP_SYS_OFFSET", {5'999'999'997, 5'000'001'000, 6}}};
+    for (const auto& row : kRows) {
+        for (const int failure : {EOPNOTSUPP, ENOTTY, EINVAL}) {
+            device = {row.methods, failure};
+            tPtpDevice ptp(file.path);
+            EXPECT_EQ(700, ptp.maxOffsetPpb());
+            const tCrossReading reading = ptp.crossRead();
+            EXPECT_STREQ(row.method, ptp.method());
+            EXPECT_EQ(row.reading.systemNs, reading.systemNs);
+            EXPECT_EQ(row.reading.clockNs, reading.clockNs);
+            EXPECT_EQ(row.reading.windowNs, reading.windowNs);
+            device.methods = 0;
+            const std::string why = failureOf([&] { ptp.crossRead(); });
+            EXPECT_EQ(0U, why.find("cannot read " + file.path)) << why;
+            EXPECT_STREQ("PTP_SYS_OFFSET", ptp.method());
+        }
+    }
+    EXPECT_EQ(0U, failureOf([&] { tPtpDevice(file.path); }).find(file.path + " is not a PTP clo"));
+    EXPECT_EQ(0U, failureOf([] { tPtpDevice("/no/ptp"); }).find("cannot open /no/ptp"));
+    device = {3, EOPNOTSUPP};
+    tPtpDevice ptp(file.path);
+    device = {1, EIO};
+    EXPECT_NE("", failureOf([&] { ptp.crossRead(); })); // which is not for want of a method
+    EXPECT_STREQ("PTP_SYS_OFFSET_PRECISE", ptp.method());
+    device = {};
 }
 
 class KernelClock : public testing::Test

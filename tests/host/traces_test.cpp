@@ -232,7 +232,7 @@ const tReadRow kRead[] = {
     {"UTC",
      "time (utc);phase error (us)\n2024-05-06T10:00:00Z;1\n2024-05-06 10:00:00.25;2,5\n1;1;1\n", 2,
      1000, 2500, 250'000'000, "", "1: 4 no numbers"},
-    {"too much", "-0.2500000004 -0.5\n9.5e9 1\n1 1e9\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
+    {"too much", "-0.2500000004 -0.5\n9.5e9 1\n1 -1e9\n8.5e9 0.25\n", 2, -0.5e9, 0.25e9,
      8'500'000'000'250'000'000, "", "2: 2 no time in the column of the time, 3 an error of years"}};
 
 TEST(Trace, isReadByWhatItsLinesAre)
