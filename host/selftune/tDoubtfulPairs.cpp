@@ -28,6 +28,7 @@ void tDoubtfulPairs::takeGood(const tPoint& point)
 // some few of many will always do.
 tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, double noiseVariance)
 {
+    constexpr size_t kSloping = 5;
     constexpr size_t kAfterOthers = 6;
     constexpr size_t kForLine = 8;
     const size_t forJump = pointsOfJump();
@@ -42,9 +43,9 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::takeDoubtful(const tPoint& point, doubl
         const tVerdict verdict = level(points, noiseVariance);
         if (verdict.finding != kNothing) return verdict;
     }
-    if (inRow >= forJump - 1 && inRow <= kKept) { // which is known to begin at nothing
-        const tVerdict verdict = slope(inRow, noiseVariance);
-        if (verdict.finding != kNothing) return verdict;
+    if (inRow >= std::max(kSloping, forJump) && inRow <= kKept) {
+        const tVerdict verdict = line(inRow, noiseVariance);
+        if (verdict.finding != kNothing && beginsAtLastGood(verdict, noiseVariance)) return verdict;
     }
     const size_t forLine = std::max(kForLine, points);
     if (inRow >= forLine) {
@@ -91,30 +92,16 @@ tDoubtfulPairs::tVerdict tDoubtfulPairs::level(size_t points, double noiseVarian
     return {kJump, phase, 0, 0, 0};
 }
 
-// A line from where the clock was when it was last as foreseen: its phase does not jump.
-tDoubtfulPairs::tVerdict tDoubtfulPairs::slope(size_t points, double noiseVariance) const
+// Whether the clock was about where it was foreseen when that was last so: its phase does not jump.
+bool tDoubtfulPairs::beginsAtLastGood(const tVerdict& verdict, double noiseVariance) const
 {
-    double tt = 0;
-    double tx = 0;
-    for (size_t i = 0; i < points; ++i) {
-        const tPoint& each = latest(i).point;
-        const double since = each.seconds - goodSeconds;
-        tt += since * since;
-        tx += since * each.innovationNs;
-    }
-    const double slope = tx / tt;
-    double squares = 0;
-    for (size_t i = 0; i < points; ++i) {
-        const tPoint& each = latest(i).point;
-        const double off = each.innovationNs - slope * (each.seconds - goodSeconds);
-        squares += off * off;
-    }
-    if (!isNoise(squares, static_cast<double>(points) - 1, noiseVariance)) return {};
+    constexpr double kAbout = 6; // deviations
     const double passed = latest(0).point.seconds - goodSeconds;
-    return {kNewFrequency, slope * passed, slope, noiseVariance / tt, 0};
+    const double then = verdict.phaseNs - verdict.frequencyPpb * passed;
+    return then * then < kAbout * kAbout * noiseVariance;
 }
 
-// Any line: something wrong was believed before.
+// Any line. If it begins elsewhere, something wrong was believed before.
 tDoubtfulPairs::tVerdict tDoubtfulPairs::line(size_t points, double noiseVariance) const
 {
     const auto n = static_cast<double>(points);

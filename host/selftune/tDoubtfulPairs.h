@@ -41,7 +41,7 @@ private:
     const tEntry& latest(size_t back) const { return entries[(count - 1 - back) % kKept]; }
     size_t pointsOfJump() const;
     tVerdict level(size_t points, double noiseVariance) const;
-    tVerdict slope(size_t points, double noiseVariance) const;
+    bool beginsAtLastGood(const tVerdict& verdict, double noiseVariance) const;
     tVerdict line(size_t points, double noiseVariance) const;
     tVerdict grownNoise() const;
     double scatter(size_t points) const;

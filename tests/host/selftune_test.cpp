@@ -118,8 +118,8 @@ const tEventRow kEvents[] = {
                                                    : i < 8 ? 0
                                                            : -3000; }, 0,
      "rrrJ.B..rrrJ..", "22.70415 0.1141117 0.2604788 11.83011"},
-    {"another frequency", [](int) { return 0.0; }, 2000, "rrF.......",
-     "23.11768 0.1487155 0.3444782 16.15918"},
+    {"another frequency", [](int) { return 0.0; }, 2000, "rrrrF.....",
+     "23.18531 0.1491471 0.3943876 18.16624"},
     {"a burst of delays", [](int i) { return i < 30 ? 3000.0 + 97 * ((i * i * 31) % 41) : 0; }, 0,
      "rrrrrrrrrrrrrrrrrrrrrrrrrrrrrr........", "23.17554 0.09578144 0.1473235 9.251523"},
     {"a louder noise", [](int i) { return i % 2 == 0 ? 700.0 + 31 * i : -900.0 - 17 * i; }, 0,
