@@ -58,16 +58,17 @@ extern "C" int ioctl(int /*fd*/, unsigned long request, ...) noexcept
         precise->device = ptpTime(4, 40);
     } else if (request == PTP_SYS_OFFSET_EXTENDED && device.methods >= 2) {
         auto* const extended = static_cast<ptp_sys_offset_extended*>(reply);
-        for (size_t i = 0; i < extended->n_samples; ++i)
+        for (size_t i = 0; i < extended->n_samples; ++i) {
             for (const size_t k : {0, 1, 2})
                 extended->ts[i][k] = ptpTime(i, std::array{0U, 1000U, 99U}[k]);
+        }
     } else if (request == PTP_SYS_OFFSET && device.methods >= 1) {
         auto* const basic = static_cast<ptp_sys_offset*>(reply);
         for (size_t i = 0; i < basic->n_samples; ++i) { // a sample ends where the next one begins
             basic->ts[2 * i] = {static_cast<int64_t>(i), i == 5 ? 999'999'994U : 0, 0};
             basic->ts[2 * i + 1] = ptpTime(i, 1000);
         }
-        basic->ts[2 * basic->n_samples] = ptpTime(basic->n_samples, 0);
+        basic->ts[size_t{2} * basic->n_samples] = ptpTime(basic->n_samples, 0);
     } else {
         return -1;
     }

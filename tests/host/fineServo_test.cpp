@@ -90,6 +90,7 @@ TEST(FineServo, ordersFractions)
         lawPpb = std::round(64 * (lawPpb + 0.55 * (2 * error - before))) / 64;
         before = error;
         EXPECT_EQ(lawPpb, beside.ordered()) << errorNs;
+        EXPECT_EQ(2U, beside.servo.calls().size()); // and what it asked before
         EXPECT_EQ(lawPpb, beside.clock.offsetPpb());
     }
     EXPECT_EQ(kLockLost, beside.servo.adjustTime(beside.referenceNs, beside.referenceNs - 1000));

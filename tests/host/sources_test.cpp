@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <csignal>
 #include <cstring>
+#include <sys/shm.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <system_error>
@@ -305,6 +306,46 @@ TEST(Segment, isLeftWhereTheProducerIsAtWork)
             EXPECT_EQ(segment.words[0] == 0 || !read, used) << wide << mode << disturbed;
         }
     }
+}
+
+// Each size once more in memory that is shared, with a key of its own.
+TEST(Segment, isTakenOnceAndMadeIfNobodyDid)
+{
+    const key_t firstKey = 0x64720000 + 256 * (getpid() % 256);
+    for (const auto& [unit, mode, size, wide] : {std::tuple(0, 0600, 0, true),
+                                                 {1, 0600, 80, false},
+                                                 {2, 0666, 0, true},
+                                                 {3, 0640, 96, true}}) {
+        SCOPED_TRACE(unit);
+        if (size > 0) (void)shmget(firstKey + unit, static_cast<size_t>(size), IPC_CREAT | mode);
+        const auto reference = sharedMemoryReference(unit, firstKey);
+        const int id = shmget(firstKey + unit, 0, 0);
+        shmid_ds state{};
+        ASSERT_EQ(0, shmctl(id, IPC_STAT, &state));
+        EXPECT_EQ(static_cast<unsigned>(mode), state.shm_perm.mode & 0777U);
+        EXPECT_EQ(wide ? 96U : 80U, state.shm_segsz);
+        void* const shared = shmat(id, nullptr, 0);
+        EXPECT_FALSE(reference->next(0));
+        tSegment segment(wide);
+        segment.putTimes(7, 0, 0, 9, 0, 0);
+        for (const uint32_t leap : {0U, 3U}) {
+            segment.putLeap(leap);
+            segment.put(wide ? 48 : 36, 1);
+            std::memcpy(shared, segment.words, wide ? 96 : 80);
+            const auto sample = reference->next(0);
+            EXPECT_EQ(leap == 0, sample.has_value());
+            EXPECT_EQ(uint64_t{7} * kSecondNs,
+                      sample.value_or(tReferenceSample{0, 7 * kSecondNs, false}).referenceNs);
+            EXPECT_EQ(leap == 0 ? 0 : 1, reference->unusable());
+            EXPECT_FALSE(reference->next(0));
+        }
+        shmdt(shared);
+        shmctl(id, IPC_RMID, nullptr);
+    }
+    const int strange = shmget(firstKey, 50, IPC_CREAT | 0600);
+    EXPECT_EQ("the shared memory segment of unit 0 has 50 bytes, neither 80 nor 96",
+              failureOf([&] { sharedMemoryReference(0, firstKey); }));
+    shmctl(strange, IPC_RMID, nullptr);
 }
 
 class Socket : public testing::Test
