@@ -114,6 +114,8 @@ const tEventRow kEvents[] = {
                                               : i < 9 ? 9000.0
                                                       : 0; }, 0,
      "rrrJrrrJ.B....", "22.81335 0.1346467 0.1748747 9.817673"},
+    {"a noisy jump", [](int i) { return i % 2 == 0 ? 10'036.0 : 9'964; }, 0, "rrrJ.....",
+     "25.5064 0.1122079 0.1388378 9.715523"},
     {"a jump, back and beyond", [](int i) { return i < 5   ? 3000.0
                                                    : i < 8 ? 0
                                                            : -3000; }, 0,

@@ -177,12 +177,16 @@ TEST(Signals, doAfterwardsWhatTheyDidBefore)
         }
         return found;
     };
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP}) // what earlier ones may have left
+        (void)std::signal(signal, SIG_IGN);
     const auto before = handlers();
     {
         const tSignals meanwhile;
         EXPECT_NE(before, handlers());
     }
     EXPECT_EQ(before, handlers());
+    for (const int signal : {SIGINT, SIGTERM, SIGHUP})
+        (void)std::signal(signal, SIG_DFL);
 }
 
 TEST(ClockReference, isReadAtItsPaceAndSilentWhereItFails)
