@@ -273,6 +273,10 @@ TEST(Trace, tellsTheCorrections)
         EXPECT_EQ(5.5, pair.orderedPpb);
         EXPECT_EQ(-24, static_cast<int64_t>(pair.clockNs - pair.referenceNs));
     }
+    const tRecordedPair coasted = first(
+        "kind,elapsed_s,reference_ns,clock_ns,call,value\npair,1,1,1,,\ncall,1,,,setFrequency,8\n"
+        "call,1,,,setFrequency,100\ncall,2.5,,,setFrequency,40\npair,6,6,6,,\n");
+    EXPECT_EQ(58, coasted.orderedPpb); // 1.5 s of the one and 3.5 s of the other
     const tRecording ours = readTraceOf(
         "kind,reference_ns,clock_ns,frequency_ppb,step_ns,call,value\n"
         "call,,,,,getMaxFrequencyOffset,50\ncall,,,,,getMinFrequencyOffset,-50\n"
