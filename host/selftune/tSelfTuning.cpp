@@ -138,7 +138,8 @@ void tSelfTuning::order(double ppb)
 
 void tSelfTuning::stepBack()
 {
-    const int64_t byNs = -std::llround(estimate.phaseNs());
+    constexpr double kLargestNs = 0x1p62; // no clock is a century off
+    const int64_t byNs = std::llround(std::clamp(-estimate.phaseNs(), -kLargestNs, kLargestNs));
     clock.step(byNs);
     ownOrders.push_back({kStepTime, byNs, 0});
     estimate.stepped(byNs);
