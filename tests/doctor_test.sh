@@ -26,6 +26,7 @@ doctor() { simulatedHost "$1" doctor "${@:2}" > out 2> err; } # STATEMENTS ARGUM
 
 permission="look +permission +no CAP_SYS_TIME"
 (($((0x$(sed -n 's/^CapEff:[^0-9a-f]*//p' /proc/self/status))) >> 25 & 1)) && permission="ok +permission +CAP_SYS_TIME"
+[ -z "${EMULATOR:-}" ] || permission="(ok|look) +permission" # it does not pass on what this process may
 
 doctor "system status=0 frequency=7ppm;ptp ./ptp quirks=b delay=400ns offset=1000s max=50ppm" ./ptp none
 expect "exit status" 1 $?

@@ -48,7 +48,7 @@ played() { # SCENARIO SOURCE [STATEMENTS]: a line break for each ;
     tr ';' '\n' <<< "$1" > scenario
     simulatedHost "trace true.csv;shm 0;ptp ptp;scenario scenario system ${2#*:}" run --reference "$2" \
         --clock realtime --dry-run --duration 2000s --csv seen.csv > out 2>&1
-    [ -s seen.csv ] && "$bin/dravik-host" metrics seen.csv --from 0s > figures
+    [ -s seen.csv ] && ${EMULATOR:+"$EMULATOR"} "$bin/dravik-host" metrics seen.csv --from 0s > figures
 }
 figure() { # NAME
     case $1 in
