@@ -5,6 +5,7 @@
 #include <fmt/format.h>
 
 #include <algorithm>
+#include <stdexcept>
 #include <system_error>
 #include <utility>
 
@@ -147,6 +148,7 @@ void tDiscipline::order(double ppb, tHostCalls& calls)
 
 tNotes tDiscipline::retune()
 {
+    if (selfTuning) throw std::runtime_error("there are none, as the servo tunes itself");
     tTuned anew = readDocuments(library, options);
     servo.requireThreshold(anew.documents.widestThreshold());
     servo.writeParameters(anew.documents.first());

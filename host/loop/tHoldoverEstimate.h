@@ -7,8 +7,8 @@
 
 namespace dravikHost {
 
-// A clock whose reference is silent keeps the frequency that it was last given, and its error grows
-// with what that frequency was unsure by.
+// A clock whose reference is silent runs on at the frequency that it mostly had, and its error
+// grows with what that frequency was unsure by.
 class tHoldoverEstimate
 {
 public:

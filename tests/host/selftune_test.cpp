@@ -248,6 +248,7 @@ TEST(SelfTuning, acquiresHoldsAndFollows)
     EXPECT_EQ("----....", loop.events);
     EXPECT_EQ(2, loop.latest.steps);
     EXPECT_EQ(0, loop.latest.locksLost);
+    EXPECT_THROW(loop.discipline->retune(), std::runtime_error); // the built-in document ends locks
     loop.events.clear();
     loop.pass(-1); // the same moment again
     loop.rmsNs(3);
